@@ -1,0 +1,13 @@
+# Cross build for Windows on x86-64 with Debian's mingw-w64 (posix threads); tests run under Wine.
+set(CMAKE_SYSTEM_NAME Windows)
+set(CMAKE_SYSTEM_PROCESSOR x86_64)
+set(_t x86_64-w64-mingw32)
+set(CMAKE_C_COMPILER   ${_t}-gcc-posix)
+set(CMAKE_CXX_COMPILER ${_t}-g++-posix)
+set(CMAKE_RC_COMPILER  ${_t}-windres)
+set(CMAKE_FIND_ROOT_PATH /usr/${_t})
+set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
+set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
+set(CMAKE_CROSSCOMPILING_EMULATOR "${CMAKE_CURRENT_LIST_DIR}/../tools/wine-run")

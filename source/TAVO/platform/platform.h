@@ -1,0 +1,87 @@
+#pragma once
+// What the library needs of the machine, once for both systems. The build picks the Windows or the POSIX sources of this
+// folder; nothing above this folder asks which system it is.
+//
+// No function here throws. Paths and texts are 16-bit units, zero-terminated.
+
+#include <cstddef>
+#include <cstdint>
+#include <TAVO/config.h>
+
+namespace TAVO::Platform {
+
+// --- heap (heap.h has the counted front that the library calls) ---------------------------------------------------
+
+// Size 0 gives a block; blocks are aligned to 16; null when the system refuses.
+void* HeapAllocate(std::size_t size) noexcept;
+// Null gives null; size 0 keeps a block; null when refused, the old block then stays valid.
+void* HeapResize(void* block, std::size_t size) noexcept;
+// Null is ignored.
+void HeapRelease(void* block) noexcept;
+
+// --- modules and configuration -------------------------------------------------------------------------------------
+
+enum class Module { Library, Executable };
+
+// The module's path, cut to `capacity` units terminator included. 0 when unknown; `truncated` tells a cut path.
+std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, bool& truncated) noexcept;
+
+// Cuts the library's path behind its file name proper, where the configuration file's ".ini" goes.
+// Returns the length kept, 0 when the name has no extension to replace.
+std::size_t FindConfigurationStem(const wchar_t* libraryPath, std::size_t length) noexcept;
+
+// The integer at `key` of `section`, 0 when the file, the section or the key is missing. Names ignore case.
+int ReadConfigurationInteger(const wchar_t* path, const wchar_t* section, const wchar_t* key) noexcept;
+
+// --- debugger and message box --------------------------------------------------------------------------------------
+
+bool IsDebuggerAttached() noexcept;
+// POSIX: standard error as UTF-8, only while a tracer is attached.
+void WriteDebuggerOutput(const char* text) noexcept;
+void WriteDebuggerOutput(const wchar_t* text) noexcept;
+
+// Shows a system-modal box with OK and Cancel; true when the user cancelled. POSIX: answers OK.
+bool AskOkCancel(const char* caption, const char* text) noexcept;
+
+// --- clocks --------------------------------------------------------------------------------------------------------
+
+// Milliseconds since 1970-01-01 00:00 UTC.
+std::uint64_t GetUtcMilliseconds() noexcept;
+// Monotonic milliseconds since the process started (or the library was loaded, whichever the system tells).
+std::uint64_t GetProcessMilliseconds() noexcept;
+// The high-resolution counter and its ticks per second; false when the system fails to tell.
+bool GetCounterFrequency(std::int64_t& ticksPerSecond) noexcept;
+bool ReadCounter(std::int64_t& ticks) noexcept;
+
+// --- code page -----------------------------------------------------------------------------------------------------
+
+// The call protocol of MultiByteToWideChar and WideCharToMultiByte with the ANSI code page: length -1 (any negative one)
+// means up to and including the terminator, capacity 0 asks for the size, 0 is failure. POSIX: the code page is UTF-8.
+int AnsiToWide(const char* source, int length, wchar_t* target, int capacity) noexcept;
+int WideToAnsi(const wchar_t* source, int length, char* target, int capacity) noexcept;
+
+// --- memory ----------------------------------------------------------------------------------------------------------
+
+// Whether the byte at `address` can be read now. For the one scan that must survive a bad pointer; costs a system call.
+bool IsReadable(const void* address) noexcept;
+constexpr std::size_t PageSize = 4096;
+
+// --- threads -------------------------------------------------------------------------------------------------------
+
+// Identifies the calling thread among all that live; never 0.
+std::uint32_t GetThreadId() noexcept;
+
+// The calling thread's priority in the system's words (0 normal, -15 idle, 15 time critical). POSIX: the level that was
+// last set here, since an ordinary user's thread could not be raised again.
+int GetThreadPriority() noexcept;
+void SetThreadPriority(int priority) noexcept;
+
+// One pointer per thread, null at first: the thread's current release scope (object memory).
+void* GetReleaseScope() noexcept;
+void SetReleaseScope(void* scope) noexcept;
+
+// Gives up the processor, or sleeps.
+void YieldThread() noexcept;
+void SleepMilliseconds(std::uint32_t milliseconds) noexcept;
+
+} // namespace TAVO::Platform
