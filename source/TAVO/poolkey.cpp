@@ -171,15 +171,22 @@ bool KeyOfUtf8(const unsigned char* text, std::size_t limit, Key& key, std::size
     return true;
 }
 
-void KeyOfValues(const wchar_t* values, std::size_t count, Key& key) {
+Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined) {
     Hasher hasher;
-    key = Key{};
-    for (std::size_t i = 0; i < count; ++i) {
-        hasher.One(values[i]);
-        key.utf8Size += Utf8SizeOf(values[i]);
+    Key key;
+    for (std::size_t i = 0; i < units; ++i) {
+        const unsigned first = text[i];
+        ++key.length;
+        // 10000 is D840 DC00, 10FFFF is DC3F DFFF.
+        if (joined && i + 1 < units && first >= 0xD840 && first <= 0xDC3F && detail::IsLowSurrogate(text[i + 1])) {
+            ++key.length;
+            hasher.One(static_cast<std::uint16_t>((first & 0x3F) << 10 | (text[++i] & 0x3FF)));
+        } else {
+            hasher.One(text[i]);
+        }
     }
-    key.length = count;
     hasher.Store(key);
+    return key;
 }
 
 void KeyOfAscii(const unsigned char* text, std::size_t count, Key& key) {

@@ -28,8 +28,10 @@ bool KeyOfUtf8(const unsigned char* text, std::size_t limit, Key& key, std::size
 // Of exactly `count` units; zero units are characters.
 bool KeyOfUnits(const wchar_t* text, std::size_t count, Key& key);
 
-// Of exactly `count` values below 10000, none of them taken for half of a pair.
-void KeyOfValues(const wchar_t* values, std::size_t count, Key& key);
+// The key that a stored text has when it came from UTF-8: characters above FFFF, which are stored as two units without
+// the usual offset, count 2 and hash their low 16 bits. Surrogates that UTF-8 encoded one by one look the same in store;
+// `joined` tells how to read two of them in a row.
+Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined);
 
 // Of exactly `count` ASCII bytes without a zero.
 void KeyOfAscii(const unsigned char* text, std::size_t count, Key& key);

@@ -108,43 +108,14 @@ CPPoolString::operator const unsigned char*() const noexcept {
 
 // --- integrity -------------------------------------------------------------------------------------------------------
 
-namespace {
-
-// The key that a text interned from UTF-8 has: characters above FFFF count 2 and hash their low 16 bits. Surrogates that
-// UTF-8 encoded one by one look the same in the entry; `joined` tells how to read two of them in a row.
-pool::Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined) {
-    wchar_t small[64];
-    wchar_t* values = units <= 64 ? small : static_cast<wchar_t*>(Platform::Allocate(units * sizeof(wchar_t)));
-    if (!values) return {};
-    std::size_t count = 0, above = 0;
-    for (std::size_t i = 0; i < units; ++i) {
-        const unsigned first = text[i];
-        // Encoded without the usual offset: 10000 is D840 DC00, 10FFFF is DC3F DFFF.
-        if (joined && i + 1 < units && first >= 0xD840 && first <= 0xDC3F && detail::IsLowSurrogate(text[i + 1])) {
-            values[count++] = static_cast<wchar_t>((first & 0x3F) << 10 | (text[++i] & 0x3FF));
-            ++above;
-        } else {
-            values[count++] = text[i];
-        }
-    }
-    pool::Key key;
-    pool::KeyOfValues(values, count, key);
-    key.length += above;
-    if (values != small) Platform::Release(values);
-    return key;
-}
-
-} // namespace
-
 bool IsSound(tagCPOMEMHEADER* block) noexcept {
     const PoolEntry& entry = EntryOf(block);
     const std::size_t units = UnitsOf(block);
     const pool::Key stored{entry.length, entry.utf8Size, entry.hash, entry.hashi};
     pool::Key key;
     if (pool::KeyOfUnits(entry.text, units, key) && stored.SameText(key)) return true;
-    if (stored.SameText(KeyOfStoredUtf8(entry.text, units, true)) ||
-        stored.SameText(KeyOfStoredUtf8(entry.text, units, false)))
-        return true;
+    for (const bool joined : {true, false})
+        if (stored.SameText(pool::KeyOfStoredUtf8(entry.text, units, joined))) return true;
     // A text that mixes both kinds of surrogates cannot be told apart; its length must fit at least.
     std::size_t surrogates = 0;
     for (std::size_t i = 0; i < units; ++i) surrogates += detail::IsSurrogate(entry.text[i]);

@@ -117,7 +117,7 @@ bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
 long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {
     tagCPOMEMHEADER *a = GroupOf(first).representative, *b = GroupOf(second).representative;
     if (a == b || !a || !b) return 0;
-    const Entry &x = EntryOf(a), &y = EntryOf(b);
+    const PoolEntry &x = EntryOf(a), &y = EntryOf(b);
     if (x.length != y.length) return x.length < y.length ? -1 : 1;
     return wcsncmpi(x.text, y.text, kComparedUnits);
 }
@@ -138,7 +138,7 @@ bool CCaseSensitiveHash::Add(const Place& place, const CPObjectMemory& entry) no
 }
 
 long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {
-    const Entry &a = *Block::PayloadOf<PoolEntry>(first), &b = *Block::PayloadOf<PoolEntry>(second);
+    const PoolEntry &a = *Block::PayloadOf<PoolEntry>(first), &b = *Block::PayloadOf<PoolEntry>(second);
     if (a.hash != b.hash) return a.hash < b.hash ? -1 : 1;
     if (a.hashi != b.hashi) return a.hashi < b.hashi ? -1 : 1;
     if (a.length != b.length) return a.length < b.length ? -1 : 1;
