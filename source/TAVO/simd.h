@@ -8,7 +8,7 @@
 #include <TAVO/config.h>
 
 #if (defined(__SSE2__) || defined(_M_X64)) && !defined(TAVO_NO_SIMD)
-#include <emmintrin.h>
+#include <tmmintrin.h>
 #define TAVO_SSE2 1
 #endif
 
@@ -28,6 +28,8 @@ TAVO_INLINE Block All8(int value) { return _mm_set1_epi8(static_cast<char>(value
 TAVO_INLINE Block All16(int value) { return _mm_set1_epi16(static_cast<short>(value)); }
 TAVO_INLINE Block And(Block a, Block b) { return _mm_and_si128(a, b); }
 TAVO_INLINE Block Or(Block a, Block b) { return _mm_or_si128(a, b); }
+// b without the bits of a.
+TAVO_INLINE Block AndNot(Block a, Block b) { return _mm_andnot_si128(a, b); }
 TAVO_INLINE Block Equal8(Block a, Block b) { return _mm_cmpeq_epi8(a, b); }
 TAVO_INLINE Block Equal16(Block a, Block b) { return _mm_cmpeq_epi16(a, b); }
 // Unsigned a >= b.
@@ -62,14 +64,29 @@ TAVO_INLINE Block Low16Of32(Block a) {
 TAVO_INLINE Block Widen32Low(Block a) { return _mm_unpacklo_epi16(a, _mm_setzero_si128()); }
 TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzero_si128()); }
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
+// Lanes of 16-bit numbers from -128 to 127 as bytes.
+TAVO_INLINE Block PackSigned(Block a, Block b) { return _mm_packs_epi16(a, b); }
 // The sum of all unsigned bytes.
 TAVO_INLINE std::size_t Sum8(Block a) {
     const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
     return static_cast<std::size_t>(_mm_cvtsi128_si64(halves) + _mm_cvtsi128_si64(_mm_srli_si128(halves, 8)));
 }
 
+// Moving bytes by a table needs SSSE3, which nearly every processor has: functions marked TAVO_SHUFFLES may call
+// Shuffle, and may be called when HasShuffle() is true.
+#if defined(_MSC_VER)
+#define TAVO_SHUFFLES
+inline bool HasShuffle() { return false; }
+#else
+#define TAVO_SHUFFLES __attribute__((target("ssse3")))
+inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
+#endif
+// Byte i of the result is byte index[i]; 0 for an index with the highest bit.
+TAVO_SHUFFLES inline Block Shuffle(Block a, Block index) { return _mm_shuffle_epi8(a, index); }
+
 #else
 
+#define TAVO_SHUFFLES
 struct Block {
     std::uint8_t b[16];
 };
@@ -105,6 +122,9 @@ inline Block And(Block a, Block b) {
 }
 inline Block Or(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x | y; });
+}
+inline Block AndNot(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return ~x & y; });
 }
 inline Block Equal8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x == y ? 0xFF : 0; });
@@ -148,6 +168,12 @@ inline Block Widen32Low(Block a) {
     for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 4, a.b + i * 2, 2);
     return x;
 }
+inline bool HasShuffle() { return true; }
+inline Block Shuffle(Block a, Block index) {
+    Block x;
+    for (int i = 0; i < 16; ++i) x.b[i] = index.b[i] & 0x80 ? 0 : a.b[index.b[i] & 15];
+    return x;
+}
 inline Block HighHalf(Block a) {
     Block x{};
     std::memcpy(x.b, a.b + 8, 8);
@@ -180,6 +206,7 @@ inline Block Narrow(Block a, Block b) {
     for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
     return x;
 }
+inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
 inline std::size_t Sum8(Block a) {
     std::size_t sum = 0;
     for (std::uint8_t byte : a.b) sum += byte;

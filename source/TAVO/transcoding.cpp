@@ -26,7 +26,7 @@ TAVO_INLINE std::uint64_t AtLeastMask(const unsigned char* chunk, int byte) {
 }
 
 // Adds the whole characters of a chunk that begins with one; false: the chunk holds something invalid.
-bool MeasureChunk(const unsigned char* chunk, std::uint64_t high, Extent& extent) {
+TAVO_INLINE bool MeasureChunk(const unsigned char* chunk, std::uint64_t high, Extent& extent) {
     const std::uint64_t continuations = ChunkMask(chunk, [](Block x) { return Below8(x, All8(0xC0)); });
     const std::uint64_t leads = high & ~continuations;
     const std::uint64_t leads3 = AtLeastMask(chunk, 0xE0); // and longer
@@ -56,6 +56,18 @@ bool MeasureChunk(const unsigned char* chunk, std::uint64_t high, Extent& extent
     return true;
 }
 
+// Adds the last characters of a text, fewer bytes than a chunk, unless something is wrong with them.
+TAVO_NOINLINE void MeasureRest(const unsigned char* text, std::size_t length, Extent& extent) {
+    const std::size_t rest = length - extent.source;
+    if (rest < kBlock || rest >= kChunk) return;
+    unsigned char chunk[kChunk] = {}; // filled up with zeros, each a character
+    std::memcpy(chunk, text + extent.source, rest);
+    if (!MeasureChunk(chunk, ChunkMask(chunk, [](Block x) { return x; }), extent)) return;
+    extent.source -= kChunk - rest;
+    extent.characters -= kChunk - rest;
+    extent.target -= kChunk - rest;
+}
+
 // --- Converting UTF-8: runs of sequences of one length ---------------------------------------------------------------
 
 // The UTF-16 units of eight two-byte sequences.
@@ -74,10 +86,85 @@ TAVO_INLINE Block Decode3(const unsigned char* text) {
                         ShiftRight32<16>(And(x, All32(0x3F0000)))));
 }
 
+// For every set of places in a window of eight: how to move what stands at the other places to the front.
+struct Compaction {
+    std::uint8_t shuffle[256][kBlock];
+    std::uint8_t kept[256];
+};
+
+// Places are bytes and a set bit is a continuation byte: each sequence's first two bytes become one 16-bit lane.
+constexpr Compaction kSequences = [] {
+    Compaction table{};
+    for (unsigned set = 0; set < 256; ++set) {
+        unsigned lane = 0;
+        for (unsigned place = 0; place < 8; ++place) {
+            if (set >> place & 1) continue;
+            table.shuffle[set][lane * 2] = static_cast<std::uint8_t>(place);
+            table.shuffle[set][lane * 2 + 1] = static_cast<std::uint8_t>(place + 1);
+            ++lane;
+        }
+        table.kept[set] = static_cast<std::uint8_t>(lane);
+        for (; lane < 8; ++lane) table.shuffle[set][lane * 2] = table.shuffle[set][lane * 2 + 1] = 0x80;
+    }
+    return table;
+}();
+
+// Decodes the sequences of one and two bytes that begin in the eight bytes at `text`; returns their number.
+template <class Unit>
+TAVO_SHUFFLES inline std::size_t DecodeWindow(const unsigned char* text, std::uint32_t set, Unit* out) {
+    const Block lanes = Shuffle(Load(text), Load(kSequences.shuffle[set]));
+    const Block two = Equal16(And(lanes, All16(0x80)), All16(0x80));
+    Store(out, Or(And(two, Decode2(lanes)), AndNot(two, And(lanes, All16(0x7F)))));
+    return kSequences.kept[set];
+}
+
+// Decodes mixtures of one and two bytes, without a branch on which is which, up to the first block with something
+// longer.
+template <class Unit>
+TAVO_SHUFFLES void ConvertMixture(const unsigned char*& text, const unsigned char* end, Unit*& out,
+                                  const Unit* outEnd) {
+    while (end - text >= 48 && outEnd - out >= 32) {
+        const Block x = Load(text);
+        const Block y = Load(text + 16);
+        if (Mask(Or(x, y)) == 0) {
+            Store(out, WidenLow(x));
+            Store(out + 8, WidenHigh(x));
+            Store(out + 16, WidenLow(y));
+            Store(out + 24, WidenHigh(y));
+            text += 32, out += 32;
+            continue;
+        }
+        if (Mask(Or(AtLeast8(x, All8(0xE0)), AtLeast8(y, All8(0xE0)))) != 0) break;
+        // A window may begin with the end of a sequence of the window before. Each finds that out by itself, so that
+        // they do not wait for one another.
+        const std::uint32_t continuations = Mask(Below8(x, All8(0xC0))) | Mask(Below8(y, All8(0xC0))) << 16;
+        for (unsigned window = 0; window < 32; window += 8) {
+            const std::uint32_t set = continuations >> window & 0xFF;
+            const std::uint32_t skip = set & 1;
+            out += DecodeWindow(text + window + skip, set >> skip | skip << 7, out);
+        }
+        text += 32;
+        text += IsContinuation(*text);
+    }
+    while (end - text >= static_cast<std::ptrdiff_t>(kBlock) && outEnd - out >= 8) {
+        const Block x = Load(text);
+        if ((Mask(AtLeast8(x, All8(0xE0))) & 0xFF) != 0) return;
+        out += DecodeWindow(text, Mask(Below8(x, All8(0xC0))) & 0xFF, out);
+        text += 8;
+        text += IsContinuation(*text);
+    }
+}
+
 // Decodes runs while whole blocks can be loaded and stored; stores may reach into units that come later.
 template <class Unit> void ConvertRuns(const unsigned char*& text, const unsigned char* end, Unit*& out, Unit* outEnd) {
     constexpr std::uint32_t kEveryThird = 0x249; // bytes 0, 3, 6, 9
+    const bool mixtures = HasShuffle();
     while (end - text >= static_cast<std::ptrdiff_t>(kBlock) && outEnd - out >= 8) {
+        if (mixtures && *text < 0xE0) {
+            const unsigned char* const before = text;
+            ConvertMixture(text, end, out, outEnd);
+            if (text != before) continue;
+        }
         const Block x = Load(text);
         const std::uint32_t high = Mask(x);
         std::size_t run;
@@ -132,11 +219,20 @@ template <class Unit> void MeasureBlocks(const Unit* text, std::size_t length, E
     for (bool plain = true; plain && length - extent.source >= kUnits;) {
         Block saved = All8(0); // bytes that units below 800 and below 80 take less than 3
         std::size_t blocks = 0;
-        for (; blocks < kBatch && length - extent.source >= kUnits; ++blocks, extent.source += kUnits) {
+        for (; blocks < kBatch && length - extent.source >= 2 * kUnits; blocks += 2, extent.source += 2 * kUnits) {
+            const Block x = Load(text + extent.source);
+            const Block y = Load(text + extent.source + kUnits);
+            if (Mask(Or(Surrogates(x), Surrogates(y))) != 0) break;
+            saved = Subtract16(Subtract16(saved, Below80(x)), Below800(x));
+            saved = Subtract16(Subtract16(saved, Below80(y)), Below800(y));
+        }
+        if (blocks < kBatch && length - extent.source >= kUnits) {
             const Block x = Load(text + extent.source);
             plain = Mask(Surrogates(x)) == 0;
-            if (!plain) break;
-            saved = Subtract16(Subtract16(saved, Below80(x)), Below800(x));
+            if (plain) {
+                saved = Subtract16(Subtract16(saved, Below80(x)), Below800(x));
+                ++blocks, extent.source += kUnits;
+            }
         }
         extent.characters += blocks * kUnits;
         extent.target += blocks * kUnits * 3 - Sum8(saved);
@@ -177,10 +273,51 @@ TAVO_INLINE void Store3(unsigned char* out, Block halves) {
     StoreHalf(out + 6, HighHalf(halves));
 }
 
+// Places are units and a set bit is a unit below 80: two-byte lanes lose the second byte of those.
+constexpr Compaction kBytesOfUnits = [] {
+    Compaction table{};
+    for (unsigned set = 0; set < 256; ++set) {
+        unsigned kept = 0;
+        for (unsigned byte = 0; byte < 16; ++byte)
+            if (byte % 2 == 0 || (set >> byte / 2 & 1) == 0)
+                table.shuffle[set][kept++] = static_cast<std::uint8_t>(byte);
+        table.kept[set] = static_cast<std::uint8_t>(kept);
+        while (kept < 16) table.shuffle[set][kept++] = 0x80;
+    }
+    return table;
+}();
+
+// Encodes mixtures of units below 800, without a branch on which take one byte, up to the first block with another.
+template <class Unit>
+TAVO_SHUFFLES void ConvertMixture(const Unit*& text, const Unit* end, unsigned char*& out,
+                                  const unsigned char* outEnd) {
+    while (end - text >= 16 && outEnd - out >= 16) {
+        const Block x = Load(text);
+        const Block y = Load(text + kUnits);
+        if (Mask(Below80(Or(x, y))) == 0xFFFF) {
+            Store(out, Narrow(x, y));
+            text += 16, out += 16;
+            continue;
+        }
+        if (Mask(Below800(x)) != 0xFFFF) return;
+        const Block ascii = Below80(x);
+        const std::uint32_t set = Mask(PackSigned(ascii, ascii)) & 0xFF;
+        const Block lanes = Or(And(ascii, x), AndNot(ascii, Encode2(x)));
+        Store(out, Shuffle(lanes, Load(kBytesOfUnits.shuffle[set])));
+        text += kUnits, out += kBytesOfUnits.kept[set];
+    }
+}
+
 // Encodes runs while whole blocks can be loaded and stored; stores may reach into bytes that come later.
 template <class Unit>
 void ConvertRuns(const Unit*& text, const Unit* end, unsigned char*& out, const unsigned char* outEnd) {
+    const bool mixtures = HasShuffle();
     while (end - text >= static_cast<std::ptrdiff_t>(kUnits) && outEnd - out >= 16) {
+        if (mixtures && *text < 0x800) {
+            const Unit* const before = text;
+            ConvertMixture(text, end, out, outEnd);
+            if (text != before) continue;
+        }
         const Block x = Load(text);
         std::size_t run;
         if (*text < 0x80) {
@@ -189,8 +326,7 @@ void ConvertRuns(const Unit*& text, const Unit* end, unsigned char*& out, const 
             text += run, out += run;
         } else if (*text < 0x800) {
             Store(out, Encode2(x));
-            // Above 7F: not among Below80.
-            run = static_cast<std::size_t>(std::countr_zero(~Mask(Below800(x)) | Mask(Below80(x)))) / 2;
+            run = RunOf(AndNot(Below80(x), Below800(x)));
             text += run, out += 2 * run;
         } else if ((Mask(Or(Below800(x), Surrogates(x))) & 0xFF) == 0) {
             Store3(out, Encode3(Widen32Low(x)));
@@ -224,6 +360,7 @@ Extent MeasureUtf8(const unsigned char* text, std::size_t length) {
         extent.characters += kChunk;
         extent.target += kChunk;
     }
+    MeasureRest(text, length, extent);
     while (extent.source < length) {
         const unsigned char* at = text + extent.source;
         const std::size_t bytes = Utf8Sequence(at, length - extent.source);
