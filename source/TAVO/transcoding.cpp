@@ -156,7 +156,8 @@ TAVO_SHUFFLES void ConvertMixture(const unsigned char*& text, const unsigned cha
 }
 
 // Decodes runs while whole blocks can be loaded and stored; stores may reach into units that come later.
-template <class Unit> void ConvertRuns(const unsigned char*& text, const unsigned char* end, Unit*& out, Unit* outEnd) {
+// False: a value above 10FFFF.
+template <class Unit> bool ConvertRuns(const unsigned char*& text, const unsigned char* end, Unit*& out, Unit* outEnd) {
     constexpr std::uint32_t kEveryThird = 0x249; // bytes 0, 3, 6, 9
     const bool mixtures = HasShuffle();
     while (end - text >= static_cast<std::ptrdiff_t>(kBlock) && outEnd - out >= 8) {
@@ -190,14 +191,15 @@ template <class Unit> void ConvertRuns(const unsigned char*& text, const unsigne
         } else {
             ulong32 codePoint = 0;
             StepUtf8(codePoint, text);
-            EncodeUtf16(out, codePoint);
+            if (!EncodeUtf16(out, codePoint)) return false;
         }
     }
+    return true;
 }
 
 template <class Unit> bool ConvertBytes(const unsigned char* text, const Extent& extent, Unit*& out) {
     const unsigned char* const end = text + extent.source;
-    if (!extent.beyond) ConvertRuns(text, end, out, out + extent.target);
+    if (!extent.beyond && !ConvertRuns(text, end, out, out + extent.target)) return false;
     for (ulong32 codePoint; text < end && StepUtf8(codePoint, text);)
         if (!EncodeUtf16(out, codePoint)) return false;
     return true;

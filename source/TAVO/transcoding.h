@@ -147,8 +147,9 @@ Extent MeasureUtf8(const unsigned char* text, std::size_t length);
 Extent MeasureUtf16(const wchar_t* text, std::size_t length);
 Extent MeasureUtf16(const unsigned short* text, std::size_t length);
 
-// Convert a measured text; `out` ends behind what was written, and nothing behind the measured target units is touched.
-// False: a value above 10FFFF was met, `out` is behind the units before it and nothing further is touched.
+// Convert a measured text (`source` and `target` of the extent); `out` ends behind what was written, and nothing behind
+// the measured target units is touched. False: a value above 10FFFF was met, `out` is behind the units before it; what
+// is behind those is untouched if `beyond` is set, else undefined.
 bool ConvertUtf8(const unsigned char* text, const Extent& extent, wchar_t*& out);
 bool ConvertUtf8(const unsigned char* text, const Extent& extent, unsigned short*& out);
 void ConvertUtf16(const wchar_t* text, const Extent& extent, unsigned char*& out);
