@@ -18,8 +18,9 @@ using ExternalLogger = void (*)(_acfDebugLevel level, const wchar_t* category, c
 
 /// Writes one log line: to the host's logger if there is one, else to the debugger's output if a debugger is attached,
 /// else nowhere. There is no level threshold.
-/// Formats mean the same on every platform: %ls and %S are wide, %hs and %s... see docs/contract.md; `l` is 32 bits,
-/// `ll` and `I64` are 64; a null string prints "(null)"; numbers never depend on the locale. At most 2047 units are kept.
+/// Formats mean the same on every platform: %s, %ls and %c are wide, %hs, %S and %hc narrow (of the ANSI code page); a
+/// length of `l` is 32 bits, `ll` and `I64` are 64; `*` and `%n$` work, %n does not; a null string prints "(null)";
+/// numbers never depend on the locale. At most 2047 units are kept.
 /// @param category  null means "TAVO.default"
 /// @param source    module path for the line's prefix; null leaves file and line out
 TAVO_API void _logWrite(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line,
@@ -106,8 +107,8 @@ using Develop::CMTRandom;
 /// A signed 32-bit result code; negative means failure.
 class TAVO_API hr {
 public:
-    /// Keeps the code. A negative one is reported: as an assertion when the configuration has "BreakOnHRESULT", as a trace
-    /// line when it has "LogFailedHRESULT".
+    /// Keeps the code. A negative one is reported: as an assertion when the configuration has "BreakOnHRESULT", as a
+    /// trace line when it has "LogFailedHRESULT".
     hr(long32 code);
     /// Copies the code without a report.
     hr(const hr& other) noexcept = default;

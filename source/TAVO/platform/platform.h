@@ -1,6 +1,6 @@
 #pragma once
-// What the library needs of the machine, once for both systems. The build picks the Windows or the POSIX sources of this
-// folder; nothing above this folder asks which system it is.
+// What the library needs of the machine, once for both systems. The build picks the Windows or the POSIX sources of
+// this folder; nothing above this folder asks which system it is.
 //
 // No function here throws. Paths and texts are 16-bit units, zero-terminated.
 
@@ -26,17 +26,19 @@ enum class Module { Library, Executable };
 // The module's path, cut to `capacity` units terminator included. 0 when unknown; `truncated` tells a cut path.
 std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, bool& truncated) noexcept;
 
-// Cuts the library's path behind its file name proper, where the configuration file's ".ini" goes.
-// Returns the length kept, 0 when the name has no extension to replace.
+// The length of the library's path without the extension, which the configuration file's ".ini" replaces; 0 when the
+// file name has none. POSIX: version digits behind ".so" go too, so that an upgrade keeps its settings.
 std::size_t FindConfigurationStem(const wchar_t* libraryPath, std::size_t length) noexcept;
 
-// The integer at `key` of `section`, 0 when the file, the section or the key is missing. Names ignore case.
+// The integer at `key` of `section`, 0 when the file, the section or the key is missing. Section and key are ASCII and
+// ignore case. "-5" and "0x10" are numbers, "12ab" is 12, "ab" is 0.
 int ReadConfigurationInteger(const wchar_t* path, const wchar_t* section, const wchar_t* key) noexcept;
 
 // --- debugger and message box --------------------------------------------------------------------------------------
 
+// POSIX: a tracer; looked up at most once a second.
 bool IsDebuggerAttached() noexcept;
-// POSIX: standard error as UTF-8, only while a tracer is attached.
+// Null is ignored. POSIX: standard error as UTF-8, only while a tracer is attached.
 void WriteDebuggerOutput(const char* text) noexcept;
 void WriteDebuggerOutput(const wchar_t* text) noexcept;
 
@@ -47,7 +49,7 @@ bool AskOkCancel(const char* caption, const char* text) noexcept;
 
 // Milliseconds since 1970-01-01 00:00 UTC.
 std::uint64_t GetUtcMilliseconds() noexcept;
-// Monotonic milliseconds since the process started (or the library was loaded, whichever the system tells).
+// Monotonic milliseconds since the process started; where the system does not tell its start, since the first call.
 std::uint64_t GetProcessMilliseconds() noexcept;
 // The high-resolution counter and its ticks per second; false when the system fails to tell.
 bool GetCounterFrequency(std::int64_t& ticksPerSecond) noexcept;
@@ -55,8 +57,9 @@ bool ReadCounter(std::int64_t& ticks) noexcept;
 
 // --- code page -----------------------------------------------------------------------------------------------------
 
-// The call protocol of MultiByteToWideChar and WideCharToMultiByte with the ANSI code page: length -1 (any negative one)
-// means up to and including the terminator, capacity 0 asks for the size, 0 is failure. POSIX: the code page is UTF-8.
+// The call protocol of MultiByteToWideChar and WideCharToMultiByte with the ANSI code page: length -1 (any negative
+// one) means up to and including the terminator, capacity 0 asks for the size, 0 is failure. POSIX: the code page is
+// UTF-8.
 int AnsiToWide(const char* source, int length, wchar_t* target, int capacity) noexcept;
 int WideToAnsi(const wchar_t* source, int length, char* target, int capacity) noexcept;
 
@@ -76,12 +79,27 @@ std::uint32_t GetThreadId() noexcept;
 int GetThreadPriority() noexcept;
 void SetThreadPriority(int priority) noexcept;
 
-// One pointer per thread, null at first: the thread's current release scope (object memory).
+// One pointer per thread, null at first: the thread's current release scope (object memory). Where the system has no
+// slot left, it stays null.
 void* GetReleaseScope() noexcept;
 void SetReleaseScope(void* scope) noexcept;
 
 // Gives up the processor, or sleeps.
 void YieldThread() noexcept;
 void SleepMilliseconds(std::uint32_t milliseconds) noexcept;
+
+// A lock that is ready before any constructor has run and is never destroyed. Not recursive.
+class Mutex {
+public:
+    constexpr Mutex() noexcept = default;
+    Mutex(const Mutex&) = delete;
+    Mutex& operator=(const Mutex&) = delete;
+    void lock() noexcept; // names of the standard, for std::lock_guard
+    bool try_lock() noexcept;
+    void unlock() noexcept;
+
+private:
+    std::uint64_t m_storage[5] = {}; // the system's lock, whose initial state is all zero
+};
 
 } // namespace TAVO::Platform
