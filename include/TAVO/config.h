@@ -31,17 +31,19 @@
 #define TAVO_TEMPLATE_DEF
 #endif
 
-// For the library's own hot paths.
+// For the library's own hot paths. TAVO_NOSANITIZE is for loops that load aligned blocks around the text they may read.
 #if defined(_MSC_VER)
 #define TAVO_NOINLINE __declspec(noinline)
 #define TAVO_INLINE __forceinline
 #define TAVO_LIKELY(condition) (condition)
 #define TAVO_UNLIKELY(condition) (condition)
+#define TAVO_NOSANITIZE
 #else
 #define TAVO_NOINLINE __attribute__((noinline))
 #define TAVO_INLINE inline __attribute__((always_inline))
 #define TAVO_LIKELY(condition) __builtin_expect(!!(condition), 1)
 #define TAVO_UNLIKELY(condition) __builtin_expect(!!(condition), 0)
+#define TAVO_NOSANITIZE __attribute__((no_sanitize("address"), no_sanitize("thread")))
 #endif
 
 namespace TAVO {

@@ -1,0 +1,347 @@
+#pragma once
+// Text: transcoding between UTF-8, UTF-16, UTF-32 and the ANSI code page, owned strings of one character set each, and
+// utilities over wide text.
+//
+// Wide characters have 16 bits and hold UTF-16, so every acfW function behaves as its UTF16 namesake.
+// Threads: the functions keep no state and may be called from any thread; an object is for one thread at a time.
+
+#include <cstddef>
+#include <TAVO/config.h>
+
+namespace TAVO {
+namespace String {
+
+/// The wide character of the component framework: one UTF-16 unit.
+using acfWChar = wchar_t;
+
+// --- Transcoding ---------------------------------------------------------------------------------------------------
+//
+// These rules are the library's own and stored text depends on them. They leave the textbook in four places:
+// - UTF-8 may be overlong, may encode surrogates and may reach 13FFFF; 80 to BF and F5 to FF begin no sequence.
+// - A UTF-16 pair is a unit D800 to DBFF followed by any unit from DBFF up. It decodes to 0 when the low ten bits of
+// both
+//   units are zero, else to 1; so no character above FFFF ever comes out of UTF-16.
+// - Such characters encode to UTF-16 without the usual offset: 10000 becomes D840 DC00, 10FFFF becomes DC3F DFFF, which
+//   is no standard UTF-16. From 100000 up the first unit is a low surrogate, and this library cannot decode it either.
+// - The UTF-32 counters include the element at index n.
+
+/// The bytes of a code point in UTF-8: 1 to 4; 0 from 110000 up.
+TAVO_API std::size_t UTF8Size(ulong32 codePoint);
+/// The bytes of the sequence that begins with @p lead: 1 to 4; 0 for a byte that begins none.
+TAVO_API std::size_t UTF8Len(unsigned char lead);
+/// The units of a code point in UTF-16: 1 or 2; 0 above 110000, which itself counts 2.
+TAVO_API std::size_t UTF16Size(ulong32 codePoint);
+/// The units of the character that begins with @p unit: 1 or 2; 0 for a low surrogate.
+TAVO_API std::size_t UTF16Len(unsigned short unit);
+/// The wide characters of a code point: 1 below 10000, else 2, without an upper bound.
+TAVO_API std::size_t acfWSize(ulong32 codePoint);
+/// Always 1: a wide character has 16 bits, and surrogates are not looked at.
+TAVO_API std::size_t acfWLen(wchar_t unit);
+
+/// Steps over two-byte lead bytes (C0 to DF), and over nothing else: continuation bytes stay. Requires: a terminated
+/// text.
+TAVO_API void UTF8Sync(const unsigned char*& text);
+/// Steps over low surrogates (DC00 to DFFF). Requires: a terminated text.
+TAVO_API void UTF16Sync(const unsigned short*& text);
+TAVO_API void acfWSync(const wchar_t*& text);
+
+// Counting: how many target units the source converts to, its terminator not counted. The count ends at the source's
+// terminator, before the index n (in source units) and before the first invalid or cut sequence; the result does not
+// tell which. Nothing is read at or behind index n nor behind the terminator; any n beyond the terminator, SIZE_MAX for
+// example, means the whole text. A null source counts 0. In the names w is acfWChar, w32 a code point, u16 a UTF-16
+// unit, u8 a UTF-8 byte.
+
+/// Code points of UTF-8 text.
+TAVO_API std::size_t UTF8w32strlen(const unsigned char* source, std::size_t n);
+/// UTF-16 units of UTF-8 text; values above 10FFFF, which no converter writes, count 2.
+TAVO_API std::size_t UTF8u16strlen(const unsigned char* source, std::size_t n);
+TAVO_API std::size_t UTF8wstrlen(const unsigned char* source, std::size_t n);
+/// Code points of UTF-16 text; a pair counts 1.
+TAVO_API std::size_t UTF16w32strlen(const unsigned short* source, std::size_t n);
+TAVO_API std::size_t acfWw32strlen(const wchar_t* source, std::size_t n);
+/// UTF-8 bytes of UTF-16 text; a pair counts 1, since it decodes to 0 or 1.
+TAVO_API std::size_t UTF16u8strlen(const unsigned short* source, std::size_t n);
+TAVO_API std::size_t acfWu8strlen(const wchar_t* source, std::size_t n);
+/// Units before the terminator, at most n, nothing decoded. Guarded: 0 when any part of the text cannot be read, at the
+/// cost of a system call per memory page.
+TAVO_API std::size_t UTF16wstrlen(const unsigned short* source, std::size_t n);
+TAVO_API std::size_t acfWu16strlen(const wchar_t* source, std::size_t n);
+/// Units of UTF-32 text; a value above 110000 ends it. The element at index n is examined too: the array holds n + 1
+/// elements or a terminator before. n = 0 counts 0.
+TAVO_API std::size_t UTF32wstrlen(const ulong32* source, std::size_t n);
+TAVO_API std::size_t UTF32u16strlen(const ulong32* source, std::size_t n);
+/// UTF-8 bytes of UTF-32 text, index n included as above; a value from 110000 up ends it.
+TAVO_API std::size_t UTF32u8strlen(const ulong32* source, std::size_t n);
+
+// Step converters: one character each; both pointers advance behind what was read and written. False is failure, and
+// leaves the output and both pointers as they were, except where the function says otherwise.
+// Requires: non-null pointers, terminated sources, room for the longest character (4 bytes or 2 units).
+
+/// Decodes one sequence. A byte that begins none stores 0; a bad continuation byte stores what was decoded before it
+/// and leaves @p in on that byte.
+TAVO_API bool utf8_acfW32(ulong32* out, const unsigned char*& in);
+/// Decodes one unit or pair; a pair to 0 or 1.
+TAVO_API bool acfW_acfW32(ulong32* out, const wchar_t*& in);
+TAVO_API bool utf16_acfW32(ulong32* out, const unsigned short*& in);
+/// Encodes one code point as 1 to 4 bytes; surrogates too. Fails above 10FFFF.
+TAVO_API bool acfW32_utf8(unsigned char*& out, ulong32 codePoint);
+/// Encodes one code point as 1 or 2 units, without the offset of 10000 (see above). Fails above 10FFFF.
+TAVO_API bool acfW32_acfW(wchar_t*& out, ulong32 codePoint);
+TAVO_API bool acfW32_utf16(unsigned short*& out, ulong32 codePoint);
+/// utf8_acfW32, then acfW32_acfW. A failure moves @p in as the first does; a value above 10FFFF fails behind its
+/// sequence.
+TAVO_API bool utf8_acfW(wchar_t*& out, const unsigned char*& in);
+TAVO_API bool utf8_utf16(unsigned short*& out, const unsigned char*& in);
+/// Copies one unit as it is; always true.
+TAVO_API bool utf16_acfW(wchar_t*& out, const unsigned short*& in);
+/// acfW_acfW32, then acfW32_utf8; a pair becomes the byte 0 or 1.
+TAVO_API bool acfW_utf8(unsigned char*& out, const wchar_t*& in);
+TAVO_API bool utf16_utf8(unsigned char*& out, const unsigned short*& in);
+/// acfW_acfW32, the value as one unit; a pair becomes the unit 0 or 1.
+TAVO_API bool acfW_utf16(unsigned short*& out, const wchar_t*& in);
+
+// Whole-string converters: with a null target the size needed, terminator included; else the units written, terminator
+// included. 0 is failure: a null source, a capacity below the size needed (nothing is written then), or a sequence that
+// was measured but cannot be converted (the units before it stay, no terminator).
+// What is invalid ends a text silently: 41 80 42 gives the one letter 41 with result 2. But behind a character that
+// takes more than one target unit, an invalid sequence makes the result 0. And F4 90 80 80, beyond 10FFFF, measures 3
+// and then converts to 0. A text that the source length or the terminator cuts is no failure.
+
+/// UTF-8 to wide text; lengths and result in source and target units. At most @p targetCapacity units are written.
+TAVO_API std::size_t UTF8_To_acfWChar(const unsigned char* source, std::size_t sourceLength, wchar_t* target,
+                                      std::size_t targetCapacity);
+/// Wide text to UTF-8, as above; a pair becomes the byte 0 or 1.
+TAVO_API std::size_t acfWChar_To_UTF8(const wchar_t* source, std::size_t sourceLength, unsigned char* target,
+                                      std::size_t targetCapacity);
+
+namespace OS {
+
+/// Text of the ANSI code page (Linux: UTF-8, whatever the locale) to wide text, by the rules of the system's
+/// conversion. Lengths are cut to 32-bit signed numbers: a negative source length (SIZE_MAX) means up to and including
+/// the terminator; any other is converted as it is, without one. Capacity 0 asks for the size.
+/// @return units written or needed; 0 on failure, a capacity too small included: the target is undefined then.
+TAVO_API std::size_t ANSI_To_acfWChar(const char* source, std::size_t sourceLength, wchar_t* target,
+                                      std::size_t targetCapacity);
+/// Wide text to text of the ANSI code page, as above.
+TAVO_API std::size_t acfWChar_To_ANSI(const wchar_t* source, std::size_t sourceLength, char* target,
+                                      std::size_t targetCapacity);
+
+} // namespace OS
+
+// --- Strings of one character set ----------------------------------------------------------------------------------
+//
+// Each owns a zero-terminated buffer or none; every copy allocates its own. Text null is the absent string: the
+// default, the result of a null source, of a failed allocation and of a failed ANSI conversion. It is not the empty
+// text, which has a buffer. Conversions follow the rules above; what is invalid ends the text, and what was converted
+// is kept. A new text is built before the old one is freed, so a source inside the string's own text is safe.
+//
+// len() is a record of the last assignment, not a measure: see each class. Look at operator bool before using it.
+
+class CUTF8Char;
+class CUTF16Char;
+class CANSIChar;
+
+/// Wide text, the library's working string.
+/// len() counts the terminator after an assignment from wide text (a copy included) and from ANSI text, and does not
+/// after one from UTF-8, UTF-16 or UTF-32. A null source gives 0. From wide text it is set even when the allocation
+/// fails.
+class TAVO_API CACFWChar {
+public:
+    CACFWChar() noexcept = default;
+    CACFWChar(const CACFWChar& other);
+    CACFWChar(const wchar_t* text);
+    /// UTF-16 units, copied as they are.
+    CACFWChar(const unsigned short* text);
+    /// UTF-8.
+    CACFWChar(const unsigned char* text);
+    /// UTF-32; a value above 10FFFF ends the text.
+    CACFWChar(const ulong32* text);
+    /// The ANSI code page.
+    CACFWChar(const char* text);
+    CACFWChar(const CUTF8Char& text);
+    CACFWChar(const CUTF16Char& text);
+    CACFWChar(const CANSIChar& text);
+    ~CACFWChar();
+
+    /// Assigned to itself, a string keeps its text and gets the length of one assigned from wide text.
+    CACFWChar& operator=(const CACFWChar& other);
+    CACFWChar& operator=(const wchar_t* text);
+    CACFWChar& operator=(const unsigned short* text);
+    CACFWChar& operator=(const unsigned char* text);
+    CACFWChar& operator=(const ulong32* text);
+    CACFWChar& operator=(const char* text);
+    CACFWChar& operator=(const CUTF8Char& text);
+    CACFWChar& operator=(const CUTF16Char& text);
+    CACFWChar& operator=(const CANSIChar& text);
+
+    /// Replaces every "%s" by @p text, which is not scanned again. Null changes nothing, nor does a failed allocation.
+    /// len() grows by the inserted units and not by less for the removed ones, so it is above the true count
+    /// afterwards.
+    void patch_percent_s_with(const wchar_t* text);
+
+    std::size_t len() const noexcept { return m_length; }
+    /// Whether there is a text; "" is one.
+    operator bool() const noexcept { return m_text != nullptr; }
+    /// The text, null when absent; valid until the next change.
+    const wchar_t* operator*() const noexcept { return m_text; }
+    operator const wchar_t*() const noexcept { return m_text; }
+
+private:
+    wchar_t* m_text = nullptr;
+    std::size_t m_length = 0;
+};
+
+/// UTF-8 text. len() counts the bytes without the terminator.
+/// A null UTF-8 source, a copy of an absent string included, gives len() SIZE_MAX; any other null source 0.
+class TAVO_API CUTF8Char {
+public:
+    CUTF8Char() noexcept = default;
+    CUTF8Char(const CUTF8Char& other);
+    CUTF8Char(const wchar_t* text);
+    CUTF8Char(const unsigned short* text);
+    CUTF8Char(const unsigned char* text);
+    /// The ANSI code page.
+    CUTF8Char(const char* text);
+    CUTF8Char(const CACFWChar& text);
+    CUTF8Char(const CUTF16Char& text);
+    CUTF8Char(const CANSIChar& text);
+    ~CUTF8Char();
+
+    /// Assigned to itself, a string stays as it is.
+    CUTF8Char& operator=(const CUTF8Char& other);
+    CUTF8Char& operator=(const wchar_t* text);
+    CUTF8Char& operator=(const unsigned short* text);
+    CUTF8Char& operator=(const unsigned char* text);
+    CUTF8Char& operator=(const char* text);
+    CUTF8Char& operator=(const CACFWChar& text);
+    CUTF8Char& operator=(const CUTF16Char& text);
+    CUTF8Char& operator=(const CANSIChar& text);
+
+    std::size_t len() const noexcept { return m_length; }
+    /// Whether there is a text; "" is one.
+    operator bool() const noexcept { return m_text != nullptr; }
+    /// The text, null when absent; valid until the next change.
+    const unsigned char* operator*() const noexcept { return m_text; }
+    operator const unsigned char*() const noexcept { return m_text; }
+
+private:
+    unsigned char* m_text = nullptr;
+    std::size_t m_length = 0;
+};
+
+/// UTF-16 text. len() counts the units without the terminator.
+/// A null UTF-16 source, a copy of an absent string included, gives len() SIZE_MAX; any other null source 0.
+class TAVO_API CUTF16Char {
+public:
+    CUTF16Char() noexcept = default;
+    CUTF16Char(const CUTF16Char& other);
+    /// Wide text, decoded: a pair becomes the unit 0 or 1.
+    CUTF16Char(const wchar_t* text);
+    /// Copied as it is.
+    CUTF16Char(const unsigned short* text);
+    /// UTF-8.
+    CUTF16Char(const unsigned char* text);
+    /// The ANSI code page.
+    CUTF16Char(const char* text);
+    CUTF16Char(const CACFWChar& text);
+    CUTF16Char(const CUTF8Char& text);
+    CUTF16Char(const CANSIChar& text);
+    ~CUTF16Char();
+
+    /// Assigned to itself, a string stays as it is.
+    CUTF16Char& operator=(const CUTF16Char& other);
+    CUTF16Char& operator=(const wchar_t* text);
+    CUTF16Char& operator=(const unsigned short* text);
+    CUTF16Char& operator=(const unsigned char* text);
+    CUTF16Char& operator=(const char* text);
+    CUTF16Char& operator=(const CACFWChar& text);
+    CUTF16Char& operator=(const CUTF8Char& text);
+    CUTF16Char& operator=(const CANSIChar& text);
+
+    std::size_t len() const noexcept { return m_length; }
+    /// Whether there is a text; "" is one.
+    operator bool() const noexcept { return m_text != nullptr; }
+    /// The text, null when absent; valid until the next change.
+    const unsigned short* operator*() const noexcept { return m_text; }
+    operator const unsigned short*() const noexcept { return m_text; }
+
+private:
+    unsigned short* m_text = nullptr;
+    std::size_t m_length = 0;
+};
+
+/// Text of the ANSI code page (Linux: UTF-8). len() counts the bytes without the terminator; a null source gives 0.
+class TAVO_API CANSIChar {
+public:
+    CANSIChar() noexcept = default;
+    CANSIChar(const CANSIChar& other);
+    CANSIChar(const wchar_t* text);
+    CANSIChar(const char* text);
+    CANSIChar(const CACFWChar& text);
+    ~CANSIChar();
+
+    /// Assigned to itself, a string stays as it is.
+    CANSIChar& operator=(const CANSIChar& other);
+    CANSIChar& operator=(const wchar_t* text);
+    CANSIChar& operator=(const char* text);
+    CANSIChar& operator=(const CACFWChar& text);
+
+    std::size_t len() const noexcept { return m_length; }
+    /// Whether there is a text; "" is one.
+    operator bool() const noexcept { return m_text != nullptr; }
+    /// The text, null when absent; valid until the next change.
+    const char* operator*() const noexcept { return m_text; }
+    operator const char*() const noexcept { return m_text; }
+
+private:
+    char* m_text = nullptr;
+    std::size_t m_length = 0;
+};
+
+static_assert(sizeof(CACFWChar) == 16 && sizeof(CUTF8Char) == 16 && sizeof(CUTF16Char) == 16 && sizeof(CANSIChar) == 16,
+              "a string is its text and its length");
+
+// --- Wide-character utilities --------------------------------------------------------------------------------------
+//
+// Letters fold A to Z and a to z and nothing else, on every platform and in every locale: stored hashes depend on it.
+// All texts are zero-terminated.
+
+/// A to Z to lower case; every other unit as it is.
+TAVO_API wchar_t wctolower(const wchar_t& c);
+/// a to z to upper case; every other unit as it is.
+TAVO_API wchar_t wctoupper(const wchar_t& c);
+/// Maps a text in place; null is ignored.
+TAVO_API void wcslower(wchar_t* text);
+TAVO_API void wcsupper(wchar_t* text);
+
+/// 0 for the same letter in any case, else the difference of the two in lower case.
+TAVO_API int wccmpi(wchar_t a, wchar_t b);
+/// Compares two texts regardless of case: 0, or the difference of the first two units that differ in lower case.
+/// Null and null are equal; a null text sorts AFTER every other, so null against a text gives 1, the reverse -1.
+TAVO_API int wcscmpi(const wchar_t* a, const wchar_t* b);
+/// wcscmpi over at most @p n units. n is taken as a 32-bit signed count: below 1, SIZE_MAX included, two texts are
+/// equal. Null pointers are answered first, as wcscmpi does.
+TAVO_API int wcsncmpi(const wchar_t* a, const wchar_t* b, std::size_t n);
+
+/// Whether @p part occurs in @p text. True for one pointer given twice, null or empty included; else false when either
+/// is null or empty.
+TAVO_API bool wcscnt(const wchar_t* text, const wchar_t* part);
+/// wcscnt within the first @p n units, which the whole occurrence must lie in. Nothing is read at or behind index n.
+TAVO_API bool wcsncnt(const wchar_t* text, const wchar_t* part, std::size_t n);
+/// wcscnt and wcsncnt regardless of case.
+TAVO_API bool wcscnti(const wchar_t* text, const wchar_t* part);
+TAVO_API bool wcsncnti(const wchar_t* text, const wchar_t* part, std::size_t n);
+/// How many units of @p text equal @p c; 0 for null.
+TAVO_API std::size_t wcscount(const wchar_t* text, wchar_t c);
+
+/// '/' or '\'.
+TAVO_API bool _isSlash(wchar_t c);
+/// The space only, not the tab.
+TAVO_API bool _isblank(wchar_t c);
+/// Space, tab, line feed or carriage return.
+TAVO_API bool _iswhitespace(wchar_t c);
+/// Line feed or carriage return.
+TAVO_API bool _isCRLF(wchar_t c);
+
+} // namespace String
+} // namespace TAVO

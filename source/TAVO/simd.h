@@ -1,0 +1,180 @@
+#pragma once
+// Blocks of 16 bytes: the only place with compiler intrinsics. SSE2 belongs to every x86-64 processor; elsewhere, or
+// with TAVO_NO_SIMD defined, the same operations are plain loops.
+
+#include <bit>
+#include <cstdint>
+#include <cstring>
+#include <TAVO/config.h>
+
+#if (defined(__SSE2__) || defined(_M_X64)) && !defined(TAVO_NO_SIMD)
+#include <emmintrin.h>
+#define TAVO_SSE2 1
+#endif
+
+namespace TAVO::Simd {
+
+constexpr std::size_t kBlock = 16;
+
+#if defined(TAVO_SSE2)
+
+using Block = __m128i;
+
+TAVO_INLINE Block Load(const void* p) { return _mm_loadu_si128(static_cast<const Block*>(p)); }
+TAVO_INLINE Block LoadAligned(const void* p) { return _mm_load_si128(static_cast<const Block*>(p)); }
+TAVO_INLINE void Store(void* p, Block x) { _mm_storeu_si128(static_cast<Block*>(p), x); }
+TAVO_INLINE void StoreHalf(void* p, Block x) { _mm_storel_epi64(static_cast<Block*>(p), x); }
+TAVO_INLINE Block All8(int value) { return _mm_set1_epi8(static_cast<char>(value)); }
+TAVO_INLINE Block All16(int value) { return _mm_set1_epi16(static_cast<short>(value)); }
+TAVO_INLINE Block And(Block a, Block b) { return _mm_and_si128(a, b); }
+TAVO_INLINE Block Or(Block a, Block b) { return _mm_or_si128(a, b); }
+TAVO_INLINE Block Equal8(Block a, Block b) { return _mm_cmpeq_epi8(a, b); }
+TAVO_INLINE Block Equal16(Block a, Block b) { return _mm_cmpeq_epi16(a, b); }
+// Unsigned a >= b.
+TAVO_INLINE Block AtLeast8(Block a, Block b) { return _mm_cmpeq_epi8(_mm_max_epu8(a, b), a); }
+// Signed a < b.
+TAVO_INLINE Block Below8(Block a, Block b) { return _mm_cmplt_epi8(a, b); }
+TAVO_INLINE Block Subtract8(Block a, Block b) { return _mm_sub_epi8(a, b); }
+TAVO_INLINE Block Add16(Block a, Block b) { return _mm_add_epi16(a, b); }
+template <int bits> TAVO_INLINE Block ShiftLeft16(Block a) { return _mm_slli_epi16(a, bits); }
+template <int bits> TAVO_INLINE Block ShiftRight16(Block a) { return _mm_srli_epi16(a, bits); }
+// One bit per byte: its highest.
+TAVO_INLINE std::uint32_t Mask(Block a) { return static_cast<std::uint32_t>(_mm_movemask_epi8(a)); }
+// The bytes as 16-bit units, low and high half.
+TAVO_INLINE Block WidenLow(Block a) { return _mm_unpacklo_epi8(a, _mm_setzero_si128()); }
+TAVO_INLINE Block WidenHigh(Block a) { return _mm_unpackhi_epi8(a, _mm_setzero_si128()); }
+// Bytes of two blocks of 16-bit units below 100, in order.
+TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
+// The sum of all unsigned bytes.
+TAVO_INLINE std::size_t Sum8(Block a) {
+    const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
+    return static_cast<std::size_t>(_mm_cvtsi128_si64(halves) + _mm_cvtsi128_si64(_mm_srli_si128(halves, 8)));
+}
+
+#else
+
+struct Block {
+    std::uint8_t b[16];
+};
+
+namespace detail {
+template <class Lane, class Function> Block Map(Block a, Block b, Function function) {
+    Lane x[16 / sizeof(Lane)], y[16 / sizeof(Lane)];
+    std::memcpy(x, &a, 16), std::memcpy(y, &b, 16);
+    for (std::size_t i = 0; i < 16 / sizeof(Lane); ++i) x[i] = static_cast<Lane>(function(x[i], y[i]));
+    std::memcpy(&a, x, 16);
+    return a;
+}
+} // namespace detail
+
+inline Block Load(const void* p) {
+    Block x;
+    std::memcpy(&x, p, 16);
+    return x;
+}
+inline Block LoadAligned(const void* p) { return Load(p); }
+inline void Store(void* p, Block x) { std::memcpy(p, &x, 16); }
+inline void StoreHalf(void* p, Block x) { std::memcpy(p, &x, 8); }
+inline Block All8(int value) {
+    Block x;
+    std::memset(&x, value, 16);
+    return x;
+}
+inline Block All16(int value) {
+    return detail::Map<std::uint16_t>({}, {}, [=](int, int) { return value; });
+}
+inline Block And(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x & y; });
+}
+inline Block Or(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x | y; });
+}
+inline Block Equal8(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x == y ? 0xFF : 0; });
+}
+inline Block Equal16(Block a, Block b) {
+    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x == y ? 0xFFFF : 0; });
+}
+inline Block AtLeast8(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x >= y ? 0xFF : 0; });
+}
+inline Block Below8(Block a, Block b) {
+    return detail::Map<std::int8_t>(a, b, [](int x, int y) { return x < y ? -1 : 0; });
+}
+inline Block Subtract8(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x - y; });
+}
+inline Block Add16(Block a, Block b) {
+    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x + y; });
+}
+template <int bits> Block ShiftLeft16(Block a) {
+    return detail::Map<std::uint16_t>(a, a, [](int x, int) { return x << bits; });
+}
+template <int bits> Block ShiftRight16(Block a) {
+    return detail::Map<std::uint16_t>(a, a, [](int x, int) { return x >> bits; });
+}
+inline std::uint32_t Mask(Block a) {
+    std::uint32_t mask = 0;
+    for (int i = 0; i < 16; ++i) mask |= static_cast<std::uint32_t>(a.b[i] >> 7) << i;
+    return mask;
+}
+inline Block WidenLow(Block a) {
+    Block x{};
+    for (int i = 0; i < 8; ++i) x.b[i * 2] = a.b[i];
+    return x;
+}
+inline Block WidenHigh(Block a) {
+    Block x{};
+    for (int i = 0; i < 8; ++i) x.b[i * 2] = a.b[i + 8];
+    return x;
+}
+inline Block Narrow(Block a, Block b) {
+    Block x;
+    for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
+    return x;
+}
+inline std::size_t Sum8(Block a) {
+    std::size_t sum = 0;
+    for (std::uint8_t byte : a.b) sum += byte;
+    return sum;
+}
+
+#endif
+
+// The index of the first zero unit, at most n.
+#if defined(TAVO_SSE2)
+// Only whole aligned blocks that hold a unit of the text are loaded, so no page is touched that the text does not
+// reach; sanitizers, which count bytes and not pages, are kept out.
+template <class Unit> TAVO_NOSANITIZE std::size_t ZeroUnit(const Unit* text, std::size_t n) {
+    const auto address = reinterpret_cast<std::uintptr_t>(text);
+    if (TAVO_UNLIKELY(address % sizeof(Unit) != 0)) { // no block holds whole units then
+        std::size_t i = 0;
+        while (i < n && text[i]) ++i;
+        return i;
+    }
+    if (n == 0) return 0;
+    const auto zeroes = [](Block block) {
+        return Mask(sizeof(Unit) == 1 ? Equal8(block, All8(0)) : Equal16(block, All16(0)));
+    };
+    const std::size_t skipped = address % kBlock;
+    const auto* block = reinterpret_cast<const unsigned char*>(text) - skipped;
+    std::uint32_t mask = zeroes(LoadAligned(block)) >> skipped;
+    std::size_t i = 0; // the unit that bit 0 of the mask stands for
+    for (std::size_t next = (kBlock - skipped) / sizeof(Unit); !mask; next += kBlock / sizeof(Unit)) {
+        if (next >= n) return n;
+        i = next;
+        block += kBlock;
+        mask = zeroes(LoadAligned(block));
+    }
+    const std::size_t found = i + static_cast<std::size_t>(std::countr_zero(mask)) / sizeof(Unit);
+    return found < n ? found : n;
+}
+#else
+template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
+    std::size_t i = 0;
+    while (i < n && text[i]) ++i;
+    return i;
+}
+#endif
+
+} // namespace TAVO::Simd
