@@ -3,6 +3,7 @@
 #include "platform/heap.h"
 
 #include <cstring>
+#include <initializer_list>
 #include <TAVO/files.h>
 
 namespace TAVO::Files {
@@ -227,8 +228,7 @@ bool FU_CreatePath(const wchar_t* path) noexcept {
     Scratch folder(length);
     if (!folder.Get()) return false;
     folder.Append(path, length);
-    // Cuts the text behind one component after the other. Whether a creation worked matters only for the last one: what
-    // exists already, or what another process made meanwhile, serves as well.
+    // Cuts the text behind one component after the other. A folder that another process made meanwhile serves as well.
     for (std::size_t i = root; i < length; ++i) {
         const bool atEnd = i + 1 == length || _isSlash(path[i + 1]);
         if (_isSlash(path[i]) || !atEnd) continue;

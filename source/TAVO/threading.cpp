@@ -20,7 +20,8 @@ struct MutexState {
     boost::timed_mutex mutex;
 };
 
-// The owner is compared without the lock: only the owner itself can make the comparison succeed. Nested counts belong to
+// The owner is compared without the lock: only the owner itself can make the comparison succeed. It is stored whole, which
+// is all that an exchange with an unused result would give; order comes from the mutex around it. Nested counts belong to
 // the holder; they are atomic only so that misuse stays a mistake in logic.
 struct CriticalSectionState {
     std::atomic<std::uint32_t> count{0};
@@ -200,26 +201,48 @@ const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = kLockTable<CriticalSection
 CPCriticalSection::CPCriticalSection() noexcept
     : CPObjectMemory(Built(NewBlock(sizeof(CriticalSectionState), sizeof(CriticalSectionState), &_vtbl))) {}
 
-void CPCriticalSection::Enter() const noexcept { TryEnter(WaitForever); }
+namespace {
+
+void Own(CriticalSectionState& state, std::uint32_t self) {
+    state.owner.store(self, std::memory_order_relaxed);
+    state.count.store(1, std::memory_order_relaxed);
+}
+
+// Out of line, so that the owner's way in stays without a frame.
+TAVO_NOINLINE void TakeOwnership(CriticalSectionState& state, std::uint32_t self) noexcept {
+    TakeSurely([&] { state.mutex.lock(); });
+    Own(state, self);
+}
+
+TAVO_NOINLINE bool TakeOwnershipWithin(CriticalSectionState& state, std::uint32_t self, ulong32 ms) noexcept {
+    if (!TakeWithin(state.mutex, ms)) return false;
+    Own(state, self);
+    return true;
+}
+
+} // namespace
+
+void CPCriticalSection::Enter() const noexcept {
+    auto* state = StateOf<CriticalSectionState>(Payload());
+    if (!state) return;
+    const std::uint32_t self = Platform::GetThreadId();
+    if (IsHeldBy(state->owner, self)) return StepUp(state->count);
+    TakeOwnership(*state, self);
+}
 
 bool CPCriticalSection::TryEnter(ulong32 ms) const noexcept {
     auto* state = StateOf<CriticalSectionState>(Payload());
     if (!state) return false;
     const std::uint32_t self = Platform::GetThreadId();
-    if (IsHeldBy(state->owner, self)) {
-        StepUp(state->count);
-        return true;
-    }
-    if (!TakeWithin(state->mutex, ms)) return false;
-    state->owner.exchange(self, std::memory_order_relaxed);
-    state->count.store(1, std::memory_order_relaxed);
+    if (!IsHeldBy(state->owner, self)) return TakeOwnershipWithin(*state, self, ms);
+    StepUp(state->count);
     return true;
 }
 
 void CPCriticalSection::Leave() const noexcept {
     auto* state = StateOf<CriticalSectionState>(Payload());
     if (!state || StepDown(state->count) != 0) return;
-    state->owner.exchange(0, std::memory_order_relaxed);
+    state->owner.store(0, std::memory_order_relaxed);
     state->mutex.unlock();
 }
 
@@ -236,7 +259,7 @@ void CPRWInterlock::Enter() const noexcept {
     const std::uint32_t self = Platform::GetThreadId();
     if (IsHeldBy(state->writer, self)) return Nest(state->nestedWrites);
     TakeWithin(state->mutex, WaitForever);
-    state->writer.exchange(self, std::memory_order_relaxed);
+    state->writer.store(self, std::memory_order_relaxed);
 }
 
 void CPRWInterlock::EnterRead() const noexcept {
@@ -252,7 +275,7 @@ bool CPRWInterlock::TryEnter(ulong32 ms) const noexcept {
     const std::uint32_t self = Platform::GetThreadId();
     if (IsHeldBy(state->writer, self)) return TryNest(state->nestedWrites);
     if (!TakeWithin(state->mutex, ms)) return false;
-    state->writer.exchange(self, std::memory_order_relaxed);
+    state->writer.store(self, std::memory_order_relaxed);
     return true;
 }
 
@@ -266,7 +289,7 @@ bool CPRWInterlock::TryEnterRead(ulong32 ms) const noexcept {
 void CPRWInterlock::Leave() const noexcept {
     auto* state = StateOf<InterlockState>(Payload());
     if (!state || Unnest(state->nestedWrites)) return;
-    state->writer.exchange(0, std::memory_order_relaxed);
+    state->writer.store(0, std::memory_order_relaxed);
     state->mutex.unlock();
 }
 

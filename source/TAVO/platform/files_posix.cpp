@@ -11,6 +11,7 @@
 #include <cstring>
 #include <dirent.h>
 #include <fcntl.h>
+#include <initializer_list>
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <time.h>
@@ -28,8 +29,6 @@ auto Uninterrupted(Call call) {
         if (result != -1 || errno != EINTR) return result;
     }
 }
-
-bool IsSlash(wchar_t c) { return c == L'/' || c == L'\\'; }
 
 // A path as the system wants it. One that is too long or no text becomes "", which no call accepts.
 class NativePath {
