@@ -198,8 +198,8 @@ public:
 
     /// Starts over; an enumeration under way ends.
     /// @param dir          null or empty: the current directory; a separator at its end is optional
-    /// @param pattern      '*' any run, '?' one character (a surrogate pair is one), the rest literally, without regard to
-    ///                     case; null, empty, "*" and "*.*" match everything
+    /// @param pattern      '*' any run, '?' one character (a surrogate pair is one), the rest literally, A to Z without
+    ///                     regard to case; null, empty, "*" and "*.*" match everything
     /// @param directories  false: files only
     /// @return whether the directory can be read, also when nothing matches.
     bool BeginEnumerate(const wchar_t* dir, const wchar_t* pattern, bool directories) noexcept;
