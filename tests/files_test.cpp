@@ -21,7 +21,8 @@ constexpr std::size_t kNone = ~std::size_t{0};
 
 std::string Contents(const wchar_t* path) {
     CFile file;
-    if (!file.Open(path, FileAccessRead | FileAccessShareRead | FileAccessShareWrite, OpenFileExisting)) return "(cannot open)";
+    if (!file.Open(path, FileAccessRead | FileAccessShareRead | FileAccessShareWrite, OpenFileExisting))
+        return "(cannot open)";
     std::string bytes(file.GetSize(), 0);
     ulong32 done = 0;
     EXPECT_TRUE(file.Read(bytes.data(), static_cast<ulong32>(bytes.size()), &done));
@@ -38,7 +39,8 @@ TEST(FileOpen, FollowsTheTableOfOptions) {
     for (unsigned row = 0; row < 128; ++row) {
         const unsigned options = row % 16;
         const bool write = row & 16, share = row & 32, exists = row & 64;
-        SCOPED_TRACE(testing::Message() << "options " << options << " write " << write << " share " << share << " exists " << exists);
+        SCOPED_TRACE(testing::Message() << "options " << options << " write " << write << " share " << share
+                                        << " exists " << exists);
         const bool create = options & 1, truncate = options & 4, temporary = options & 8;
         bool expected = exists || create;
         if (temporary && (!create || share || !write)) expected = false;
@@ -90,7 +92,8 @@ TEST(FileOpen, ReadingInAMissingFolderLeavesItBehind_Intended) {
     CFile file;
     EXPECT_FALSE(file.Open(folder / L"new/file", FileAccessRead, OpenFileExisting));
     EXPECT_TRUE(_TestDirExists(folder / L"new"));
-    EXPECT_FALSE(file.Open(folder / L"other/file", FileAccessRead, OpenFileCreate)) << "excluded before the system is asked";
+    EXPECT_FALSE(file.Open(folder / L"other/file", FileAccessRead, OpenFileCreate))
+        << "excluded before the system is asked";
     EXPECT_FALSE(_TestDirExists(folder / L"other"));
 }
 
@@ -248,7 +251,8 @@ TEST(File, MovesItsHandle) {
 
 TEST(FileNames, OfEveryPlaneWork) {
     ScratchFolder folder;
-    const wchar_t* kNames[] = {L"plain.txt", L"Gr\u00FC\u00DFe \u20AC.txt", L"\u65E5\u672C\u8A9E", L"\U0001F600\U00010000\U0010FFFD.x"};
+    const wchar_t* kNames[] = {L"plain.txt", L"Gr\u00FC\u00DFe \u20AC.txt", L"\u65E5\u672C\u8A9E",
+                               L"\U0001F600\U00010000\U0010FFFD.x"};
     for (const wchar_t* name : kNames) {
         Put(folder / name, "abc");
         EXPECT_TRUE(_TestFileExists(folder / name));
@@ -289,7 +293,8 @@ TEST(FileActions, TellFilesFromFolders) {
     EXPECT_FALSE(_CreateDir(folder / L"x/y")) << "one level only";
     EXPECT_FALSE(_CreateDir(nullptr) || _CreateDir(L""));
     EXPECT_TRUE(_TestFileExists(file) && _TestDirExists(dir) && _TestDirExists(dir + L"/") && _TestDirExists(L"."));
-    EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(file) || _TestFileExists(folder / L"x") || _TestDirExists(folder / L"x"));
+    EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(file) || _TestFileExists(folder / L"x") ||
+                 _TestDirExists(folder / L"x"));
     EXPECT_FALSE(_TestFileExists(nullptr) || _TestFileExists(L"") || _TestDirExists(nullptr) || _TestDirExists(L""));
     EXPECT_FALSE(_DeleteFile(dir)) << "only files";
     EXPECT_FALSE(_DeleteFile(nullptr) || _DeleteFile(L"") || _DeleteFile(folder / L"x"));
@@ -297,7 +302,8 @@ TEST(FileActions, TellFilesFromFolders) {
     EXPECT_FALSE(_TestFileExists(file));
 }
 
-// --- enumeration -------------------------------------------------------------------------------------------------------
+// --- enumeration
+// -------------------------------------------------------------------------------------------------------
 
 namespace {
 
@@ -321,19 +327,32 @@ bool NaivelyMatches(const Characters& name, const Characters& pattern, std::size
     if (p == pattern.size()) return n == name.size();
     if (pattern[p] == '*')
         return NaivelyMatches(name, pattern, n, p + 1) || (n < name.size() && NaivelyMatches(name, pattern, n + 1, p));
-    return n < name.size() && (pattern[p] == '?' || pattern[p] == name[n]) && NaivelyMatches(name, pattern, n + 1, p + 1);
+    return n < name.size() && (pattern[p] == '?' || pattern[p] == name[n]) &&
+           NaivelyMatches(name, pattern, n + 1, p + 1);
 }
 
 } // namespace
 
 TEST(Enumeration, MatchesAsANaiveMatcherDoes) {
     ScratchFolder folder;
-    const wchar_t* kNames[] = {L"a", L"ab", L"abc.txt", L"ABD.TXT", L"abcabcabd", L"long name.html", L"x.y.z", L"noext",
-                               L"\u00E4rger.txt", L"\U0001F600", L"a\U0001F600b", L"[a]", L"a+b", L".hidden", L"aaaaaaaaaaaaaaaab"};
+    const wchar_t* kNames[] = {
+        L"a",     L"ab",      L"abc.txt",          L"ABD.TXT",    L"abcabcabd",    L"long name.html",
+        L"x.y.z", L"noext",   L"\u00E4rger.txt",   L"\U0001F600", L"a\U0001F600b", L"[a]",
+        L"a+b",   L".hidden", L"aaaaaaaaaaaaaaaab"};
     for (const wchar_t* name : kNames) Put(folder / name, "");
-    const wchar_t* kPatterns[] = {L"a*", L"*a", L"*b*", L"?", L"??", L"???", L"*.txt", L"*.TXT", L"a*c*d", L"**", L"*?", L"?*?",
-                                  L"a?b", L"x.?.*", L"*.", L"*.htm", L"\u00C4*", L"*\U0001F600*", L"[a]", L"a+b", L".*",
-                                  L"*a*a*a*a*a*a*a*b", L"*abd", L"ab", L"abc.txt?", L"missing"};
+    const wchar_t* kPatterns[] = {L"a*",       L"*a",
+                                  L"*b*",      L"?",
+                                  L"??",       L"???",
+                                  L"*.txt",    L"*.TXT",
+                                  L"a*c*d",    L"**",
+                                  L"*?",       L"?*?",
+                                  L"a?b",      L"x.?.*",
+                                  L"*.",       L"*.htm",
+                                  L"\u00C4*",  L"*\U0001F600*",
+                                  L"[a]",      L"a+b",
+                                  L".*",       L"*a*a*a*a*a*a*a*b",
+                                  L"*abd",     L"ab",
+                                  L"abc.txt?", L"missing"};
     for (const wchar_t* pattern : kPatterns) {
         std::vector<WideText> expected;
         for (const wchar_t* name : kNames)
@@ -389,7 +408,8 @@ TEST(Enumeration, TellsSizesAndTimes) {
     // Milliseconds since 1970 to units of 100 ns since 1601.
     const auto now = (TAVO::Core::OS::GetTimeNow() + 11644473600000ULL) * 10000;
     constexpr unsigned long long kMinute = 600000000;
-    for (const auto time : {entry.GetLastModified(), entry.GetLastAccessed(), entry.GetCreated() ? entry.GetCreated() : now}) {
+    for (const auto time :
+         {entry.GetLastModified(), entry.GetLastAccessed(), entry.GetCreated() ? entry.GetCreated() : now}) {
         EXPECT_GT(time, now - kMinute);
         EXPECT_LT(time, now + kMinute);
     }

@@ -43,15 +43,13 @@ public:
         std::unique_lock lock(m_mutex);
         m_changed.wait(lock, [this] { return !m_step; });
     }
-    template <class Step>
-    auto Do(Step step) {
+    template <class Step> auto Do(Step step) {
         decltype(step()) result{};
         Start([&] { result = step(); });
         Finish();
         return result;
     }
-    template <class Step>
-    void DoVoid(Step step) {
+    template <class Step> void DoVoid(Step step) {
         Start(step);
         Finish();
     }
@@ -83,8 +81,7 @@ std::chrono::milliseconds TimeOf(const std::function<void()>& body) {
     return std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::steady_clock::now() - start);
 }
 
-template <class Lock>
-class AnyLock : public testing::Test {};
+template <class Lock> class AnyLock : public testing::Test {};
 using Locks = testing::Types<CPMutex, CPCriticalSection, CPRWInterlock>;
 TYPED_TEST_SUITE(AnyLock, Locks);
 
@@ -156,7 +153,8 @@ TYPED_TEST(AnyLock, HasItsOwnTypeAndNoCopies) {
     EXPECT_EQ(lock.GetTypeID(), TypeParam().GetTypeID());
     EXPECT_TRUE(block.IsType(lock.GetTypeID()));
     EXPECT_EQ((block.GetTypeID() == CPMutex::GetTypeID()) + (block.GetTypeID() == CPCriticalSection::GetTypeID()) +
-                  (block.GetTypeID() == CPRWInterlock::GetTypeID()), 1);
+                  (block.GetTypeID() == CPRWInterlock::GetTypeID()),
+              1);
     EXPECT_EQ(TypeParam::_vtbl.clone, nullptr);
 }
 
@@ -306,12 +304,14 @@ TEST(LocksUnderStress, GuardPlainData) {
                 if ((i + t) % 3 == 0)
                     mutex.Enter();
                 else
-                    while (!mutex.TryEnter(i % 2 ? 0 : 1)) {}
+                    while (!mutex.TryEnter(i % 2 ? 0 : 1)) {
+                    }
                 ++underMutex;
                 mutex.Leave();
 
                 section.Enter();
-                while (!section.TryEnter(0)) {}
+                while (!section.TryEnter(0)) {
+                }
                 ++underSection;
                 section.Leave();
                 section.Leave();

@@ -117,10 +117,14 @@ TEST(FormatPath, PutsInWhatIsMissing) {
     const struct {
         const wchar_t *root, *folder, *stem, *extension, *expected;
     } kRows[] = {
-        {L"", L"a", L"b", L"c", L"a/b.c"},          {L"C:\\", L"a", L"b", L".c", L"C:\\a\\b.c"},
-        {L"", L"a\\b", L"c", L"", L"a\\b\\c"},      {L"", L"a/", L"b", L"", L"a/b"},
-        {L"", L"a", L"", L"", L"a"},                {L"", L"a", L"", L"txt", L"a/.txt"},
-        {L"//s/x/", L"a\\b", L"c", L"", L"//s/x/a\\b/c"}, {L"", L"", L"", L".", L"."},
+        {L"", L"a", L"b", L"c", L"a/b.c"},
+        {L"C:\\", L"a", L"b", L".c", L"C:\\a\\b.c"},
+        {L"", L"a\\b", L"c", L"", L"a\\b\\c"},
+        {L"", L"a/", L"b", L"", L"a/b"},
+        {L"", L"a", L"", L"", L"a"},
+        {L"", L"a", L"", L"txt", L"a/.txt"},
+        {L"//s/x/", L"a\\b", L"c", L"", L"//s/x/a\\b/c"},
+        {L"", L"", L"", L".", L"."},
     };
     for (const auto& row : kRows) {
         tagCPATHPARSEINFO info;
@@ -146,13 +150,59 @@ TEST(FormatPath, LongPathsAndFailingAllocations) {
 }
 
 TEST(StraightPath, FollowsTheTable) {
-    const wchar_t* kStraight[] = {L"a", L"a/b.c", L"a\\b", L"a/", L".profile", L"a..b", L"C:\\a", L"C:\\", L"C:a", L"/", L"/a/b",
-                                  L"\\\\server\\share\\a", L"\\\\?\\C:\\a", L"\\\\.\\a", L" a", L"\u65E5\u672C", L"\U0001F600"};
-    const wchar_t* kOthers[] = {L"",       L".",      L"..",    L"../a",   L"a/../b",    L"a/.",     L"a//b",       L"a/\\",
-                                L"//a",    L"a*",     L"a?",    L"a\"",    L"<",         L">",       L"a|b",        L"ab:c",
-                                L"C:\\a:", L"C:..",   L"C::",   L"a.",     L"a ",        L"a /b",    L"a./b",       L"a\tb",
-                                L"a\x7F",  L"a\x85",  L"C:\\\\a", L"\\\\..\\share\\a", L"\\\\s*\\share\\a", L"\\\\?\\C:\\..", L"\\\\?\\?",
-                                L"1:\\a",  L"\x01",   L"\x1F",  L"...",    L"\\\\s\\share.\\a"};
+    const wchar_t* kStraight[] = {L"a",
+                                  L"a/b.c",
+                                  L"a\\b",
+                                  L"a/",
+                                  L".profile",
+                                  L"a..b",
+                                  L"C:\\a",
+                                  L"C:\\",
+                                  L"C:a",
+                                  L"/",
+                                  L"/a/b",
+                                  L"\\\\server\\share\\a",
+                                  L"\\\\?\\C:\\a",
+                                  L"\\\\.\\a",
+                                  L" a",
+                                  L"\u65E5\u672C",
+                                  L"\U0001F600"};
+    const wchar_t* kOthers[] = {L"",
+                                L".",
+                                L"..",
+                                L"../a",
+                                L"a/../b",
+                                L"a/.",
+                                L"a//b",
+                                L"a/\\",
+                                L"//a",
+                                L"a*",
+                                L"a?",
+                                L"a\"",
+                                L"<",
+                                L">",
+                                L"a|b",
+                                L"ab:c",
+                                L"C:\\a:",
+                                L"C:..",
+                                L"C::",
+                                L"a.",
+                                L"a ",
+                                L"a /b",
+                                L"a./b",
+                                L"a\tb",
+                                L"a\x7F",
+                                L"a\x85",
+                                L"C:\\\\a",
+                                L"\\\\..\\share\\a",
+                                L"\\\\s*\\share\\a",
+                                L"\\\\?\\C:\\..",
+                                L"\\\\?\\?",
+                                L"1:\\a",
+                                L"\x01",
+                                L"\x1F",
+                                L"...",
+                                L"\\\\s\\share.\\a"};
     for (const wchar_t* path : kStraight) EXPECT_TRUE(FU_IsStraightPath(path)) << testing::PrintToString(path);
     for (const wchar_t* path : kOthers) EXPECT_FALSE(FU_IsStraightPath(path)) << testing::PrintToString(path);
     EXPECT_FALSE(FU_IsStraightPath(nullptr));

@@ -1,8 +1,9 @@
 #pragma once
 // Files, directories and the parts of paths.
 //
-// Paths are zero-terminated UTF-16; '/' and '\' both separate, on every platform. Where the system wants UTF-8, paths are
-// converted with ordinary surrogate pairs, so every valid name can be opened; a name that contains '\' is out of reach there.
+// Paths are zero-terminated UTF-16; '/' and '\' both separate, on every platform. Where the system wants UTF-8, paths
+// are converted with ordinary surrogate pairs, so every valid name can be opened; a name that contains '\' is out of
+// reach there.
 //
 // Threads: functions may be called from any thread; one object is for one thread at a time.
 
@@ -53,8 +54,8 @@ TAVO_API bool FU_ParsePath(const wchar_t* path, tagPATHPARSEINFO& info) noexcept
 /// The same into texts of their own. False, with an empty record, also without memory.
 TAVO_API bool FU_ParsePath(const wchar_t* path, tagCPATHPARSEINFO& info) noexcept;
 
-/// Joins the parts. A folder that lacks its last separator gets one before a name: the first one used in the root or the
-/// folder, else '/'. An extension without a dot gets one.
+/// Joins the parts. A folder that lacks its last separator gets one before a name: the first one used in the root or
+/// the folder, else '/'. An extension without a dot gets one.
 /// @return the path; a null text without memory.
 TAVO_API String::CACFWChar FU_FormatPath(const tagPATHPARSEINFO& info) noexcept;
 TAVO_API String::CACFWChar FU_FormatPath(const tagCPATHPARSEINFO& info) noexcept;
@@ -65,8 +66,8 @@ TAVO_API bool FU_CreatePath(const wchar_t* path) noexcept;
 
 /// The check to make before a path from outside is joined to a folder; demand PathRootNone then too.
 /// @return true for a text that leads straight down: not empty, no "." or ".." component, no empty component after the
-///         root (one separator at the end is fine), no control character, none of * ? " < > |, no ':' after the root, no
-///         component that ends in a dot or a blank (Windows drops those).
+///         root (one separator at the end is fine), no control character, none of * ? " < > |, no ':' after the root,
+///         no component that ends in a dot or a blank (Windows drops those).
 TAVO_API bool FU_IsStraightPath(const wchar_t* path) noexcept;
 
 namespace OS {
@@ -104,17 +105,17 @@ public:
     CFile(const CFile&) = delete;
     CFile& operator=(const CFile&) = delete;
     CFile(CFile&& other) noexcept
-        : m_handle(std::exchange(other.m_handle, kClosed)),
-          m_access(std::exchange(other.m_access, FileAccessRead)) {}
+        : m_handle(std::exchange(other.m_handle, kClosed)), m_access(std::exchange(other.m_access, FileAccessRead)) {}
     CFile& operator=(CFile&& other) noexcept;
     /// Closes.
     ~CFile() { Close(); }
 
-    /// Opens @p path. Sharing follows Windows: an open fails while what it wants is denied by another open file, or what it
-    /// denies is used by one. On POSIX systems that holds among users of this library.
-    /// When the path was not found, its last folder is created (only that one) and the open is tried again. This is so for
-    /// every open, also one that only reads: it then fails and leaves an empty folder behind.
-    /// @return false for a null or empty path, while a file is open, for combinations that the flags exclude, and when the
+    /// Opens @p path. Sharing follows Windows: an open fails while what it wants is denied by another open file, or
+    /// what it denies is used by one. On POSIX systems that holds among users of this library. When the path was not
+    /// found, its last folder is created (only that one) and the open is tried again. This is so for every open, also
+    /// one that only reads: it then fails and leaves an empty folder behind.
+    /// @return false for a null or empty path, while a file is open, for combinations that the flags exclude, and when
+    /// the
     ///         system refuses.
     bool Open(const wchar_t* path, eFileAccess access, eOpenFileOptions options) noexcept;
     /// Closes the file, if one is open; a temporary one is deleted. Always true.
@@ -139,8 +140,8 @@ public:
     /// @param done  gets the bytes written, fewer than @p n on a full disk; 0 on failure; may be null
     bool Write(const void* buffer, ulong32 n, ulong32* done) noexcept;
 
-    /// Deletes a file; false for a directory. On Windows also false for a read-only file or one that is open; POSIX systems
-    /// delete those.
+    /// Deletes a file; false for a directory. On Windows also false for a read-only file or one that is open; POSIX
+    /// systems delete those.
     static bool DeleteFileW(const wchar_t* path) noexcept;
     /// Renames or moves a file or directory; false when @p to exists, whatever it is.
     static bool RenameFile(const wchar_t* from, const wchar_t* to) noexcept;

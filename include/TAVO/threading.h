@@ -2,14 +2,14 @@
 // Locks that threads share by copying a handle.
 //
 // A copy of a handle is the same lock; it is destroyed with the last handle, which must not happen while it is held or
-// waited for. A handle without a lock (its allocation failed, or it was moved from) does nothing: Enter and Leave return,
-// TryEnter answers false.
+// waited for. A handle without a lock (its allocation failed, or it was moved from) does nothing: Enter and Leave
+// return, TryEnter answers false.
 //
 // Threads: every operation may be called from any thread, on one handle object too. Misuse (leaving what is not held,
 // leaving from another thread) is not detected. Waiting for a lock is no interruption point.
 //
-// Time-outs are in milliseconds; 0 only tries, 0xFFFFFFFF waits without limit. The deadline is a time of the system clock:
-// setting that clock forward ends a wait early, setting it back prolongs it.
+// Time-outs are in milliseconds; 0 only tries, 0xFFFFFFFF waits without limit. The deadline is a time of the system
+// clock: setting that clock forward ends a wait early, setting it back prolongs it.
 
 #include <TAVO/buffers.h>
 
@@ -56,10 +56,10 @@ public:
     void Leave() const noexcept;
 };
 
-/// A lock for many readers or one writer. The writer may enter again, for writing and for reading, up to 65535 times each.
-/// Everything must be left as often as it was entered, and a writer's reads before its last Leave.
-/// A waiting writer holds new readers back; so a reader that enters again may block for ever, and a reader cannot become
-/// the writer.
+/// A lock for many readers or one writer. The writer may enter again, for writing and for reading, up to 65535 times
+/// each. Everything must be left as often as it was entered, and a writer's reads before its last Leave. A waiting
+/// writer holds new readers back; so a reader that enters again may block for ever, and a reader cannot become the
+/// writer.
 class TAVO_API CPRWInterlock : public Buffers::CPObjectMemory {
 public:
     static const Buffers::tagCPOVTABL _vtbl;
@@ -69,8 +69,8 @@ public:
     /// A new lock that nobody holds; an empty handle without memory.
     CPRWInterlock() noexcept;
 
-    /// Waits until the calling thread is the writer. Beyond the writer's 65535th repetition it raises an assertion and does
-    /// not count.
+    /// Waits until the calling thread is the writer. Beyond the writer's 65535th repetition it raises an assertion and
+    /// does not count.
     void Enter() const noexcept;
     /// Waits until the calling thread is a reader; the writer never waits. Limited as Enter.
     void EnterRead() const noexcept;

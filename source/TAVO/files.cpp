@@ -105,8 +105,7 @@ bool CFile::SetPointer(std::size_t position) noexcept {
 }
 
 bool CFile::MovePointer(long long distance) noexcept {
-    return m_handle != kClosed &&
-           Platform::MoveFilePosition(m_handle, distance, Platform::Origin::Position, nullptr);
+    return m_handle != kClosed && Platform::MoveFilePosition(m_handle, distance, Platform::Origin::Position, nullptr);
 }
 
 std::size_t CFile::GetPointer() const noexcept {
@@ -138,7 +137,8 @@ bool CFile::RenameFile(const wchar_t* from, const wchar_t* to) noexcept {
     return HasText(from) && HasText(to) && Platform::RenameWithoutReplacing(from, to);
 }
 
-// --- tests and actions -------------------------------------------------------------------------------------------------
+// --- tests and actions
+// -------------------------------------------------------------------------------------------------
 
 bool _TestFileExists(const wchar_t* path) noexcept {
     return HasText(path) && Platform::GetPathKind(path) == Platform::PathKind::File;
@@ -152,7 +152,8 @@ bool _TestDirExists(const wchar_t* path) noexcept {
 
 bool _CreateDir(const wchar_t* path) noexcept { return HasText(path) && Platform::MakeDirectory(path); }
 
-// --- enumeration -------------------------------------------------------------------------------------------------------
+// --- enumeration
+// -------------------------------------------------------------------------------------------------------
 
 namespace {
 

@@ -50,8 +50,9 @@ private:
     std::size_t m_length = 0;
 };
 
-// --- roots -------------------------------------------------------------------------------------------------------------
-// Each returns the units its form of root takes at the start of `path`, 0 when the path does not start with that form.
+// --- roots
+// ------------------------------------------------------------------------------------------------------------- Each
+// returns the units its form of root takes at the start of `path`, 0 when the path does not start with that form.
 
 // "server\share\", the last separator optional; neither name may be empty.
 std::size_t MatchShare(const wchar_t* path) {
@@ -70,7 +71,8 @@ std::size_t MatchDrive(const wchar_t* path) {
 
 std::size_t MatchDevice(const wchar_t* path) {
     constexpr std::size_t kPrefix = 4; // \\?\ or \\.\ ...
-    if (!_isSlash(path[0]) || !_isSlash(path[1]) || (path[2] != L'?' && path[2] != L'.') || !_isSlash(path[3])) return 0;
+    if (!_isSlash(path[0]) || !_isSlash(path[1]) || (path[2] != L'?' && path[2] != L'.') || !_isSlash(path[3]))
+        return 0;
     const wchar_t* rest = path + kPrefix;
     if (String::wcsncmpi(rest, L"UNC", 3) == 0 && _isSlash(rest[3]))
         if (const std::size_t share = MatchShare(rest + 4)) return kPrefix + 4 + share;
@@ -94,8 +96,9 @@ struct RootForm {
 
 // In the order of trying: every form before those that it also looks like.
 constexpr RootForm kRootForms[] = {
-    {PathRootDevice, MatchDevice},               {PathRootNetwork, MatchNetwork}, {PathRootDrive, MatchDrive},
-    {PathRootDriveRelative, MatchDriveRelative}, {PathRootRooted, MatchRooted},   {PathRootNone, MatchNone},
+    {PathRootDevice, MatchDevice}, {PathRootNetwork, MatchNetwork},
+    {PathRootDrive, MatchDrive},   {PathRootDriveRelative, MatchDriveRelative},
+    {PathRootRooted, MatchRooted}, {PathRootNone, MatchNone},
 };
 
 ePathRoot MatchRoot(const wchar_t* path, std::size_t& length) {
@@ -104,7 +107,8 @@ ePathRoot MatchRoot(const wchar_t* path, std::size_t& length) {
     return PathRootNone;
 }
 
-// --- parts -------------------------------------------------------------------------------------------------------------
+// --- parts
+// -------------------------------------------------------------------------------------------------------------
 
 bool IsDots(const wchar_t* name, std::size_t length) {
     return name[0] == L'.' && (length == 1 || (length == 2 && name[1] == L'.'));
@@ -140,7 +144,8 @@ wchar_t MissingSeparator(const tagPATHPARSEINFO& info) {
     return L'/';
 }
 
-// --- straight paths ----------------------------------------------------------------------------------------------------
+// --- straight paths
+// ----------------------------------------------------------------------------------------------------
 
 bool IsForbidden(wchar_t c) {
     if (c < 0x20 || (c >= 0x7F && c < 0xA0)) return true;

@@ -20,9 +20,9 @@ struct MutexState {
     boost::timed_mutex mutex;
 };
 
-// The owner is compared without the lock: only the owner itself can make the comparison succeed. It is stored whole, which
-// is all that an exchange with an unused result would give; order comes from the mutex around it. Nested counts belong to
-// the holder; they are atomic only so that misuse stays a mistake in logic.
+// The owner is compared without the lock: only the owner itself can make the comparison succeed. It is stored whole,
+// which is all that an exchange with an unused result would give; order comes from the mutex around it. Nested counts
+// belong to the holder; they are atomic only so that misuse stays a mistake in logic.
 struct CriticalSectionState {
     std::atomic<std::uint32_t> count{0};
     std::atomic<std::uint32_t> owner{0}; // 0: free
@@ -36,18 +36,15 @@ struct InterlockState {
     std::atomic<std::uint16_t> nestedWrites{0};
 };
 
-// --- blocks --------------------------------------------------------------------------------------------------------------
+// --- blocks
+// --------------------------------------------------------------------------------------------------------------
 
-template <class State>
-void Create(void* payload, std::size_t) {
+template <class State> void Create(void* payload, std::size_t) {
     static_assert(alignof(State) <= 16, "blocks are aligned to 16");
     new (payload) State;
 }
 
-template <class State>
-void Finalize(void* payload, std::size_t) {
-    static_cast<State*>(payload)->~State();
-}
+template <class State> void Finalize(void* payload, std::size_t) { static_cast<State*>(payload)->~State(); }
 
 void* NoInterface(void*, const _acfUID&) { return nullptr; }
 
@@ -67,10 +64,11 @@ tagCPOMEMHEADER* Built(tagCPOMEMHEADER* block) noexcept {
     }
 }
 
-// --- waiting -------------------------------------------------------------------------------------------------------------
+// --- waiting
+// -------------------------------------------------------------------------------------------------------------
 
-// The system clock in units of 100 ns. Boost waits for a deadline of a clock it does not know by looking at it again every
-// 100 ms, which is what a clock that can be set needs.
+// The system clock in units of 100 ns. Boost waits for a deadline of a clock it does not know by looking at it again
+// every 100 ms, which is what a clock that can be set needs.
 struct SystemClock {
     using rep = std::int64_t;
     using period = boost::ratio<1, 10000000>;
@@ -92,8 +90,7 @@ SystemClock::time_point DeadlineIn(ulong32 ms) {
 }
 
 // Takes the lock however often the primitive fails (it has no memory, or too many wait already).
-template <class Take>
-void TakeSurely(Take take) noexcept {
+template <class Take> void TakeSurely(Take take) noexcept {
     for (;;) {
         try {
             take();
@@ -105,8 +102,7 @@ void TakeSurely(Take take) noexcept {
     }
 }
 
-template <class Take>
-bool TakeOrFail(Take take) noexcept {
+template <class Take> bool TakeOrFail(Take take) noexcept {
     try {
         return take();
     } catch (...) {
@@ -114,8 +110,7 @@ bool TakeOrFail(Take take) noexcept {
     }
 }
 
-template <class Mutex>
-bool TakeWithin(Mutex& mutex, ulong32 ms) noexcept {
+template <class Mutex> bool TakeWithin(Mutex& mutex, ulong32 ms) noexcept {
     if (ms == WaitForever) {
         TakeSurely([&] { mutex.lock(); });
         return true;
@@ -134,15 +129,14 @@ bool TakeSharedWithin(boost::shared_mutex& mutex, ulong32 ms) noexcept {
     return TakeOrFail([&] { return mutex.try_lock_shared_until(DeadlineIn(ms)); });
 }
 
-// --- counting: by the holder only ------------------------------------------------------------------------------------------
+// --- counting: by the holder only
+// ------------------------------------------------------------------------------------------
 
-template <class Count>
-void StepUp(std::atomic<Count>& count) {
+template <class Count> void StepUp(std::atomic<Count>& count) {
     count.store(static_cast<Count>(count.load(std::memory_order_relaxed) + 1), std::memory_order_relaxed);
 }
 
-template <class Count>
-Count StepDown(std::atomic<Count>& count) {
+template <class Count> Count StepDown(std::atomic<Count>& count) {
     const auto value = static_cast<Count>(count.load(std::memory_order_relaxed) - 1);
     count.store(value, std::memory_order_relaxed);
     return value;
@@ -170,14 +164,12 @@ bool Unnest(std::atomic<std::uint16_t>& count) {
     return true;
 }
 
-template <class State>
-State* StateOf(void* payload) {
-    return static_cast<State*>(payload);
-}
+template <class State> State* StateOf(void* payload) { return static_cast<State*>(payload); }
 
 } // namespace
 
-// --- CPMutex -------------------------------------------------------------------------------------------------------------
+// --- CPMutex
+// -------------------------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPMutex::_vtbl = kLockTable<MutexState>;
 
@@ -194,7 +186,8 @@ void CPMutex::Leave() const noexcept {
     if (auto* state = StateOf<MutexState>(Payload())) state->mutex.unlock();
 }
 
-// --- CPCriticalSection ---------------------------------------------------------------------------------------------------
+// --- CPCriticalSection
+// ---------------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = kLockTable<CriticalSectionState>;
 
@@ -246,7 +239,8 @@ void CPCriticalSection::Leave() const noexcept {
     state->mutex.unlock();
 }
 
-// --- CPRWInterlock -------------------------------------------------------------------------------------------------------
+// --- CPRWInterlock
+// -------------------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPRWInterlock::_vtbl = kLockTable<InterlockState>;
 

@@ -10,7 +10,8 @@ constexpr unsigned kSharingKinds = 8;
 
 inline bool OpenAsKind(TAVO::Files::OS::CFile& file, const wchar_t* path, unsigned kind) {
     using namespace TAVO::Files::OS;
-    const auto access = (kind & 1 ? FileAccessWrite : FileAccessRead) | (kind & 2 ? FileAccessShareWrite : FileAccessRead) |
+    const auto access = (kind & 1 ? FileAccessWrite : FileAccessRead) |
+                        (kind & 2 ? FileAccessShareWrite : FileAccessRead) |
                         (kind & 4 ? FileAccessShareRead : FileAccessRead);
     return file.Open(path, access, OpenFileExisting);
 }

@@ -1,7 +1,8 @@
 #pragma once
 // What the library needs of the file system, once for both systems.
 //
-// No function here throws. Paths are 16-bit units, zero-terminated and neither null nor empty; '/' and '\' both separate.
+// No function here throws. Paths are 16-bit units, zero-terminated and neither null nor empty; '/' and '\' both
+// separate.
 
 #include <cstddef>
 #include <cstdint>
@@ -47,16 +48,16 @@ bool WriteToFile(FileHandle file, const void* buffer, std::uint32_t size, std::u
 enum class PathKind { Missing, File, Directory }; // whatever exists and is no directory is a file
 
 PathKind GetPathKind(const wchar_t* path) noexcept;
-bool RemoveFile(const wchar_t* path) noexcept;                               // never a directory
+bool RemoveFile(const wchar_t* path) noexcept;                                // never a directory
 bool RenameWithoutReplacing(const wchar_t* from, const wchar_t* to) noexcept; // false when `to` exists
-bool MakeDirectory(const wchar_t* path) noexcept;                            // false when it exists
+bool MakeDirectory(const wchar_t* path) noexcept;                             // false when it exists
 
 // --- directories -----------------------------------------------------------------------------------------------------
 
 constexpr std::size_t kNameCapacity = 260; // units of an entry's name, terminator included
 
 struct EntryFacts {
-    std::uint64_t size; // 0 for a directory
+    std::uint64_t size;                        // 0 for a directory
     std::uint64_t modified, accessed, created; // 100 ns since 1601-01-01 UTC, 0 when unknown
     bool directory;
     bool readOnly;

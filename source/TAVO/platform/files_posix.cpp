@@ -22,8 +22,7 @@ namespace TAVO::Platform {
 namespace {
 
 // Repeats a call for as long as signals interrupt it.
-template <class Call>
-auto Uninterrupted(Call call) {
+template <class Call> auto Uninterrupted(Call call) {
     for (;;) {
         const auto result = call();
         if (result != -1 || errno != EINTR) return result;
@@ -82,12 +81,13 @@ private:
     int m_descriptor;
 };
 
-// --- sharing -----------------------------------------------------------------------------------------------------------
+// --- sharing
+// -----------------------------------------------------------------------------------------------------------
 //
-// Every open file holds shared locks on those of four far bytes that say what it does and what it denies others. An open
-// is refused when another open file holds the opposite of what it is going to hold; locks of one open file never meet
-// each other. Testing and taking is one step for all users, because it happens under an exclusive whole-file lock of the
-// other kind (flock), which is held for that moment only. Closing the descriptor lets go of everything.
+// Every open file holds shared locks on those of four far bytes that say what it does and what it denies others. An
+// open is refused when another open file holds the opposite of what it is going to hold; locks of one open file never
+// meet each other. Testing and taking is one step for all users, because it happens under an exclusive whole-file lock
+// of the other kind (flock), which is held for that moment only. Closing the descriptor lets go of everything.
 
 enum Claim : int { Reads, Writes, DeniesReading, DeniesWriting };
 constexpr int Opposite(int claim) { return claim ^ 2; }
@@ -148,7 +148,8 @@ bool Share(int descriptor, const FileRequest& request) {
     return answer != Answer::No;
 }
 
-// --- opening and closing -------------------------------------------------------------------------------------------------
+// --- opening and closing
+// -------------------------------------------------------------------------------------------------
 
 bool Creates(Disposition disposition) {
     return disposition == Disposition::OpenAlways || disposition == Disposition::CreateAlways;
@@ -194,8 +195,8 @@ void RemoveByDescriptor(int descriptor) {
 OpenResult OpenFile(const wchar_t* path, const FileRequest& request, FileHandle& file) noexcept {
     constexpr int kAttempts = 8; // against a file that others keep deleting
     const NativePath native(path);
-    const int flags = (request.write ? O_RDWR : O_RDONLY) | (Creates(request.disposition) ? O_CREAT : 0) | O_CLOEXEC |
-                      O_NOCTTY;
+    const int flags =
+        (request.write ? O_RDWR : O_RDONLY) | (Creates(request.disposition) ? O_CREAT : 0) | O_CLOEXEC | O_NOCTTY;
     for (int attempt = 0; attempt < kAttempts; ++attempt) {
         Descriptor descriptor(Uninterrupted([&] { return open(native, flags, 0666); }));
         if (!descriptor.IsValid())
@@ -214,7 +215,8 @@ void CloseFile(FileHandle file) noexcept {
     close(DescriptorOf(file)); // also after EINTR the descriptor is gone
 }
 
-// --- transfer and position -----------------------------------------------------------------------------------------------
+// --- transfer and position
+// -----------------------------------------------------------------------------------------------
 
 bool GetFileLength(FileHandle file, std::uint64_t& length) noexcept {
     struct stat facts;

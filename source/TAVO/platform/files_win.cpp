@@ -14,10 +14,14 @@ HANDLE SystemHandle(FileHandle file) { return reinterpret_cast<HANDLE>(file); }
 
 DWORD CreationOf(Disposition disposition) {
     switch (disposition) {
-    case Disposition::TruncateExisting: return TRUNCATE_EXISTING;
-    case Disposition::OpenAlways: return OPEN_ALWAYS;
-    case Disposition::CreateAlways: return CREATE_ALWAYS;
-    default: return OPEN_EXISTING;
+    case Disposition::TruncateExisting:
+        return TRUNCATE_EXISTING;
+    case Disposition::OpenAlways:
+        return OPEN_ALWAYS;
+    case Disposition::CreateAlways:
+        return CREATE_ALWAYS;
+    default:
+        return OPEN_EXISTING;
     }
 }
 
