@@ -26,6 +26,12 @@ enum class Module { Library, Executable };
 // The module's path, cut to `capacity` units terminator included. 0 when unknown; `truncated` tells a cut path.
 std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, bool& truncated) noexcept;
 
+// Takes a reference on the library's own module, so that it stays mapped while a thread of its own runs. Null when
+// refused.
+void* HoldLibrary() noexcept;
+// Gives the reference back; null is ignored. Not on a thread whose code it keeps mapped.
+void DropLibrary(void* hold) noexcept;
+
 // The length of the library's path without the extension, which the configuration file's ".ini" replaces; 0 when the
 // file name has none. POSIX: version digits behind ".so" go too, so that an upgrade keeps its settings.
 std::size_t FindConfigurationStem(const wchar_t* libraryPath, std::size_t length) noexcept;
