@@ -17,6 +17,8 @@ public:
 
     static tagCPOMEMHEADER* Of(const CPObjectMemory& handle) { return static_cast<const Block&>(handle).m_pMH; }
 
+    static tagCPOMEMHEADER*& RefOf(CPObjectMemory& handle) { return static_cast<Block&>(handle).m_pMH; }
+
     // The payload of a block that holds a T.
     template <class T> static T* PayloadOf(const CPObjectMemory& handle) { return reinterpret_cast<T*>(Of(handle) + 1); }
 
