@@ -287,6 +287,15 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
 }
 #endif
 
+// Asks for the cache line at `address`, which need not be readable: to be read, or to be written soon.
+TAVO_INLINE void Prefetch(const void* address) {
+#if defined(TAVO_SSE2)
+    _mm_prefetch(static_cast<const char*>(address), _MM_HINT_T0);
+#else
+    static_cast<void>(address);
+#endif
+}
+
 // Tells the processor that this thread spins.
 inline void Pause() {
 #if defined(TAVO_SSE2)
