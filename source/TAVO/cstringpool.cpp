@@ -164,7 +164,9 @@ struct Utf8Source {
         *to = 0;
     }
     std::size_t Units() const noexcept { return units; }
-    bool Write(wchar_t* out) const noexcept { return detail::ConvertUtf8(text, bytes, out); }
+    bool Write(wchar_t* out) const noexcept {
+        return detail::ConvertUtf8(text, {.source = bytes, .target = units}, out);
+    }
 };
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {
