@@ -69,7 +69,9 @@ bool _CXMLOut::Begin(eXMLEncoding encoding, bool pretty) {
     m_encoding = encoding;
     const bool written = encoding == XMLEncodingUTF8 ? Put("<?xml version=\"1.0\" encoding=\"UTF-8\"?>")
                                                      : Put("<?xml version=\"1.0\" encoding=\"UTF-16\"?>");
-    m_failed = !written || !EndLine();
+    if (!written) return false;
+    m_failed = false;
+    EndLine();
     return !m_failed;
 }
 

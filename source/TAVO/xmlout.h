@@ -38,10 +38,9 @@ public:
     void Indent() final { ++m_level; }
     std::size_t Outdent() final { return m_level ? --m_level : 0; }
     bool EndLine() final {
-        if (m_pretty) {
-            Put("\r\n");
-            m_atLineStart = true;
-        }
+        if (!m_pretty) return true;
+        if (!Put("\r\n")) SetFailed(); // Intended: not told here, where a textbook would; the mark voids the result
+        m_atLineStart = true;
         return true;
     }
     void SetFailed() final { m_failed = true; }

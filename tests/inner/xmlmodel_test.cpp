@@ -182,6 +182,8 @@ public:
         const std::size_t count = m ? m->children.size() : 0, index = Below(count + 2);
         const bool mayPlace = naive::Size(m) + naive::Size(modelChild) < 60 && !naive::Reaches(modelChild, m);
         const unsigned operation = Below(27);
+        static constexpr std::uint32_t kEmptying = 1 << 0 | 1 << 6 | 1 << 7 | 1 << 14 | 1 << 16 | 1 << 20 | 1 << 23;
+        if (m && (kEmptying >> operation & 1) && Below(8)) return {}; // rarely, so that trees grow
         if (!mayPlace && operation >= 8 && operation <= 16) return {};
         const std::size_t start = Below(3) ? Below(count + 1) : kNone;
         std::size_t n;
