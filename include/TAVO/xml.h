@@ -1,9 +1,9 @@
 #pragma once
 // XML: documents read into trees of elements, the trees themselves, and their output as text.
 //
-// An element is a handle, one pointer to a node that counts its holders. Copying a handle shares the node, so a change made
-// through one handle is seen through all; clone() gives a handle a node of its own, whose children stay shared. There are no
-// parent pointers, and a node may be the child of several parents.
+// An element is a handle, one pointer to a node that counts its holders. Copying a handle shares the node, so a change
+// made through one handle is seen through all; clone() gives a handle a node of its own, whose children stay shared.
+// There are no parent pointers, and a node may be the child of several parents.
 //
 // Names, values and data are pooled strings and compared by entry. The null string counts as the empty one everywhere.
 // An element has one data string and no text nodes; an element with children and data can be kept but not written.
@@ -41,18 +41,19 @@ enum eXMLEncoding : std::uint32_t {
 
 /// Handle of an element.
 ///
-/// Live: the handle has a node. Named: the node's name is not empty. Nearly every operation needs a live, named node and
-/// else fails. Default: a node without name, attributes, children and data. Named-default: one with a name only.
+/// Live: the handle has a node. Named: the node's name is not empty. Nearly every operation needs a live, named node
+/// and else fails. Default: a node without name, attributes, children and data. Named-default: one with a name only.
 ///
-/// A name starts with a letter, '_' or ':' and goes on with letters, digits, '.', '-', '_', ':', combining characters and
-/// extenders, by the tables of XML 1.0 (second edition), Appendix B; there are none above U+FFFF.
+/// A name starts with a letter, '_' or ':' and goes on with letters, digits, '.', '-', '_', ':', combining characters
+/// and extenders, by the tables of XML 1.0 (second edition), Appendix B; there are none above U+FFFF.
 ///
-/// What an element holds (its content kind) rises with what is added: nothing, children, data, both. Deleting children one
-/// by one does not lower it again: an element emptied so still counts as one with children, text added to it then makes
-/// the kind "both", and such an element cannot be written. Empty an element with DeleteElements, DeleteContent or Reset.
+/// What an element holds (its content kind) rises with what is added: nothing, children, data, both. Deleting children
+/// one by one does not lower it again: an element emptied so still counts as one with children, text added to it then
+/// makes the kind "both", and such an element cannot be written. Empty an element with DeleteElements, DeleteContent or
+/// Reset.
 ///
-/// An element must not be put below itself, directly or not; nobody checks. Such a tree is never freed, and writing it does
-/// not end.
+/// An element must not be put below itself, directly or not; nobody checks. Such a tree is never freed, and writing it
+/// does not end.
 ///
 /// A failed allocation leaves the element as it was and gives the operation's failure result.
 class TAVO_API CPXMLObject : public Buffers::CPObjectMemory {
@@ -93,8 +94,8 @@ public:
     bool IsName(const CPPoolString& name) const noexcept;
     bool IsData(const CPPoolString& data) const noexcept;
     bool IsNameData(const CPPoolString& name, const CPPoolString& data) const noexcept;
-    /// Position of the element's name among the tokens of @p list: "b" in "a;b;c" is 1. All-ones when it is none of them,
-    /// and for a null list.
+    /// Position of the element's name among the tokens of @p list: "b" in "a;b;c" is 1. All-ones when it is none of
+    /// them, and for a null list.
     std::size_t GetNameIndex(const wchar_t* list, wchar_t separator) const noexcept;
 
     // --- Attributes: in the order they were added, names unique, values never empty when added one by one ---
@@ -146,9 +147,10 @@ public:
     xmlret SetTag(const CPPoolString& name, const CPPoolString& value) noexcept;
     xmlret SetTag(const CPPoolString& name, const wchar_t* value) noexcept;
     xmlret SprintfTag(const CPPoolString& name, const wchar_t* format, ...) noexcept;
-    /// Inserts before the child at @p index, or appends when that is beyond the end. The child may be default, or an empty
-    /// handle. Refused, unlike Add, when this element has data.
-    /// @return @p index as it was given, even when the child was appended at a smaller one. So an index of all-ones reads
+    /// Inserts before the child at @p index, or appends when that is beyond the end. The child may be default, or an
+    /// empty handle. Refused, unlike Add, when this element has data.
+    /// @return @p index as it was given, even when the child was appended at a smaller one. So an index of all-ones
+    /// reads
     ///         as failure although the child was appended.
     xmlret Insert(const CPXMLObject& child, std::size_t index) noexcept;
     /// Puts the child in place of the one at @p index. False for a default child.
@@ -156,9 +158,10 @@ public:
     bool Replace(const CPXMLObject& child, Index index) noexcept {
         return ReplaceAt(child, static_cast<std::size_t>(index));
     }
-    /// Puts the child, which may be default, in the slot at @p position; a position outside this element's children is read,
-    /// and the first slot that holds the same node is replaced.
-    /// @return the slot's index, all-ones when there is none; 0, with nothing replaced, on a node that is not live and named.
+    /// Puts the child, which may be default, in the slot at @p position; a position outside this element's children is
+    /// read, and the first slot that holds the same node is replaced.
+    /// @return the slot's index, all-ones when there is none; 0, with nothing replaced, on a node that is not live and
+    /// named.
     xmlret Replace(const CPXMLObject& child, const CPXMLObject* position) noexcept;
     /// Puts the child in place of the first slot that holds the same node as @p old.
     xmlret Replace(const CPXMLObject& child, const CPXMLObject& old) noexcept;
@@ -167,8 +170,8 @@ public:
     bool Delete(Index index) noexcept {
         return DeleteAt(static_cast<std::size_t>(index));
     }
-    /// Removes the slot at @p position; a position outside this element's children is read, and the first slot that holds
-    /// the same node is removed. Null removes nothing.
+    /// Removes the slot at @p position; a position outside this element's children is read, and the first slot that
+    /// holds the same node is removed. Null removes nothing.
     bool Delete(const CPXMLObject* position) noexcept;
     /// Removes the first slot that holds the same node.
     bool Delete(const CPXMLObject& child) noexcept;
@@ -208,14 +211,14 @@ public:
     // --- Searching ---
     //
     // Searches give a slot among the children of an element, or null; it is valid until those children change.
-    // `start` is null or the result of an earlier search of the same element, else the result is null; it is compared and
-    // never read. A slot with an empty handle matches nothing.
-    // FindNext starts at the first child or behind `start` and goes forward. FindPrev starts at the last child, or at the one
-    // BEHIND `start`, and goes back: it may answer `start` itself, and answers null when that is the last child.
+    // `start` is null or the result of an earlier search of the same element, else the result is null; it is compared
+    // and never read. A slot with an empty handle matches nothing. FindNext starts at the first child or behind `start`
+    // and goes forward. FindPrev starts at the last child, or at the one BEHIND `start`, and goes back: it may answer
+    // `start` itself, and answers null when that is the last child.
 
-    /// Goes down from child to child by names separated by '/'; blanks around them are skipped. The path ends at the first
-    /// character that fits nowhere (a leading '/', the second word of a step), and the names before it count: "a/b c" is
-    /// "a", and "/a" nothing.
+    /// Goes down from child to child by names separated by '/'; blanks around them are skipped. The path ends at the
+    /// first character that fits nowhere (a leading '/', the second word of a step), and the names before it count:
+    /// "a/b c" is "a", and "/a" nothing.
     /// @param parent  gets the element whose child was found, an empty handle when none was; may be null
     const CPXMLObject* FindFirstElement(const wchar_t* path, CPXMLObject* parent = nullptr) const noexcept;
     CPXMLObject* FindFirstElement(const wchar_t* path, CPXMLObject* parent = nullptr) noexcept;
@@ -255,11 +258,11 @@ public:
 
     // --- Output ---
     //
-    // An xml declaration, then the element and all below it; no byte order mark. `pretty` adds line ends (CR LF) and two
-    // blanks per level. False for an unnamed element, one with children and data, an empty handle as child, an unknown
-    // encoding and, but for the raw encoding, text with characters from U+100000 up or half a pair; also without memory.
-    // A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost.
-    // Not everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
+    // An xml declaration, then the element and all below it; no byte order mark. `pretty` adds line ends (CR LF) and
+    // two blanks per level. False for an unnamed element, one with children and data, an empty handle as child, an
+    // unknown encoding and, but for the raw encoding, text with characters from U+100000 up or half a pair; also
+    // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost. Not
+    // everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
     // its ends, runs of them and line breaks, unless one of & < > " ' makes it a CDATA section.
 
     /// Writes a file. One that exists is replaced at once: when writing fails, it is deleted.
@@ -294,8 +297,8 @@ public:
 
     /// Reads a file of at most 4,294,967,295 bytes. Every failure before the text is parsed gives error code 0.
     bool OpenDocFile(const wchar_t* path, eXMLEncoding encoding) noexcept;
-    /// Reads @p size bytes, at least 4, whose encoding is found out; the text ends at its first zero unit or at the size.
-    /// The bytes are not changed.
+    /// Reads @p size bytes, at least 4, whose encoding is found out; the text ends at its first zero unit or at the
+    /// size. The bytes are not changed.
     bool OpenDocText(void* data, unsigned long long size) noexcept;
     /// Reads zero-terminated UTF-8.
     bool OpenDocText(const unsigned char* text) noexcept;
@@ -313,6 +316,10 @@ public:
     ulong32 GetErrorInfo(unsigned long long* offset, String::CACFWChar* text) const noexcept;
 
 private:
+    bool Refuse() noexcept;
+    template <class Unit> bool ParseUnits(const Unit* text, std::size_t units) noexcept;
+    bool ParseUtf16(const void* data, std::size_t units, bool swap) noexcept;
+
     Buffers::CPPlainMemory m_errorText; // zero-terminated wide text
     unsigned long long m_errorOffset;
     std::uint32_t m_errorCode;

@@ -10,8 +10,7 @@
 
 namespace TAVO {
 
-template <class T>
-class Scratch {
+template <class T> class Scratch {
     static_assert(std::is_trivially_copyable_v<T>);
 
 public:
@@ -42,8 +41,8 @@ private:
         if (more > most - m_count) return false;
         std::size_t capacity = m_capacity ? m_capacity * 2 : 64;
         if (capacity < m_count + more) capacity = m_count + more;
-        void* grown = m_first ? Platform::Reallocate(m_first, capacity * sizeof(T))
-                              : Platform::Allocate(capacity * sizeof(T));
+        void* grown =
+            m_first ? Platform::Reallocate(m_first, capacity * sizeof(T)) : Platform::Allocate(capacity * sizeof(T));
         if (!grown) return false;
         m_first = static_cast<T*>(grown);
         m_capacity = capacity;

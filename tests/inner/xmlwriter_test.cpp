@@ -108,21 +108,21 @@ private:
 
 TEST(XmlWriter, RandomTreesAgainstTheNaiveWriter) {
     int written = 0;
-    for (unsigned seed = 1; seed <= 1500; ++seed) {
+    for (unsigned seed = 1; seed <= 600; ++seed) {
         RandomTrees trees(seed);
         const Element model = trees.Make();
         ASSERT_TRUE(WritesAlike(model)) << "seed " << seed;
         written += support::NaiveWriter(1, false).Write(model);
     }
-    EXPECT_GT(written, 700) << "most trees can be written";
-    EXPECT_LT(written, 1500) << "and some cannot";
+    EXPECT_GT(written, 300) << "most trees can be written";
+    EXPECT_LT(written, 600) << "and some cannot";
 }
 
 TEST(XmlWriter, CharactersAcrossTheEndOfTheBufferIntended) {
     // FFFF takes four bytes where fewer than four are free, and three everywhere else.
     for (const Text character : {u"a", u"\xE9", u"\x4E00", u"\xFFFF", u"\xD83D\xDE00", u"&"})
-        for (std::size_t buffers : {1u, 2u})
-            for (std::size_t fill = 16384 * buffers - 60; fill <= 16384 * buffers - 30; ++fill) {
+        for (std::size_t full : {16384u, 8192u, 2 * 16384u}) // units that fill the buffer, or two
+            for (std::size_t fill = full - 50; fill <= full - 38; ++fill) {
                 Element model;
                 model.name = u"e";
                 model.kind = 2;
