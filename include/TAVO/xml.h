@@ -261,8 +261,9 @@ public:
     // An xml declaration, then the element and all below it; no byte order mark. `pretty` adds line ends (CR LF) and
     // two blanks per level. False for an unnamed element, one with children and data, an empty handle as child, an
     // unknown encoding and, but for the raw encoding, text with characters from U+100000 up or half a pair; also
-    // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost. Not
-    // everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
+    // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost.
+    //
+    // Not everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
     // its ends, runs of them and line breaks, unless one of & < > " ' makes it a CDATA section.
 
     /// Writes a file. One that exists is replaced at once: when writing fails, it is deleted.
