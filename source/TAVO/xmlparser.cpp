@@ -139,12 +139,17 @@ private:
         m_at += 2;
         const Unit* name = m_at;
         if (!Name()) return false;
-        const bool declaration = topLevel && m_at - name == 3 && Stands(name, "xml");
+        const bool declaration = topLevel && IsDeclarationName(name, static_cast<std::size_t>(m_at - name));
         TagEnd end;
         if (!AttributesOf(TagEnd::Instruction, end)) return false;
         const bool good = !declaration || Declaration(start);
         DropAttributes();
         return good;
+    }
+
+    bool IsDeclarationName(const Unit* name, std::size_t units) {
+        if (IsAscii(name, units)) return units == 3 && Stands(name, "xml");
+        return kUtf8 && InternName(name, units).cmp(L"xml") == 0; // overlong forms
     }
 
     bool Declaration(const Unit* start) {
