@@ -484,7 +484,9 @@ private:
             m_at = name + element.nameUnits + 1;
             return FinishElement();
         }
-        if (!Name() || !SameName(name, static_cast<std::size_t>(m_at - name), element)) return Fail(wrong, tag);
+        bool same = Name();
+        if (same && !IsSameName(name, static_cast<std::size_t>(m_at - name), element, same)) return OutOfMemory();
+        if (!same) return Fail(wrong, tag);
         SkipBlanks();
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
         if (*m_at != '>') return Fail(kOpenEnclosure, m_at);
@@ -492,11 +494,13 @@ private:
         return FinishElement();
     }
 
-    // Names of other spelling may be the same: UTF-8 has overlong forms.
-    bool SameName(const Unit* name, std::size_t units, const OpenElement& element) {
-        if (units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0) return true;
-        return kUtf8 && !(IsAscii(name, units) && IsAscii(element.name, element.nameUnits)) &&
-               InternName(name, units) == NodeOf(element.node).name;
+    // Names of other spelling may be the same: UTF-8 has overlong forms. False without memory.
+    bool IsSameName(const Unit* name, std::size_t units, const OpenElement& element, bool& same) {
+        same = units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0;
+        if (same || !kUtf8 || (IsAscii(name, units) && IsAscii(element.name, element.nameUnits))) return true;
+        const CPPoolString interned = InternName(name, units);
+        same = interned == NodeOf(element.node).name;
+        return !interned.isnull();
     }
 
     // --- text
