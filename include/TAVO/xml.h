@@ -319,7 +319,8 @@ public:
 private:
     bool Refuse() noexcept;
     template <class Unit> bool ParseUnits(const Unit* text, std::size_t units) noexcept;
-    bool ParseUtf16(const void* data, std::size_t units, bool swap) noexcept;
+    bool ParseUtf16(const void* data, std::size_t most, bool swap) noexcept;
+    bool ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t units) noexcept;
 
     Buffers::CPPlainMemory m_errorText; // zero-terminated wide text
     unsigned long long m_errorOffset;

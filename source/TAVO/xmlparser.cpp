@@ -139,12 +139,17 @@ private:
         m_at += 2;
         const Unit* name = m_at;
         if (!Name()) return false;
-        const bool declaration = topLevel && m_at - name == 3 && Stands(name, "xml");
+        const bool declaration = topLevel && IsDeclarationName(name, static_cast<std::size_t>(m_at - name));
         TagEnd end;
         if (!AttributesOf(TagEnd::Instruction, end)) return false;
         const bool good = !declaration || Declaration(start);
         DropAttributes();
         return good;
+    }
+
+    bool IsDeclarationName(const Unit* name, std::size_t units) {
+        if (IsAscii(name, units)) return units == 3 && Stands(name, "xml");
+        return kUtf8 && InternName(name, units).cmp(L"xml") == 0; // overlong forms
     }
 
     bool Declaration(const Unit* start) {
@@ -479,7 +484,9 @@ private:
             m_at = name + element.nameUnits + 1;
             return FinishElement();
         }
-        if (!Name() || !SameName(name, static_cast<std::size_t>(m_at - name), element)) return Fail(wrong, tag);
+        bool same = Name();
+        if (same && !IsSameName(name, static_cast<std::size_t>(m_at - name), element, same)) return OutOfMemory();
+        if (!same) return Fail(wrong, tag);
         SkipBlanks();
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
         if (*m_at != '>') return Fail(kOpenEnclosure, m_at);
@@ -487,11 +494,13 @@ private:
         return FinishElement();
     }
 
-    // Names of other spelling may be the same: UTF-8 has overlong forms.
-    bool SameName(const Unit* name, std::size_t units, const OpenElement& element) {
-        if (units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0) return true;
-        return kUtf8 && !(IsAscii(name, units) && IsAscii(element.name, element.nameUnits)) &&
-               InternName(name, units) == NodeOf(element.node).name;
+    // Names of other spelling may be the same: UTF-8 has overlong forms. False without memory.
+    bool IsSameName(const Unit* name, std::size_t units, const OpenElement& element, bool& same) {
+        same = units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0;
+        if (same || !kUtf8 || (IsAscii(name, units) && IsAscii(element.name, element.nameUnits))) return true;
+        const CPPoolString interned = InternName(name, units);
+        same = interned == NodeOf(element.node).name;
+        return !interned.isnull();
     }
 
     // --- text
