@@ -111,15 +111,19 @@ CBaseHashTable::Place CBaseHashTable::Locate(unsigned long long hash, const CPOb
     std::size_t end = place.index;
     for (std::size_t step = 1; end < count && entries[end].hash == hash; step *= 2) end += step;
     if (end > count) end = count;
-    while (place.index < end) {
-        const std::size_t middle = place.index + (end - place.index) / 2;
-        const int order = CompareEntry(entries[middle], hash, probe);
-        if (order > 0) {
-            place.index = middle + 1;
-        } else {
-            end = middle;
-            place.found = order == 0;
+    try {
+        while (place.index < end) {
+            const std::size_t middle = place.index + (end - place.index) / 2;
+            const int order = CompareEntry(entries[middle], hash, probe);
+            if (order > 0) {
+                place.index = middle + 1;
+            } else {
+                end = middle;
+                place.found = order == 0;
+            }
         }
+    } catch (...) {
+        return {place.bucket, Buffers::NotFound, false}; // nothing is found there, and nothing can be inserted
     }
     return place;
 }
@@ -129,6 +133,7 @@ CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
 }
 
 bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, const CPObjectMemory& item) noexcept {
+    if (place.index == Buffers::NotFound) return false; // the comparison threw
     return EnsureIndex() && Buckets()[place.bucket].Insert(HASHENTRY{hash, item}, place.index);
 }
 
@@ -157,7 +162,8 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
         const CPObjectMemory added(item), old(At(place).item);
         Bucket& bucket = Buckets()[place.bucket];
         bucket.Delete(place.index, false); // keeps the room, so the insertion cannot fail
-        InsertAt(Locate(hash, added), hash, added);
+        const Place ordered = Locate(hash, added);
+        InsertAt(ordered.index == Buffers::NotFound ? place : ordered, hash, added);
         return added;
     }
     default:
@@ -244,6 +250,7 @@ bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
         }
         return true;
     } catch (...) {
+        m_cursor = (m_cursor + 1) & m_mask; // one item that always throws must not keep the sweep from all others
         return false;
     }
 }
