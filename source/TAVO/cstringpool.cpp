@@ -241,7 +241,8 @@ CPPoolString CStringPool::GetStringRef(IStringSubmitter* submitter) noexcept {
         text[announced] = 0;
         pool::Key key;
         std::size_t units;
-        if (!pool::KeyOfWide(text, announced, key, units)) return {};
+        // Up to the terminator: the text is whole, so a pair without its second half is a fault, not cut.
+        if (!pool::KeyOfWide(text, SIZE_MAX, key, units)) return {};
         if (units == 0) return CPPoolString::pempty;
         block = Block::Acquire(block);
         holder.free();
