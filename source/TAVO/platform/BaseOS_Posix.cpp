@@ -522,25 +522,24 @@ bool IsReadable(const void* address) noexcept {
 // One access by a fixed offset, without a call, from a library that is loaded late.
 #define TAVO_THREAD_FIELD constinit thread_local __attribute__((tls_model("initial-exec")))
 
+constinit thread_local std::uint32_t t_id = 0; // declared with its access model
+
 namespace {
 
-TAVO_THREAD_FIELD std::uint32_t t_id = 0;
 TAVO_THREAD_FIELD int t_priority = 0;
 TAVO_THREAD_FIELD void* t_releaseScope = nullptr;
 
+} // namespace
+
 // Kernel ids are reused; a new thread must not pass for a dead owner of something.
-TAVO_NOINLINE std::uint32_t TakeThreadId() {
+TAVO_NOINLINE std::uint32_t TakeThreadId() noexcept {
     static constinit std::atomic<std::uint32_t> g_lastId{0};
     do t_id = ++g_lastId;
     while (t_id == 0);
     return t_id;
 }
 
-} // namespace
-
 #undef TAVO_THREAD_FIELD
-
-std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
 
 int GetThreadPriority() noexcept { return t_priority; }
 void SetThreadPriority(int priority) noexcept { t_priority = priority; }

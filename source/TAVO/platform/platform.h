@@ -77,8 +77,14 @@ constexpr std::size_t PageSize = 4096;
 
 // --- threads -------------------------------------------------------------------------------------------------------
 
-// Identifies the calling thread among all that live; never 0.
+// Identifies the calling thread among all that live; never 0. Locks ask on every call, so POSIX answers without one.
+#if defined(_WIN32)
 std::uint32_t GetThreadId() noexcept;
+#else
+extern constinit thread_local std::uint32_t t_id __attribute__((tls_model("initial-exec"))); // 0: none taken yet
+std::uint32_t TakeThreadId() noexcept;
+inline std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
+#endif
 
 // The calling thread's priority in the system's words (0 normal, -15 idle, 15 time critical). POSIX: the level that was
 // last set here, since an ordinary user's thread could not be raised again.
