@@ -33,7 +33,6 @@ logs=build/logs
 passed=0
 failed=0
 started=$(date +%s)
-export CTEST_OUTPUT_ON_FAILURE=1
 [ -n "${HOME:-}" ] || export HOME="$PWD/build"
 if command -v ccache >/dev/null; then
   export CMAKE_C_COMPILER_LAUNCHER="${CMAKE_C_COMPILER_LAUNCHER-ccache}"
@@ -69,10 +68,20 @@ step() {
     return
   fi
   printf '%4d s  FAILED%s\n' $took "${counted:-}"
-  grep -E 'FAILED|error:|Error |ERROR:|\*\*\*|Failure|SUMMARY: |runtime error' "$log" | head -n 20
-  echo '...'
-  tail -n 25 "$log"
+  explain "$stage" "$log"
   give_up "$name: $stage failed with exit code $result; the whole log is $log"
+}
+
+# Prints what matters of the log of a failed step.
+explain() { # <stage> <log>
+  case $1 in
+    test)
+      grep -E -A6 '^[0-9]+: .*(: Failure$|ERROR: |WARNING: ThreadSanitizer|runtime error: |CMake Error)' "$2" | head -n 60
+      grep -E '^[0-9]+: \[  FAILED  \] [^0-9]|^ *[0-9]+/[0-9]+ Test .*(\*\*\*|Exception)' "$2"
+      ;;
+    build) grep -E -A3 '^FAILED|error: |undefined reference' "$2" | grep -v '^: && \|^/usr/bin/ccache ' | cut -c1-300 | head -n 40 ;;
+    *) tail -n 30 "$2" ;;
+  esac
 }
 
 # Adds up a run of ctest: a GoogleTest program counts with its test cases, anything else as one.
