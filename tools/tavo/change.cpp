@@ -80,7 +80,7 @@ std::string FindLoss(const CPXMLObject& root, Pairs pairs, const CPPlainMemory& 
                     Quoted(Shown(after[i].text, pairs));
     }
     if (changed == 0) return std::string();
-    return Grouped(changed) + (changed == 1 ? " text does" : " texts do") + " not read back as they are" + first;
+    return (changed == 1 ? "1 text reads" : Grouped(changed) + " texts read") + " back differently" + first;
 }
 
 int WriteDocument(Document& document, const OutputOptions& options) {

@@ -65,7 +65,9 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
     auto& set = Add<SetOptions>(*command, action, Set);
     command->add_option("FILE", set.file, kFileHelp)->required()->type_name("");
     command->add_option("PATH", set.path, kPathHelp)->required()->type_name("");
-    command->add_option("TEXT", set.text, "the new text; write -- before one that begins with -")->required();
+    command->add_option("TEXT", set.text, "the new text; write -- before one that begins with -")
+        ->required()
+        ->type_name("");
     command->add_option("--attribute", set.attribute, "the attribute of this name; an empty TEXT removes it")
         ->type_name("NAME");
     AddOutput(*command, set.output);
