@@ -19,7 +19,7 @@ using TAVO::String::CPPoolString;
 using TAVO::String::CStringPool;
 
 // Enough elements in memory that the pages the process takes tell something.
-constexpr std::size_t kElementsToWeigh = 400000;
+constexpr std::size_t kElementsToWeigh = 200000;
 constexpr std::size_t kBytesToWeigh = std::size_t{64} << 20; // of text, read again for that
 
 struct Counts {
@@ -77,8 +77,9 @@ double Time(const Document& document) {
     return static_cast<double>(TAVO::Develop::_now_nano() - begin) / 1e6;
 }
 
-void Measure(Item& item, unsigned repeat) {
+void Measure(Item& item, unsigned repeat, Progress& progress) {
     for (unsigned i = 0; i < repeat; ++i) {
+        progress.Step(item.document.Name());
         const double time = Time(item.document);
         item.best = i == 0 ? time : std::min(item.best, time);
         item.sum += time;
@@ -143,19 +144,17 @@ int Stat(const StatOptions& options) {
     if (items.empty()) return worst;
     const auto pool = CStringPool::GetSize() - poolBefore;
     const auto strings = CStringPool::GetNItems() - stringsBefore;
-    const double weight = WeighElement(items, total.elements, bytes);
 
     double time = 0;
     {
-        Progress progress("timing", items.size());
+        Progress progress("timing", items.size() * options.repeat);
         for (Item& item : items) {
-            progress.Step(item.document.Name());
-            Measure(item, options.repeat);
-            progress.Hide();
-            PrintItem(item, options.repeat);
+            Measure(item, options.repeat, progress);
             time += item.best;
         }
     }
+    const double weight = WeighElement(items, total.elements, bytes); // last: it leaves a large heap behind
+    for (const Item& item : items) PrintItem(item, options.repeat);
     Print(items.size() == 1 ? "memory\n" : Grouped(items.size()) + " documents\n");
     if (items.size() > 1) {
         Row("size", Grouped(bytes) + " bytes");
