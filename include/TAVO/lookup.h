@@ -95,16 +95,18 @@ protected:
     Place Locate(unsigned long long hash, const Buffers::CPObjectMemory& probe) noexcept;
     /// The entry at a place that was found.
     HASHENTRY& At(const Place& place) noexcept;
-    /// Inserts at a place that was not found. False without memory; the table is then as it was.
-    bool InsertAt(const Place& place, unsigned long long hash, const Buffers::CPObjectMemory& item) noexcept;
+    /// Inserts at a place that was not found, taking over the reference. False without memory: item and table are then as
+    /// they were.
+    bool InsertAt(const Place& place, unsigned long long hash, Buffers::CPObjectMemory&& item) noexcept;
+    /// Takes the entry at a place that was found out of the table, with its reference.
+    Buffers::CPObjectMemory RemoveAt(const Place& place) noexcept;
 
 private:
-    using Bucket = Buffers::CPObjectVector<HASHENTRY>;
+    friend class TableAccess; // the library's own road to the buckets
+
+    class Bucket;
 
     Bucket* Buckets() const noexcept;
-    bool EnsureIndex() noexcept;
-    int CompareEntry(const HASHENTRY& entry, unsigned long long hash, const Buffers::CPObjectMemory& probe);
-    void Remove(std::size_t bucket, std::size_t index) noexcept;
     void DisposeEntry(std::size_t bucket, std::size_t index);
 
     unsigned long long m_mask;

@@ -9,6 +9,7 @@
 
 #if (defined(__SSE2__) || defined(_M_X64)) && !defined(TAVO_NO_SIMD)
 #include <tmmintrin.h>
+#include <wmmintrin.h>
 #define TAVO_SSE2 1
 #endif
 
@@ -87,6 +88,30 @@ inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
 #endif
 // Byte i of the result is byte index[i]; 0 for an index with the highest bit.
 TAVO_SHUFFLES inline Block Shuffle(Block a, Block index) { return _mm_shuffle_epi8(a, index); }
+
+// Multiplying without carry needs PCLMULQDQ, which comes with Shuffle: functions marked TAVO_MULTIPLIES may call Shuffle
+// and Multiply, and may be called when HasMultiply() is true. Blocks are pairs of 64-bit polynomials, the low one first.
+#if defined(_MSC_VER)
+#define TAVO_MULTIPLIES
+#else
+#define TAVO_MULTIPLIES __attribute__((target("ssse3,pclmul")))
+#endif
+#if defined(_MSC_VER) || defined(TAVO_NO_SHUFFLE)
+inline bool HasMultiply() { return false; }
+#else
+inline bool HasMultiply() { return __builtin_cpu_supports("pclmul") && __builtin_cpu_supports("ssse3"); }
+#endif
+TAVO_MULTIPLIES inline Block MultiplyLow(Block a, Block b) { return _mm_clmulepi64_si128(a, b, 0x00); }
+TAVO_MULTIPLIES inline Block MultiplyHigh(Block a, Block b) { return _mm_clmulepi64_si128(a, b, 0x11); }
+TAVO_INLINE Block Pair(std::uint64_t low, std::uint64_t high) {
+    return _mm_set_epi64x(static_cast<long long>(high), static_cast<long long>(low));
+}
+TAVO_INLINE std::uint64_t LowWord(Block a) { return static_cast<std::uint64_t>(_mm_cvtsi128_si64(a)); }
+TAVO_INLINE std::uint64_t HighWord(Block a) { return LowWord(_mm_srli_si128(a, 8)); }
+TAVO_INLINE Block LowToHigh(Block a) { return _mm_slli_si128(a, 8); }
+TAVO_INLINE Block Xor(Block a, Block b) { return _mm_xor_si128(a, b); }
+// Signed a > b.
+TAVO_INLINE Block Above16(Block a, Block b) { return _mm_cmpgt_epi16(a, b); }
 
 #else
 
