@@ -15,6 +15,7 @@
 #include <sched.h>
 #include <sys/uio.h>
 #include <time.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace TAVO::Platform {
@@ -522,31 +523,38 @@ bool IsReadable(const void* address) noexcept {
 // One access by a fixed offset, without a call, from a library that is loaded late.
 #define TAVO_THREAD_FIELD constinit thread_local __attribute__((tls_model("initial-exec")))
 
+constinit thread_local std::uint32_t t_id = 0; // declared with its access model
+
 namespace {
 
-TAVO_THREAD_FIELD std::uint32_t t_id = 0;
 TAVO_THREAD_FIELD int t_priority = 0;
 TAVO_THREAD_FIELD void* t_releaseScope = nullptr;
 
+} // namespace
+
 // Kernel ids are reused; a new thread must not pass for a dead owner of something.
-TAVO_NOINLINE std::uint32_t TakeThreadId() {
+TAVO_NOINLINE std::uint32_t TakeThreadId() noexcept {
     static constinit std::atomic<std::uint32_t> g_lastId{0};
     do t_id = ++g_lastId;
     while (t_id == 0);
     return t_id;
 }
 
-} // namespace
-
 #undef TAVO_THREAD_FIELD
-
-std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
 
 int GetThreadPriority() noexcept { return t_priority; }
 void SetThreadPriority(int priority) noexcept { t_priority = priority; }
 
 void* GetReleaseScope() noexcept { return t_releaseScope; }
 void SetReleaseScope(void* scope) noexcept { t_releaseScope = scope; }
+
+namespace {
+// The numbers of <linux/membarrier.h>, which old systems lack.
+constexpr int kExpedited = 1 << 3, kRegisterExpedited = 1 << 4;
+} // namespace
+
+bool CanFlushProcessors() noexcept { return syscall(SYS_membarrier, kRegisterExpedited, 0) == 0; }
+void FlushProcessors() noexcept { syscall(SYS_membarrier, kExpedited, 0); }
 
 void YieldThread() noexcept { sched_yield(); }
 
