@@ -72,7 +72,6 @@ struct SystemClock {
     using period = boost::ratio<1, 10000000>;
     using duration = boost::chrono::duration<rep, period>;
     using time_point = boost::chrono::time_point<SystemClock>;
-    static constexpr bool is_steady = false;
 
     // Rounded up, so that a wait is never shorter than asked for.
     static time_point now() {
