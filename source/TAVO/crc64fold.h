@@ -36,12 +36,11 @@ constexpr std::uint64_t Reciprocal() {
 class Fold {
 public:
     // Appends sixteen bytes, the first one highest.
-    TAVO_MULTIPLIES void Add(Simd::Block reversed) {
-        // Times x^128: the low half by that, the high half by x^192.
-        constexpr std::uint64_t kLow = PowerOfX(128), kHigh = PowerOfX(192);
-        const auto by = Simd::Pair(kLow, kHigh);
-        const auto moved = Simd::Xor(Simd::MultiplyHigh(m_state, by), Simd::MultiplyLow(m_state, by));
-        m_state = Simd::Xor(moved, reversed);
+    TAVO_MULTIPLIES void Add(Simd::Block reversed) { m_state = Simd::Xor(Moved<128>(m_state), reversed); }
+
+    // Appends twice sixteen bytes. Only one multiplication waits for the step before.
+    TAVO_MULTIPLIES void Add(Simd::Block first, Simd::Block second) {
+        m_state = Simd::Xor(Moved<256>(m_state), Simd::Xor(Moved<128>(first), second));
     }
 
     TAVO_MULTIPLIES std::uint64_t Checksum() const {
@@ -55,6 +54,13 @@ public:
     }
 
 private:
+    // Times x^bits: the low half by that, the high half by x^64 more.
+    template <int bits> TAVO_MULTIPLIES static Simd::Block Moved(Simd::Block state) {
+        constexpr std::uint64_t kLow = PowerOfX(bits), kHigh = PowerOfX(bits + 64);
+        const auto by = Simd::Pair(kLow, kHigh);
+        return Simd::Xor(Simd::MultiplyHigh(state, by), Simd::MultiplyLow(state, by));
+    }
+
     Simd::Block m_state = Simd::All8(0);
 };
 

@@ -54,32 +54,32 @@ void RaiseComplaint(const char* complaint) noexcept {
 enum class Missing { Create, Leave };
 enum class Match { Exact, AnyCase };
 
-// The one road behind every way to intern.
+// The one road behind every way to intern: a counted entry, null when there is none. Counted before the lock is left:
+// without a handle outside, a sweep may take the entry.
+template <class Text>
+tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match) noexcept {
+    if (match == Match::AnyCase) {
+        if (tagCPOMEMHEADER* found = pool.groups.Find(text, pool.entries)) return Block::Acquire(found);
+        if (missing == Missing::Leave) return nullptr;
+    }
+    CCaseSensitiveHash::Place place;
+    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place)) return Block::Acquire(found);
+    if (missing == Missing::Leave) return nullptr;
+    wchar_t* out;
+    tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
+    if (!block) return nullptr;
+    CPObjectMemory entry(Block::Adopt(block));
+    return text.Write(out) && pool.entries.Add(place, std::move(entry)) ? Block::Acquire(block) : nullptr;
+}
+
 template <class Text> CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
     Pool& pool = ThePool();
-    const char* complaint = nullptr;
-    CPPoolString result;
-    {
-        pool::Guard guard(pool.lock);
-        if (match == Match::AnyCase) {
-            // Counted before the lock is left: without a handle outside, a sweep may take the entry.
-            if (tagCPOMEMHEADER* found = pool.groups.Find(text, pool.entries)) return PoolAccess::Share(found);
-            complaint = std::exchange(pool.groups.complaint, nullptr);
-        }
-        CCaseSensitiveHash::Place place;
-        if (match == Match::Exact || missing == Missing::Create) {
-            if (tagCPOMEMHEADER* found = pool.entries.Find(text, place)) return PoolAccess::Share(found);
-        }
-        wchar_t* out;
-        if (missing == Missing::Create) {
-            if (tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out)) {
-                CPObjectMemory entry(Block::Adopt(block));
-                if (text.Write(out) && pool.entries.Add(place, std::move(entry))) result = PoolAccess::Share(block);
-            }
-        }
-    }
-    RaiseComplaint(complaint);
-    return result;
+    pool.lock.Enter();
+    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match);
+    const char* complaint = std::exchange(pool.groups.complaint, nullptr);
+    pool.lock.Leave();
+    if (TAVO_UNLIKELY(complaint != nullptr)) RaiseComplaint(complaint);
+    return entry ? PoolAccess::Adopt(entry) : CPPoolString();
 }
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {
@@ -241,7 +241,8 @@ CPPoolString CStringPool::GetStringRef(IStringSubmitter* submitter) noexcept {
         text[announced] = 0;
         pool::Key key;
         std::size_t units;
-        if (!pool::KeyOfWide(text, announced, key, units)) return {};
+        // Up to the terminator: the text is whole, so a pair without its second half is a fault, not cut.
+        if (!pool::KeyOfWide(text, SIZE_MAX, key, units)) return {};
         if (units == 0) return CPPoolString::pempty;
         block = Block::Acquire(block);
         holder.free();

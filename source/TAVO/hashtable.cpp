@@ -48,11 +48,17 @@ unsigned long long CBaseHashTable::GetNItems() const noexcept {
 }
 
 CBaseHashTable::Place CBaseHashTable::Locate(unsigned long long hash, const CPObjectMemory& probe) noexcept {
-    return TableAccess::Locate(*this, hash, [&](const CPObjectMemory& item) {
+    const auto order = [&](const CPObjectMemory& item) {
         if (SameBlock(probe, item) || !probe.key() || !item.key()) return 0;
-        const long32 order = CompareItems(probe, item);
-        return order < 0 ? -1 : order > 0 ? 1 : 0;
-    });
+        const long32 compared = CompareItems(probe, item);
+        return compared < 0 ? -1 : compared > 0 ? 1 : 0;
+    };
+    try {
+        return TableAccess::Locate(*this, hash, order);
+    } catch (...) {
+        // Nothing is found there, and nothing can be inserted.
+        return {static_cast<std::size_t>(hash & m_mask), Buffers::NotFound, false};
+    }
 }
 
 CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
@@ -60,6 +66,7 @@ CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
 }
 
 bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, CPObjectMemory&& item) noexcept {
+    if (place.index == Buffers::NotFound) return false; // the comparison threw
     if (m_index.isEmpty() && !m_index.Alloc(m_buckets)) return false;
     return Buckets()[place.bucket].Put(hash, std::move(item), place.index);
 }
@@ -87,7 +94,8 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
         // The new item may belong elsewhere among the entries of its hash: out with the old one, in at the right place.
         // Taking out keeps the room, so the insertion cannot fail.
         const CPObjectMemory added(item), old(Buckets()[place.bucket].Take(place.index, false));
-        InsertAt(Locate(hash, added), hash, CPObjectMemory(added));
+        const Place ordered = Locate(hash, added);
+        InsertAt(ordered.index == Buffers::NotFound ? place : ordered, hash, CPObjectMemory(added));
         return added;
     }
     default:
@@ -174,6 +182,7 @@ bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
         }
         return true;
     } catch (...) {
+        m_cursor = (m_cursor + 1) & m_mask; // one item that always throws must not keep the sweep from all others
         return false;
     }
 }

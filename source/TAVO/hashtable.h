@@ -2,6 +2,7 @@
 // The hash table's search, inline for the tables of the library that know their items.
 
 #include "blocks.h"
+#include "simd.h"
 
 #include <TAVO/lookup.h>
 
@@ -37,16 +38,25 @@ public:
     }
 
     // Where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would be inserted.
-    // `order` tells how what is sought compares with an item: below 0, 0, above 0.
-    template <class Order> static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order) {
+    // `order` tells how what is sought compares with an item: below 0, 0, above 0. `typicalCount` is how many entries a
+    // bucket probably has: a large table's cache misses then run side by side instead of one after the other.
+    template <class Order>
+    static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order,
+                        std::size_t typicalCount = 0) {
         Place place{static_cast<std::size_t>(hash & table.m_mask), 0, false};
         const Bucket* buckets = Buckets(table);
         if (!buckets) return place;
         const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
         if (!bucket) return place;
-        const std::size_t count = bucket->sUsed / sizeof(Entry);
         const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
+        Simd::Prefetch(entries + Guess(hash, typicalCount));
+        const std::size_t count = bucket->sUsed / sizeof(Entry);
         place.index = LowerBound(entries, count, hash);
+        if (place.index < count) {
+            const auto* block = reinterpret_cast<const char*>(Buffers::Block::Of(entries[place.index].item));
+            Simd::Prefetch(block);
+            Simd::Prefetch(block + 64);
+        }
         // Entries of equal hash stand in the order of their items; nearly always there is one. Bisect the run.
         std::size_t end = place.index;
         for (std::size_t step = 1; end < count && entries[end].hash == hash; step *= 2) end += step;
@@ -69,13 +79,18 @@ public:
     }
 
 private:
+    // Hashes are spread over their whole range, so the value tells the place.
+    static std::size_t Guess(unsigned long long hash, std::size_t count) {
+        return static_cast<std::size_t>(((hash >> 32) * count) >> 32);
+    }
+
     // First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed
     // from the value and the search widens from there: one or two cache lines instead of a line per halving. Hashes
     // that are not spread cost twice a bisection.
     static std::size_t LowerBound(const Entry* entries, std::size_t count, unsigned long long hash) {
         if (count == 0) return 0;
         std::size_t low = 0, high = count; // entries before low are below, entries from high on are not
-        const auto guess = static_cast<std::size_t>(((hash >> 32) * count) >> 32);
+        const std::size_t guess = Guess(hash, count);
         if (entries[guess].hash < hash) {
             low = guess + 1;
             for (std::size_t step = 1; low + step <= high; step *= 2) {

@@ -82,6 +82,8 @@ template <class T> bool CPObjectVector<T>::GrowTo(std::size_t capacity) noexcept
     return true;
 }
 
+template <class T> bool CPObjectVector<T>::LeaveStatic() noexcept { return !IsStatic() || GrowTo(GetNItems()); }
+
 template <class T> bool CPObjectVector<T>::Reserve(std::size_t count) noexcept {
     if (count <= GetNItems()) return true;
     if (IsPrivate() && count * sizeof(T) <= GetAllocSize() && count <= detail::kMostElements) return true;
@@ -93,17 +95,15 @@ template <class T> bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
     if (count == old) return true;
     if (count > detail::kMostElements) return false;
     if (count < old) {
+        if (!LeaveStatic()) return false;
         // One at a time from the end: a finalizer that looks at the vector never sees a dead element.
         for (std::size_t last = old; last-- > count;) {
-            T gone(std::move(Elements()[last]));
-            if (!SetSize(last * sizeof(T))) {
-                ::new (static_cast<void*>(Elements() + last)) T(std::move(gone));
-                return false;
-            }
+            const T gone(std::move(Elements()[last]));
+            SetSize(last * sizeof(T));
         }
         return true;
     }
-    if (count * sizeof(T) > GetAllocSize() && !GrowTo(count)) return false;
+    if ((IsStatic() || count * sizeof(T) > GetAllocSize()) && !GrowTo(count)) return false;
     _create(Elements() + old, (count - old) * sizeof(T));
     return SetSize(count * sizeof(T));
 }
@@ -117,8 +117,8 @@ template <class T> bool CPObjectVector<T>::Insert(const T& element, std::size_t 
 template <class T>
 bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept {
     const std::size_t count = GetNItems();
-    if (GetSize() + sizeof(T) > GetAllocSize() && !GrowTo(capacityWhenFull)) return false;
-    if (!SetSize((count + 1) * sizeof(T))) return false; // a static block
+    if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(capacityWhenFull)) return false;
+    SetSize((count + 1) * sizeof(T));
     if (position > count) position = count;
     T* slot = Elements() + position;
     std::memmove(static_cast<void*>(slot + 1), static_cast<const void*>(slot), (count - position) * sizeof(T));
@@ -127,7 +127,7 @@ bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size
 }
 
 template <class T> bool CPObjectVector<T>::Delete(std::size_t index, bool releaseWhenEmpty) noexcept {
-    if (index >= GetNItems() || !SetSize(GetSize())) return false; // beyond the end, or a static block
+    if (index >= GetNItems() || !LeaveStatic()) return false;
     Extract(index, releaseWhenEmpty);
     return true;
 }
@@ -153,7 +153,7 @@ template <class T> std::size_t CPObjectVector<T>::Find(const T& element, std::si
 }
 
 template <class T> void CPObjectVector<T>::Sort(int (*compare)(const void*, const void*)) noexcept {
-    Buffers::Sort::vfqsort(Elements(), GetNItems(), sizeof(T), compare);
+    if (GetNItems() > 1 && LeaveStatic()) Buffers::Sort::vfqsort(Elements(), GetNItems(), sizeof(T), compare);
 }
 
 } // namespace TAVO::Buffers

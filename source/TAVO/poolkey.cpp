@@ -98,17 +98,21 @@ constexpr std::size_t kFewUnits = 8;
 
 #if defined(TAVO_CRC_FOLDS)
 
-// Both checksums of a text of eight units or more, eight at a step. The first step takes what is left over.
+// Both checksums of a text of eight units or more, eight or sixteen at a step. The first step takes what is left over.
 class Folder {
 public:
-    // `capitals`: 20 in every unit (or byte) that is a capital letter.
-    TAVO_MULTIPLIES void Add(Simd::Block reversed, Simd::Block reversedFolded, bool capitals) {
-        if (m_folded || capitals) {
-            if (!m_folded) m_lower = m_exact;
+    // One block or two, and the same in lower case; `capitals` tells whether the two differ.
+    template <class... Blocks>
+    TAVO_MULTIPLIES void Add(bool capitals, Blocks... blocks) {
+        if (capitals && !m_folded) {
             m_folded = true;
-            m_lower.Add(reversedFolded);
+            m_lower = m_exact;
         }
-        m_exact.Add(reversed);
+        m_exact.Add(blocks...);
+    }
+    template <class... Blocks>
+    TAVO_MULTIPLIES void AddLower(Blocks... blocks) {
+        if (m_folded) m_lower.Add(blocks...);
     }
     TAVO_MULTIPLIES void Store(Key& key) const {
         key.hash = m_exact.Checksum();
@@ -129,18 +133,34 @@ TAVO_MULTIPLIES inline Simd::Block Reverse(Simd::Block block, std::size_t bytes)
 }
 
 TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key& key) {
-    constexpr std::uint64_t kEach = 0x0101010101010101;
-    // Byte i becomes unit i: its place from the top, a zero byte behind it.
-    const auto order = Simd::Pair(0x0480058006800780, 0x0080018002800380);
+    using namespace Simd;
+    // Byte i becomes unit i: its place from the top, a zero byte behind it. Two halves of a block.
+    const Block low = Pair(0x0480058006800780, 0x0080018002800380);
+    const Block high = Pair(0x0C800D800E800F80, 0x088009800A800B80);
+    const auto letters = [](Block bytes) TAVO_MULTIPLIES {
+        return And(Below8(All8('A' - 1), bytes), Below8(bytes, All8('Z' + 1)));
+    };
     Folder folder;
-    std::size_t taken = count % 8 ? count % 8 : 8;
-    for (std::size_t i = 0; i < count; i += taken, taken = 8) {
-        std::uint64_t bytes;
-        std::memcpy(&bytes, text + i, 8);
-        bytes <<= 8 * (8 - taken);
-        const std::uint64_t capitals = (bytes + 0x3F * kEach) & ~(bytes + 0x25 * kEach) & 0x80 * kEach;
-        folder.Add(Simd::Shuffle(Simd::Pair(bytes, 0), order),
-                   Simd::Shuffle(Simd::Pair(bytes | capitals >> 2, 0), order), capitals != 0);
+    const auto one = [&](Block bytes) TAVO_MULTIPLIES {
+        const Block capitals = letters(bytes);
+        folder.Add(Mask(capitals) != 0, Shuffle(bytes, low));
+        folder.AddLower(Shuffle(Or(bytes, And(capitals, All8(0x20))), low));
+    };
+
+    std::size_t i = count % 8 ? count % 8 : 8;
+    std::uint64_t first;
+    std::memcpy(&first, text, 8);
+    one(Pair(first << 8 * (8 - i), 0));
+    if ((count - i) % kBlock) {
+        std::memcpy(&first, text + i, 8);
+        one(Pair(first, 0));
+        i += 8;
+    }
+    for (; i < count; i += kBlock) {
+        const Block bytes = Load(text + i), capitals = letters(bytes);
+        const Block lower = Or(bytes, And(capitals, All8(0x20)));
+        folder.Add(Mask(capitals) != 0, Shuffle(bytes, low), Shuffle(bytes, high));
+        folder.AddLower(Shuffle(lower, low), Shuffle(lower, high));
     }
     key.length = key.utf8Size = count;
     folder.Store(key);
@@ -163,8 +183,8 @@ TAVO_MULTIPLIES bool FoldUnits(const wchar_t* text, std::size_t count, Key& key)
         const std::uint32_t below80 = Mask(Equal16(And(units, All16(0xFF80)), All16(0))) & present;
         key.utf8Size += 3 * taken - static_cast<std::size_t>(std::popcount(below800) + std::popcount(below80)) / 2;
         const Block letters = And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units));
-        folder.Add(Reverse(units, 2 * taken), Reverse(Or(units, And(letters, All16(0x20))), 2 * taken),
-                   (Mask(letters) & present) != 0);
+        folder.Add((Mask(letters) & present) != 0, Reverse(units, 2 * taken));
+        folder.AddLower(Reverse(Or(units, And(letters, All16(0x20))), 2 * taken));
     }
     folder.Store(key);
     return true;

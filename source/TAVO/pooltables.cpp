@@ -149,9 +149,12 @@ bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry) noexcep
     tagCPOMEMHEADER* block = Block::Of(entry);
     // The group first: it looks for a lower-case variant, which must not be the entry itself.
     if (!m_groups.Add(block, *this)) return false;
-    if (InsertAt(place, EntryOf(block).hash, std::move(entry))) return true;
-    m_groups.Remove(block);
-    return false;
+    if (!InsertAt(place, EntryOf(block).hash, std::move(entry))) {
+        m_groups.Remove(block);
+        return false;
+    }
+    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].GetNItems();
+    return true;
 }
 
 long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {

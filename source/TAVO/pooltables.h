@@ -21,12 +21,15 @@ public:
 
     // The entry of that text; else null, and `place` tells where it would stand.
     template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place) const {
-        place = Lookup::TableAccess::Locate(*this, text.key.hash, [&](const Buffers::CPObjectMemory& item) {
-            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
-            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
-            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-            return text.Compare(entry.text);
-        });
+        place = Lookup::TableAccess::Locate(
+            *this, text.key.hash,
+            [&](const Buffers::CPObjectMemory& item) {
+                const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
+                if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
+                if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+                return text.Compare(entry.text);
+            },
+            m_typicalCount);
         return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
     }
 
@@ -50,6 +53,7 @@ private:
     void OnDispose(const Buffers::CPObjectMemory& item) override;
 
     CCaseInsensitiveHash& m_groups;
+    std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
 };
 
 // Groups by case-insensitive hash.

@@ -22,6 +22,11 @@ constexpr std::size_t kBlock = 16;
 using Block = __m128i;
 
 TAVO_INLINE Block Load(const void* p) { return _mm_loadu_si128(static_cast<const Block*>(p)); }
+// Eight bytes from each of two places.
+TAVO_INLINE Block LoadHalves(const void* low, const void* high) {
+    return _mm_unpacklo_epi64(_mm_loadl_epi64(static_cast<const Block*>(low)),
+                              _mm_loadl_epi64(static_cast<const Block*>(high)));
+}
 TAVO_INLINE Block LoadAligned(const void* p) { return _mm_load_si128(static_cast<const Block*>(p)); }
 TAVO_INLINE void Store(void* p, Block x) { _mm_storeu_si128(static_cast<Block*>(p), x); }
 TAVO_INLINE void StoreHalf(void* p, Block x) { _mm_storel_epi64(static_cast<Block*>(p), x); }
@@ -67,6 +72,8 @@ TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzer
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
 // Lanes of 16-bit numbers from -128 to 127 as bytes.
 TAVO_INLINE Block PackSigned(Block a, Block b) { return _mm_packs_epi16(a, b); }
+// The lower eight bytes as a number.
+TAVO_INLINE std::uint64_t LowHalf(Block a) { return static_cast<std::uint64_t>(_mm_cvtsi128_si64(a)); }
 // The sum of all unsigned bytes.
 TAVO_INLINE std::size_t Sum8(Block a) {
     const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
@@ -133,6 +140,11 @@ template <class Lane, class Function> Block Map(Block a, Block b, Function funct
 inline Block Load(const void* p) {
     Block x;
     std::memcpy(&x, p, 16);
+    return x;
+}
+inline Block LoadHalves(const void* low, const void* high) {
+    Block x;
+    std::memcpy(x.b, low, 8), std::memcpy(x.b + 8, high, 8);
     return x;
 }
 inline Block LoadAligned(const void* p) { return Load(p); }
@@ -236,6 +248,11 @@ inline Block Narrow(Block a, Block b) {
     return x;
 }
 inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
+inline std::uint64_t LowHalf(Block a) {
+    std::uint64_t half;
+    std::memcpy(&half, &a, sizeof half);
+    return half;
+}
 inline std::size_t Sum8(Block a) {
     std::size_t sum = 0;
     for (std::uint8_t byte : a.b) sum += byte;
@@ -286,6 +303,15 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
     return i;
 }
 #endif
+
+// Asks for the cache line at `address`, which need not be readable: to be read, or to be written soon.
+TAVO_INLINE void Prefetch(const void* address) {
+#if defined(TAVO_SSE2)
+    _mm_prefetch(static_cast<const char*>(address), _MM_HINT_T0);
+#else
+    static_cast<void>(address);
+#endif
+}
 
 // Tells the processor that this thread spins.
 inline void Pause() {

@@ -22,12 +22,58 @@ namespace {
 constexpr std::size_t kLongest = 4; // bytes of a character
 constexpr std::size_t kUnitsPerBlock = Simd::kBlock / sizeof(wchar_t);
 
+bool IsAscii(Simd::Block units) {
+    return Simd::Mask(Simd::Equal16(Simd::And(units, Simd::All16(0xFF80)), Simd::All16(0))) == 0xFFFF;
+}
+
+bool HasEscape(Simd::Block units) {
+    using namespace Simd;
+    // & and ' differ in bit 0, < and > in bit 1.
+    const Simd::Block references = Equal16(And(units, All16(0xFFFE)), All16('&'));
+    const Simd::Block brackets = Equal16(And(units, All16(0xFFFD)), All16('<'));
+    return Mask(Or(Or(references, brackets), Equal16(units, All16('"')))) != 0;
+}
+
+template <bool escapes> bool IsPlain(Simd::Block units) { return IsAscii(units) && !(escapes && HasEscape(units)); }
+
+template <bool escapes> bool IsPlain(wchar_t unit) {
+    return unit < 0x80 && !(escapes && (detail::kAsciiClasses[unit] & detail::kEscapeBit));
+}
+
+// Stores all units as bytes if they are ASCII and, with `escapes`, none of & < > " '; else false. Most names and values
+// are shorter than two blocks, so there is no loop over single units: the last block overlaps the one before it.
+template <bool escapes> TAVO_INLINE bool NarrowWhole(unsigned char* out, const wchar_t* text, std::size_t count) {
+    constexpr std::size_t kHalf = kUnitsPerBlock / 2;
+    if (count >= kUnitsPerBlock) {
+        for (std::size_t i = 0;; i = i + 2 * kUnitsPerBlock <= count ? i + kUnitsPerBlock : count - kUnitsPerBlock) {
+            const Simd::Block units = Simd::Load(text + i);
+            if (!IsPlain<escapes>(units)) return false;
+            Simd::StoreHalf(out + i, Simd::Narrow(units, units));
+            if (i + kUnitsPerBlock == count) return true;
+        }
+    }
+    if (count >= kHalf) {
+        const Simd::Block units = Simd::LoadHalves(text, text + count - kHalf);
+        if (!IsPlain<escapes>(units)) return false;
+        const std::uint64_t bytes = Simd::LowHalf(Simd::Narrow(units, units));
+        std::memcpy(out, &bytes, kHalf);
+        const std::uint64_t last = bytes >> 32;
+        std::memcpy(out + count - kHalf, &last, kHalf);
+        return true;
+    }
+    for (std::size_t i = 0; i < count; ++i) {
+        if (!IsPlain<escapes>(text[i])) return false;
+        out[i] = static_cast<unsigned char>(text[i]);
+    }
+    return true;
+}
+
 // Stores the leading ASCII units as bytes; how many. Nothing is read or written at or behind `count`.
 std::size_t NarrowAscii(unsigned char* out, const wchar_t* text, std::size_t count) {
     std::size_t i = 0;
     for (; count - i >= kUnitsPerBlock; i += kUnitsPerBlock) {
         const Simd::Block units = Simd::Load(text + i);
-        if (Simd::Mask(Simd::Equal16(Simd::And(units, Simd::All16(0xFF80)), Simd::All16(0))) != 0xFFFF) break;
+        if (!IsAscii(units)) break;
         Simd::StoreHalf(out + i, Simd::Narrow(units, units));
     }
     for (; i < count && text[i] < 0x80; ++i) out[i] = static_cast<unsigned char>(text[i]);
@@ -73,6 +119,47 @@ bool _CXMLOut::Begin(eXMLEncoding encoding, bool pretty) {
     m_failed = false;
     EndLine();
     return !m_failed;
+}
+
+template <bool escapes, std::size_t before, std::size_t behind>
+TAVO_INLINE bool _CXMLOut::Compose(const char (&prefix)[before], const wchar_t* text, std::size_t count,
+                                   const char (&suffix)[behind]) {
+    constexpr std::size_t kMarkup = before + behind - 2;
+    if (m_encoding != XMLEncodingUTF8 || m_free < count + kMarkup) return false;
+    unsigned char* target = Target() + (before - 1);
+    if (!NarrowWhole<escapes>(target, text, count)) return false;
+    std::memcpy(target - (before - 1), prefix, before - 1);
+    std::memcpy(target + count, suffix, behind - 1);
+    m_free -= count + kMarkup;
+    return true;
+}
+
+template <std::size_t before, std::size_t behind>
+TAVO_INLINE bool _CXMLOut::Put(const char (&prefix)[before], const wchar_t* text, std::size_t count,
+                               const char (&suffix)[behind]) {
+    if (TAVO_UNLIKELY(m_atLineStart) && !PutIndentation()) return false;
+    return Compose<false>(prefix, text, count, suffix) ||
+           (EncodeMarkup(prefix, before - 1) && Encode(text, count) && EncodeMarkup(suffix, behind - 1));
+}
+
+template <std::size_t behind>
+TAVO_INLINE bool _CXMLOut::PutIfPlain(const wchar_t* text, std::size_t count, const char (&suffix)[behind]) {
+    return !m_atLineStart && Compose<true>("", text, count, suffix);
+}
+
+TAVO_NOINLINE bool _CXMLOut::EncodeMarkup(const char* markup, std::size_t count) {
+    wchar_t text[64];
+    for (std::size_t i = 0; i < count; ++i) text[i] = static_cast<wchar_t>(markup[i]);
+    return Encode(text, count);
+}
+
+bool _CXMLOut::Write(const wchar_t* text, std::size_t count) { return Put(text, count); }
+
+bool _CXMLOut::EndLine() {
+    if (!m_pretty) return true;
+    if (!Put("\r\n")) SetFailed(); // Intended: not told here, where a textbook would; the mark voids the result
+    m_atLineStart = true;
+    return true;
 }
 
 bool _CXMLOut::PutIndentation() {
@@ -243,14 +330,8 @@ bool MustEscape(wchar_t unit) { return IsAsciiClass(unit, kEscapeBit); }
 
 // The first of & < > " '.
 const wchar_t* FindEscape(const wchar_t* text, const wchar_t* end) {
-    using namespace Simd;
-    for (; end - text >= static_cast<std::ptrdiff_t>(kUnitsPerBlock); text += kUnitsPerBlock) {
-        // & and ' differ in bit 0, < and > in bit 1.
-        const Simd::Block units = Load(text);
-        const Simd::Block references = Equal16(And(units, All16(0xFFFE)), All16('&'));
-        const Simd::Block brackets = Equal16(And(units, All16(0xFFFD)), All16('<'));
-        if (Mask(Or(Or(references, brackets), Equal16(units, All16('"'))))) break;
-    }
+    for (; end - text >= static_cast<std::ptrdiff_t>(kUnitsPerBlock); text += kUnitsPerBlock)
+        if (HasEscape(Simd::Load(text))) break;
     while (text != end && !MustEscape(*text)) ++text;
     return text;
 }
@@ -266,6 +347,7 @@ const wchar_t* FindSectionEnd(const wchar_t* text, const wchar_t* end) {
 
 struct TextRange {
     explicit TextRange(const CPPoolString& text) : first(text), end(first + String::UnitsOf(text)) {}
+    std::size_t Count() const { return static_cast<std::size_t>(end - first); }
     const wchar_t* first;
     const wchar_t* end;
 };
@@ -320,7 +402,9 @@ public:
         while (!m_path.IsEmpty()) {
             Frame& last = m_path.Last();
             if (last.next != last.end) {
-                if (!Open(*last.next++)) return false;
+                const CPXMLObject& child = *last.next++;
+                
+                if (!Open(child)) return false;
                 continue;
             }
             const Node& node = *last.node;
@@ -339,7 +423,7 @@ private:
         const Node& node = NodeOf(element);
         if (node.contentKind == kInstruction) return PutInstruction(node);
         if (IsContainer(node)) return Descend(node);
-        if (!m_out.Put("<") || !PutString(node.name) || !PutAttributes(node)) return false;
+        if (!Put("<", node.name, "") || !PutAttributes(node)) return false;
         switch (node.contentKind) {
         case kNothing:
             return m_out.Put("/>") && m_out.EndLine();
@@ -365,32 +449,32 @@ private:
         return m_path.Push({&node, first, first + Elements::Count(node.elements)});
     }
 
-    bool PutString(const CPPoolString& text) { return m_out.Put(text, String::UnitsOf(text)); }
-
-    bool PutEndTag(const Node& node) {
-        return m_out.Put("</") && PutString(node.name) && m_out.Put(">") && m_out.EndLine();
+    template <std::size_t before, std::size_t behind>
+    bool Put(const char (&prefix)[before], const CPPoolString& text, const char (&suffix)[behind]) {
+        return m_out.Put(prefix, text, String::UnitsOf(text), suffix);
     }
 
+    bool PutEndTag(const Node& node) { return Put("</", node.name, ">") && m_out.EndLine(); }
+
     bool PutInstruction(const Node& node) {
-        return node.data.isdef() && m_out.Put("<?") && PutString(node.name) && m_out.Put(" ") && PutString(node.data) &&
-               m_out.Put("?>");
+        return node.data.isdef() && Put("<?", node.name, " ") && Put("", node.data, "?>");
     }
 
     bool PutAttributes(const Node& node) {
         const Attribute* attribute = Attributes::First(node.attributes);
-        for (std::size_t left = Attributes::Count(node.attributes); left; --left, ++attribute)
-            if (!m_out.Put(" ") || !PutString(attribute->name) || !m_out.Put("=\"") || !PutEscaped(attribute->value) ||
-                !m_out.Put("\""))
-                return false;
+        for (std::size_t left = Attributes::Count(node.attributes); left; --left, ++attribute) {
+            if (!Put(" ", attribute->name, "=\"")) return false;
+            const TextRange value(attribute->value);
+            if (!m_out.PutIfPlain(value.first, value.Count(), "\"") && !PutEscaped(value)) return false;
+        }
         return true;
     }
 
-    bool PutEscaped(const CPPoolString& value) {
-        const TextRange range(value);
-        for (const wchar_t* text = range.first;;) {
-            const wchar_t* escape = FindEscape(text, range.end);
+    TAVO_NOINLINE bool PutEscaped(const TextRange& value) {
+        for (const wchar_t* text = value.first;;) {
+            const wchar_t* escape = FindEscape(text, value.end);
             if (!PutRange(text, escape)) return false;
-            if (escape == range.end) return true;
+            if (escape == value.end) return m_out.Put("\"");
             if (!PutReference(*escape)) return false;
             text = escape + 1;
         }
@@ -411,13 +495,17 @@ private:
         }
     }
 
-    // Data with a character that needs escaping goes out literally, in as many CDATA sections as it takes.
     bool PutData(const Node& node) {
         const TextRange range(node.data);
+        return m_out.PutIfPlain(range.first, range.Count(), "") || PutSections(range);
+    }
+
+    // Data with a character that needs escaping goes out literally, in as many CDATA sections as it takes.
+    TAVO_NOINLINE bool PutSections(const TextRange& range) {
         if (FindEscape(range.first, range.end) == range.end) return PutRange(range.first, range.end);
         for (const wchar_t* text = range.first; text != range.end;) {
             const wchar_t* sectionEnd = FindSectionEnd(text, range.end);
-            if (!m_out.Put("<![CDATA[") || !PutRange(text, sectionEnd) || !m_out.Put("]]>")) return false;
+            if (!m_out.Put("<![CDATA[", text, static_cast<std::size_t>(sectionEnd - text), "]]>")) return false;
             text = sectionEnd;
         }
         return true;

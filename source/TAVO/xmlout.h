@@ -34,37 +34,23 @@ public:
     // Starts over and writes the xml declaration. The encoding must be 1, 2 or 3.
     bool Begin(eXMLEncoding encoding, bool pretty);
 
-    bool Write(const wchar_t* text, std::size_t count) final { return Put(text, count); }
+    bool Write(const wchar_t* text, std::size_t count) final;
     void Indent() final { ++m_level; }
     std::size_t Outdent() final { return m_level ? --m_level : 0; }
-    bool EndLine() final {
-        if (!m_pretty) return true;
-        if (!Put("\r\n")) SetFailed(); // Intended: not told here, where a textbook would; the mark voids the result
-        m_atLineStart = true;
-        return true;
-    }
+    bool EndLine() final;
     void SetFailed() final { m_failed = true; }
 
     bool HasFailed() const { return m_failed; }
 
     // Write without the virtual call.
-    bool Put(const wchar_t* text, std::size_t count) {
-        if (TAVO_UNLIKELY(m_atLineStart) && !PutIndentation()) return false;
-        return Encode(text, count);
-    }
+    bool Put(const wchar_t* text, std::size_t count) { return Put("", text, count, ""); }
     // The same for markup of the writer's own, which is ASCII.
-    template <std::size_t size> bool Put(const char (&markup)[size]) {
-        constexpr std::size_t count = size - 1;
-        if (TAVO_UNLIKELY(m_atLineStart) && !PutIndentation()) return false;
-        if (TAVO_LIKELY(m_encoding == XMLEncodingUTF8 && m_free >= count)) {
-            std::memcpy(Target(), markup, count);
-            m_free -= count;
-            return true;
-        }
-        wchar_t text[count];
-        for (std::size_t i = 0; i < count; ++i) text[i] = static_cast<wchar_t>(markup[i]);
-        return Encode(text, count);
-    }
+    template <std::size_t size> bool Put(const char (&markup)[size]) { return Put(markup, nullptr, 0, ""); }
+    // A text between markup, in one go where it is plain ASCII.
+    template <std::size_t before, std::size_t behind>
+    bool Put(const char (&prefix)[before], const wchar_t* text, std::size_t count, const char (&suffix)[behind]);
+    // The same for text that may need escaping: false when it does, or when that is not known; nothing is written then.
+    template <std::size_t behind> bool PutIfPlain(const wchar_t* text, std::size_t count, const char (&suffix)[behind]);
 
 protected:
     const unsigned char* Buffered() const { return m_buffer; }
@@ -72,6 +58,9 @@ protected:
     void EmptyBuffer() { m_free = kBufferSize; }
 
 private:
+    template <bool escapes, std::size_t before, std::size_t behind>
+    bool Compose(const char (&prefix)[before], const wchar_t* text, std::size_t count, const char (&suffix)[behind]);
+    bool EncodeMarkup(const char* markup, std::size_t count);
     unsigned char* Target() { return m_buffer + (kBufferSize - m_free); }
     bool PutIndentation();
     bool Encode(const wchar_t* text, std::size_t count);

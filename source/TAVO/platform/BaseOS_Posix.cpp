@@ -15,6 +15,7 @@
 #include <sched.h>
 #include <sys/uio.h>
 #include <time.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace TAVO::Platform {
@@ -546,6 +547,14 @@ void SetThreadPriority(int priority) noexcept { t_priority = priority; }
 
 void* GetReleaseScope() noexcept { return t_releaseScope; }
 void SetReleaseScope(void* scope) noexcept { t_releaseScope = scope; }
+
+namespace {
+// The numbers of <linux/membarrier.h>, which old systems lack.
+constexpr int kExpedited = 1 << 3, kRegisterExpedited = 1 << 4;
+} // namespace
+
+bool CanFlushProcessors() noexcept { return syscall(SYS_membarrier, kRegisterExpedited, 0) == 0; }
+void FlushProcessors() noexcept { syscall(SYS_membarrier, kExpedited, 0); }
 
 void YieldThread() noexcept { sched_yield(); }
 

@@ -199,6 +199,9 @@ __attribute__((init_priority(101))) ScopeSlotOwner g_scopeSlotOwner;
 void* GetReleaseScope() noexcept { return TlsGetValue(GetScopeSlot()); }
 void SetReleaseScope(void* scope) noexcept { TlsSetValue(GetScopeSlot(), scope); }
 
+bool CanFlushProcessors() noexcept { return true; }
+void FlushProcessors() noexcept { FlushProcessWriteBuffers(); }
+
 void YieldThread() noexcept { SwitchToThread(); }
 void SleepMilliseconds(std::uint32_t milliseconds) noexcept { Sleep(milliseconds); }
 

@@ -96,6 +96,11 @@ void SetThreadPriority(int priority) noexcept;
 void* GetReleaseScope() noexcept;
 void SetReleaseScope(void* scope) noexcept;
 
+// Makes every running thread of the process pass a full memory barrier, so that one side of a protocol can do without.
+// CanFlushProcessors prepares it, and tells whether the system offers it. Costs some microseconds.
+bool CanFlushProcessors() noexcept;
+void FlushProcessors() noexcept;
+
 // Gives up the processor, or sleeps.
 void YieldThread() noexcept;
 void SleepMilliseconds(std::uint32_t milliseconds) noexcept;
