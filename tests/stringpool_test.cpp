@@ -1,8 +1,10 @@
 // Interning against a slow reading of its rules: keys, identity, cut texts, case groups, sweeps, submitters.
 
+#include "plugin/pool.h"
 #include "support/assertions.h"
 #include "support/guardpage.h"
 #include "support/heapwatch.h"
+#include "support/machine.h"
 #include "support/texts.h"
 
 #include <atomic>
@@ -557,6 +559,25 @@ struct HostStatic {
 TEST(Pool, ServesStaticConstructors) {
     EXPECT_STREQ(g_static.entry, L"made by a static constructor");
     EXPECT_EQ(Entry(CPPoolString(L"made by a static constructor")), g_static.entry);
+}
+
+TEST(Pool, ServesStaticObjectsOfAPlugin) {
+    CPPoolString mine;
+    const wchar_t* late = nullptr;
+    {
+        const support::Plugin plugin("TAVOTestPlugin");
+        const auto held = plugin.Find<plugin::HeldEntry>(plugin::kHeldEntry);
+        ASSERT_NE(held, nullptr);
+        mine = plugin::kHeldText;
+        EXPECT_EQ(held(&late), Entry(mine));
+        Sweep(2);
+        EXPECT_EQ(held(&late), Entry(CPPoolString(plugin::kHeldText)));
+    }
+    EXPECT_EQ(Entry(CStringPool::QueryStringRef(plugin::kLateText)), late) << "its destructor ran, and interned";
+    EXPECT_STREQ(Entry(mine), plugin::kHeldText);
+    mine.free();
+    Sweep(2);
+    EXPECT_TRUE(CStringPool::QueryStringRef(plugin::kHeldText).isnull()) << "nobody holds it any more";
 }
 
 } // namespace
