@@ -94,7 +94,7 @@ public:
 
 protected:
     /// A handle that takes over one reference of @p header.
-    explicit CPObjectMemory(tagCPOMEMHEADER* header) noexcept : m_pMH(header) {}
+    constexpr explicit CPObjectMemory(tagCPOMEMHEADER* header) noexcept : m_pMH(header) {}
 
     /// Shares the source's block, then releases the old one.
     void CopyCPMemory(const CPObjectMemory& source) noexcept;

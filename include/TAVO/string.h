@@ -1,12 +1,15 @@
 #pragma once
-// Text: transcoding between UTF-8, UTF-16, UTF-32 and the ANSI code page, owned strings of one character set each, and
-// utilities over wide text.
+// Text: transcoding between UTF-8, UTF-16, UTF-32 and the ANSI code page, owned strings of one character set each,
+// utilities over wide text, and the pool of interned strings with its handles and arrays.
 //
 // Wide characters have 16 bits and hold UTF-16, so every acfW function behaves as its UTF16 namesake.
 // Threads: the functions keep no state and may be called from any thread; an object is for one thread at a time.
 
 #include <cstddef>
+#include <TAVO/buffers.h>
 #include <TAVO/config.h>
+#include <type_traits>
+#include <utility>
 
 namespace TAVO {
 namespace String {
@@ -342,6 +345,287 @@ TAVO_API bool _isblank(wchar_t c);
 TAVO_API bool _iswhitespace(wchar_t c);
 /// Line feed or carriage return.
 TAVO_API bool _isCRLF(wchar_t c);
+
+// --- The string pool -----------------------------------------------------------------------------------------------
+//
+// Every distinct text is stored once in the process, as a reference-counted entry. Handles are one pointer; they compare
+// and hash by their entries' precomputed fields. Entries that nobody holds stay until two sweeps in a row find them idle.
+//
+// Texts of equal length, equal hashes (two of 64 bits) and equal first ten units are one entry.
+// A character above U+FFFF counts 1 in len() when it came as a pair of wide text, and 2 when it came as UTF-8; all its
+// units are stored in both cases, so a text may have more units than len() says. The two are never one entry.
+
+class CPPoolString;
+
+namespace detail {
+
+// What a pool entry holds; its text follows in the same block.
+struct tagPOOLENTRY {
+    std::uint32_t idleSweeps;    // how many sweeps in a row found the entry unreferenced
+    std::size_t length;          // units as the key counts them: a pair of wide text counts 1
+    std::size_t utf8Size;        // bytes of the text in UTF-8
+    unsigned long long hash;     // CRC-64 of the text
+    unsigned long long hashi;    // CRC-64 of the text in lower case
+    const wchar_t* text;         // the zero-terminated text behind these fields
+    const unsigned char* utf8;   // the UTF-8 form, null until first asked for
+};
+
+} // namespace detail
+
+/// Writes a text straight into a new pool entry.
+class IStringSubmitter {
+public:
+    /// Units of the text to come.
+    virtual std::size_t GetStringLen() = 0;
+    /// Writes the text, at most GetStringLen() units, into @p out, which is zeroed and has room for a terminator.
+    /// @return false to refuse. Called without any lock; an exception counts as false.
+    virtual bool GetString(wchar_t* out) = 0;
+
+protected:
+    ~IStringSubmitter() = default;
+};
+
+/// The process-wide pool. Thread-safe; works from any static constructor or destructor, before AppInit and after AppExit.
+///
+/// The names tell what a call does: Get interns a missing text, Query answers the null string for it; an "i" matches
+/// regardless of case (A to Z) and answers the first variant interned; an "n" takes at most n units or bytes of the text,
+/// never reading at or behind index n, and leaves out a character that this cuts.
+/// Null pointers give the null string, empty texts the empty one; a text with an invalid sequence cannot be interned and
+/// gives the null string, as does exhausted memory.
+class TAVO_API CStringPool {
+public:
+    static CPPoolString GetStringRef(const wchar_t* text) noexcept;
+    static CPPoolString GetStringRefn(const wchar_t* text, std::size_t n) noexcept;
+    static CPPoolString QueryStringRef(const wchar_t* text) noexcept;
+    static CPPoolString QueryStringRefn(const wchar_t* text, std::size_t n) noexcept;
+    static CPPoolString GetStringRefi(const wchar_t* text) noexcept;
+    static CPPoolString GetStringRefni(const wchar_t* text, std::size_t n) noexcept;
+    static CPPoolString QueryStringRefi(const wchar_t* text) noexcept;
+    static CPPoolString QueryStringRefni(const wchar_t* text, std::size_t n) noexcept;
+
+    /// The same for UTF-8.
+    static CPPoolString GetStringRef(const unsigned char* text) noexcept;
+    static CPPoolString GetStringRefn(const unsigned char* text, std::size_t n) noexcept;
+    static CPPoolString QueryStringRef(const unsigned char* text) noexcept;
+    static CPPoolString QueryStringRefn(const unsigned char* text, std::size_t n) noexcept;
+    static CPPoolString GetStringRefi(const unsigned char* text) noexcept;
+    static CPPoolString GetStringRefni(const unsigned char* text, std::size_t n) noexcept;
+    static CPPoolString QueryStringRefi(const unsigned char* text) noexcept;
+    static CPPoolString QueryStringRefni(const unsigned char* text, std::size_t n) noexcept;
+
+    /// UTF-16, as wide text.
+    static CPPoolString GetStringRefn(const unsigned short* text, std::size_t n) noexcept;
+
+    /// Interns what the submitter writes. A text shorter than announced is cut to size; one that starts with 0 is the empty
+    /// string. No announced units raise an assertion and give the null string.
+    static CPPoolString GetStringRef(IStringSubmitter* submitter) noexcept;
+
+    /// Sweeps the pool for at most @p budget milliseconds, going on where the last sweep ended: an entry found unreferenced
+    /// loses its UTF-8 form, and goes when the next sweep finds it so again. Looking a text up does not prolong its life.
+    /// @return true when a whole round finished in time. False, and nothing is done, unless the calling thread has normal
+    ///         priority.
+    static bool Collect(ulong32 budget) noexcept;
+    /// Recomputes the keys of all entries; false at the first damaged one, and an assertion.
+    static bool Verify() noexcept;
+    /// Bytes of all entries, their block headers not counted.
+    static unsigned long long GetSize() noexcept;
+    /// The number of entries.
+    static unsigned long long GetNItems() noexcept;
+};
+
+/// Immutable text: a handle of a pool entry, one pointer, never null. The null string is a static entry without text, the
+/// empty string another one with the text ""; the two are different.
+/// Copying costs one atomic increment; comparison by entry costs nothing.
+/// Threads: as for every handle; the UTF-8 form is made safely by whoever asks first.
+class TAVO_API CPPoolString : private Buffers::CPObjectMemory {
+public:
+    static const CPPoolString ptrue;  ///< "true"
+    static const CPPoolString pfalse; ///< "false"
+    static const CPPoolString pempty; ///< ""
+
+    /// Identifies vectors and arrays of pooled strings by their element type.
+    static std::size_t GetTypeID() noexcept;
+
+    /// The null string.
+    CPPoolString() noexcept : CPObjectMemory(NullBlock()) {}
+    CPPoolString(std::nullptr_t) noexcept : CPPoolString() {}
+    CPPoolString(const CPPoolString& other) noexcept = default;
+    /// @p other is the null string afterwards.
+    CPPoolString(CPPoolString&& other) noexcept : CPObjectMemory(std::exchange(other.m_pMH, NullBlock())) {}
+    CPPoolString& operator=(const CPPoolString& other) noexcept = default;
+    CPPoolString& operator=(CPPoolString&& other) noexcept {
+        if (this != &other) TransferFrom(other);
+        return *this;
+    }
+    ~CPPoolString() = default;
+
+    /// Interned wide text.
+    CPPoolString(const wchar_t* text) noexcept;
+    /// Interned UTF-8.
+    CPPoolString(const unsigned char* text) noexcept;
+    /// Interned text of the ANSI code page.
+    CPPoolString(const char* text) noexcept;
+    /// The decimal text of the number's low 32 bits, signed as its type is: 4294967297ULL gives "1".
+    template <class Number, std::enable_if_t<std::is_integral<Number>::value && !std::is_same<Number, bool>::value &&
+                                                 !std::is_same<Number, wchar_t>::value,
+                                             int> = 0>
+    CPPoolString(Number number) noexcept
+        : CPPoolString(static_cast<std::uint32_t>(number), std::is_signed<Number>::value) {}
+    /// ptrue or pfalse; only for bool itself, so that no pointer becomes "true".
+    template <class Bool, std::enable_if_t<std::is_same<Bool, bool>::value, bool> = true>
+    CPPoolString(Bool value) noexcept : CPPoolString(value ? ptrue : pfalse) {}
+
+    /// The text, never null; that of the null string is empty. It may hold more units than len() says, by one for each
+    /// pair: size a copy by the terminator.
+    operator const wchar_t*() const noexcept { return Entry().text; }
+    /// The text in UTF-8, made on first use and kept with the entry while anyone holds it. Empty where UTF-8 has no form
+    /// for the text (by this library's rules two pairs already) or memory is out.
+    operator const unsigned char*() const noexcept;
+    /// Units, a pair counting 1.
+    std::size_t len() const noexcept { return Entry().length; }
+    /// Bytes of the UTF-8 form.
+    std::size_t UTF8Size() const noexcept { return Entry().utf8Size; }
+    /// CRC-64 of the text, and of the text in lower case; 0 for the null and the empty string.
+    unsigned long long sHash() const noexcept { return Entry().hash; }
+    unsigned long long sHashi() const noexcept { return Entry().hashi; }
+
+    /// Whether this is not the null string; the empty string is true.
+    operator bool() const noexcept { return !isnull(); }
+    bool isnull() const noexcept;
+    bool isempty() const noexcept;
+    /// Neither null nor empty.
+    bool isdef() const noexcept { return Entry().length != 0; }
+
+    /// Becomes the null string.
+    void free() noexcept;
+    /// Takes over @p other, which becomes the null string, without counting.
+    void TransferFrom(CPPoolString& other) noexcept;
+    /// Checks the entry against its text; false and an assertion when it is damaged.
+    bool Verify() const noexcept;
+    /// The text with its trailing decimal number raised by one, its width kept ("clip009" gives "clip010"); without such a
+    /// number 1 is appended. The null string stays null.
+    CPPoolString inc() const noexcept;
+
+    /// Same entry: for strings interned alike the same as equal texts.
+    bool operator==(const CPPoolString& other) const noexcept { return m_pMH == other.m_pMH; }
+    bool operator!=(const CPPoolString& other) const noexcept { return !(*this == other); }
+    /// Equal texts, by cmp.
+    bool operator==(const wchar_t* other) const noexcept { return cmp(other) == 0; }
+    bool operator!=(const wchar_t* other) const noexcept { return cmp(other) != 0; }
+
+    // Comparisons: negative, 0 or positive. Raw texts are zero-terminated; a null one is the null string.
+
+    /// Order of the units. The null string comes before everything, also before the empty string.
+    int cmp(const CPPoolString& other) const noexcept;
+    int cmp(const wchar_t* other) const noexcept;
+    /// The same regardless of case; null and empty are equal here, and a null pointer comes AFTER every text.
+    int cmpi(const CPPoolString& other) const noexcept;
+    int cmpi(const wchar_t* other) const noexcept;
+    /// 0 when this text starts with the other; -1 when it is shorter.
+    int cmpp(const CPPoolString& other) const noexcept;
+    int cmpp(const wchar_t* other) const noexcept;
+    int cmppi(const CPPoolString& other) const noexcept;
+    int cmppi(const wchar_t* other) const noexcept;
+    /// 0 when this text ends with the other; -1 when it is shorter. Counted by len(): with pairs in the text it looks one
+    /// unit per pair too early.
+    int cmp_p(const CPPoolString& other) const noexcept;
+    int cmp_p(const wchar_t* other) const noexcept;
+    int cmp_pi(const CPPoolString& other) const noexcept;
+    int cmp_pi(const wchar_t* other) const noexcept;
+    /// Whether the other text occurs in this one, within len() units.
+    bool cnt(const CPPoolString& other) const noexcept;
+    bool cnt(const wchar_t* other) const noexcept;
+    bool cnti(const CPPoolString& other) const noexcept;
+    bool cnti(const wchar_t* other) const noexcept;
+    /// Order of the entries' addresses: total, and stable while both live.
+    int pcmp(const CPPoolString& other) const noexcept;
+    /// Whether the texts are equal regardless of case; decided by the hashes nearly always.
+    bool iequals(const CPPoolString& other) const noexcept;
+
+private:
+    friend class PoolAccess; // the library's own road to the entry's block
+
+    constexpr explicit CPPoolString(Buffers::tagCPOMEMHEADER* entry) noexcept : CPObjectMemory(entry) {}
+    CPPoolString(std::uint32_t number, bool isSigned) noexcept;
+
+    static Buffers::tagCPOMEMHEADER* NullBlock() noexcept;
+    const detail::tagPOOLENTRY& Entry() const noexcept { return *static_cast<const detail::tagPOOLENTRY*>(Payload()); }
+};
+static_assert(sizeof(CPPoolString) == sizeof(void*), "a pooled string is one pointer");
+
+} // namespace String
+
+namespace Buffers {
+extern template class TAVO_TEMPLATE_DECL CPObjectVector<String::CPPoolString>;
+} // namespace Buffers
+
+namespace String {
+
+/// Vector of pooled strings that can be kept sorted and free of duplicates, joined into one string and split from one.
+/// Copies share their elements until one of them changes.
+class TAVO_API CPPoolStringArray {
+public:
+    /// An empty array. @p sorted makes it a sorted set without duplicates, for good.
+    explicit CPPoolStringArray(bool sorted) noexcept : m_sorted(sorted) {}
+    CPPoolStringArray(const CPPoolStringArray& other) noexcept = default;
+    CPPoolStringArray& operator=(const CPPoolStringArray& other) noexcept = default;
+    /// Shares the block if it holds pooled strings, else becomes empty; then sorts a sorted array (duplicates stay).
+    CPPoolStringArray& operator=(const Buffers::CPObjectMemory& block) noexcept;
+
+    /// Sorts the elements by cmp.
+    void Sort() noexcept;
+    /// Sorted: inserts at its place unless it is there. Unsorted: appends. False only without memory.
+    bool Add(const CPPoolString& text) noexcept;
+    /// Unsorted arrays only: inserts before @p index; false beyond the end.
+    bool Insert(const CPPoolString& text, std::size_t index) noexcept;
+    /// Sorted arrays only: removes the string; true also when it is not there.
+    bool Delete(const CPPoolString& text) noexcept;
+    /// Sorted: where the string stands or would stand. All-ones for an unsorted array, or one that never held an element.
+    std::size_t LocateEntry(const CPPoolString& text) const noexcept;
+
+    /// All elements joined by the separator as one pooled string; the null string for an empty array, the empty string
+    /// when there is nothing to join but one null or empty element.
+    CPPoolString Flatten(wchar_t separator) const noexcept;
+    /// Replaces the elements by the pieces of @p text between separators. Empty pieces become null strings, but for a
+    /// trailing one, which is left out. With separator 0 the text is one piece. False when memory is out.
+    bool Inflate(const CPPoolString& text, wchar_t separator) noexcept;
+
+    std::size_t GetNItems() const noexcept { return m_elements.GetNItems(); }
+    bool isEmpty() const noexcept { return m_elements.isEmpty(); }
+    bool IsSorted() const noexcept { return m_sorted; }
+    /// No bounds check.
+    const CPPoolString& operator[](std::size_t index) const noexcept { return m_elements[index]; }
+
+private:
+    Buffers::CPObjectVector<CPPoolString> m_elements;
+    bool m_sorted;
+};
+
+/// Joins strings with a separator.
+class TAVO_API CStringArraySubmitter : public IStringSubmitter {
+public:
+    CStringArraySubmitter(const CPPoolString* first, std::size_t count, wchar_t separator) noexcept
+        : m_first(first), m_count(count), m_separator(separator) {}
+    std::size_t GetStringLen() override;
+    bool GetString(wchar_t* out) override;
+
+private:
+    const CPPoolString* m_first;
+    std::size_t m_count;
+    wchar_t m_separator;
+};
+
+/// A piece of a text: @p count units from @p start, which must stay until the call that takes the submitter returns.
+class TAVO_API CSubStringSubmitter : public IStringSubmitter {
+public:
+    CSubStringSubmitter(const wchar_t* start, std::size_t count) noexcept : m_start(start), m_count(count) {}
+    std::size_t GetStringLen() override { return m_count; }
+    bool GetString(wchar_t* out) override;
+
+private:
+    const wchar_t* m_start;
+    std::size_t m_count;
+};
 
 } // namespace String
 } // namespace TAVO

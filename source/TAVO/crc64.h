@@ -39,25 +39,25 @@ constexpr std::uint64_t SwapBytes(std::uint64_t v) {
     return v << 32 | v >> 32;
 }
 
-inline std::uint64_t Add4(std::uint64_t crc, std::uint64_t units) {
+constexpr std::uint64_t Add4(std::uint64_t crc, std::uint64_t units) {
     const std::uint64_t x = crc ^ SwapBytes(units);
     return kSlices[7][x >> 56] ^ kSlices[6][(x >> 48) & 255] ^ kSlices[5][(x >> 40) & 255] ^
            kSlices[4][(x >> 32) & 255] ^ kSlices[3][(x >> 24) & 255] ^ kSlices[2][(x >> 16) & 255] ^
            kSlices[1][(x >> 8) & 255] ^ kSlices[0][x & 255];
 }
 
-inline std::uint64_t Add2(std::uint64_t crc, std::uint32_t units) {
+constexpr std::uint64_t Add2(std::uint64_t crc, std::uint32_t units) {
     const std::uint64_t x = (crc >> 32) ^ (SwapBytes(units) >> 32);
     return kSlices[3][x >> 24] ^ kSlices[2][(x >> 16) & 255] ^ kSlices[1][(x >> 8) & 255] ^ kSlices[0][x & 255] ^
            (crc << 32);
 }
 
-inline std::uint64_t Add1(std::uint64_t crc, std::uint16_t unit) {
+constexpr std::uint64_t Add1(std::uint64_t crc, std::uint16_t unit) {
     const std::uint64_t x = (crc >> 48) ^ static_cast<std::uint16_t>(unit << 8 | unit >> 8);
     return kSlices[1][x >> 8] ^ kSlices[0][x & 255] ^ (crc << 16);
 }
 
-inline std::uint64_t AddByte(std::uint64_t crc, unsigned char byte) {
+constexpr std::uint64_t AddByte(std::uint64_t crc, unsigned char byte) {
     return kSlices[0][(crc >> 56) ^ byte] ^ (crc << 8);
 }
 

@@ -2,6 +2,8 @@
 
 #include "lifecycle.h"
 
+#include "poolentry.h"
+
 #include <atomic>
 #include <mutex>
 #include <TAVO/core.h>
@@ -45,6 +47,14 @@ void ReadConfiguration() {
     g_switches.logFailedHResult = Platform::ReadConfigurationInteger(path, kSection, L"LogFailedHRESULT") != 0;
     g_switches.breakOnHResult = Platform::ReadConfigurationInteger(path, kSection, L"BreakOnHRESULT") != 0;
 }
+
+// Takes the library's process-wide objects down, in this one place and order. While the process ends on a system that
+// has killed its other threads by then, nothing is touched.
+struct Unloader {
+    ~Unloader() {
+        if (!IsProcessEnding()) String::pool::Unload();
+    }
+} g_unloader;
 
 } // namespace
 

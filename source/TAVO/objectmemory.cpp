@@ -34,17 +34,22 @@ struct ReleaseScope {
     tagCPOMEMHEADER* queue = nullptr;
 };
 
-tagCPOMEMHEADER*& NextInQueue(tagCPOMEMHEADER* dead) {
-    static_assert(sizeof(dead->sAllocated) == sizeof(void*));
-    return *reinterpret_cast<tagCPOMEMHEADER**>(&dead->sAllocated);
+void Enqueue(ReleaseScope& scope, tagCPOMEMHEADER* dead) {
+    dead->sAllocated = reinterpret_cast<std::size_t>(scope.queue);
+    scope.queue = dead;
+}
+
+tagCPOMEMHEADER* Dequeue(ReleaseScope& scope) {
+    tagCPOMEMHEADER* dead = scope.queue;
+    if (dead) scope.queue = reinterpret_cast<tagCPOMEMHEADER*>(dead->sAllocated);
+    return dead;
 }
 
 TAVO_NOINLINE void Destroy(tagCPOMEMHEADER* header) noexcept {
     auto* scope = static_cast<ReleaseScope*>(Platform::GetReleaseScope());
     if (scope) {
         if (scope->depth >= kDeepestRelease) {
-            NextInQueue(header) = scope->queue;
-            scope->queue = header;
+            Enqueue(*scope, header);
             return;
         }
         ++scope->depth;
@@ -55,10 +60,7 @@ TAVO_NOINLINE void Destroy(tagCPOMEMHEADER* header) noexcept {
     ReleaseScope outermost;
     Platform::SetReleaseScope(&outermost);
     Finalize(header);
-    while (tagCPOMEMHEADER* next = outermost.queue) {
-        outermost.queue = NextInQueue(next);
-        Finalize(next);
-    }
+    while (tagCPOMEMHEADER* next = Dequeue(outermost)) Finalize(next);
     Platform::SetReleaseScope(nullptr);
 }
 

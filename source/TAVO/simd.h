@@ -177,4 +177,11 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
 }
 #endif
 
+// Tells the processor that this thread spins.
+inline void Pause() {
+#if defined(TAVO_SSE2)
+    _mm_pause();
+#endif
+}
+
 } // namespace TAVO::Simd

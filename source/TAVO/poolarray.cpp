@@ -1,0 +1,130 @@
+// Arrays of pooled strings, and the submitters that join and cut them.
+
+#include "blocks.h"
+#include "diagnostics.h"
+#include "poolentry.h"
+#include "wide.h"
+
+namespace TAVO::String {
+
+namespace {
+
+int CompareTexts(const void* first, const void* second) {
+    return static_cast<const CPPoolString*>(first)->cmp(*static_cast<const CPPoolString*>(second));
+}
+
+} // namespace
+
+// --- submitters ------------------------------------------------------------------------------------------------------
+
+std::size_t CStringArraySubmitter::GetStringLen() {
+    if (m_count == 0) return 0;
+    // True units, not len(): texts with pairs hold more than their length says.
+    std::size_t units = m_count - 1;
+    for (std::size_t i = 0; i < m_count; ++i) {
+        const std::size_t more = UnitsOf(m_first[i]);
+        if (more > SIZE_MAX - units) return SIZE_MAX; // more than any heap has: refused there
+        units += more;
+    }
+    return units;
+}
+
+bool CStringArraySubmitter::GetString(wchar_t* out) {
+    for (std::size_t i = 0; i < m_count; ++i) {
+        if (i) *out++ = m_separator;
+        const std::size_t units = UnitsOf(m_first[i]);
+        detail::WideCopy(out, static_cast<const wchar_t*>(m_first[i]), units);
+        out += units;
+    }
+    *out = 0;
+    return true;
+}
+
+bool CSubStringSubmitter::GetString(wchar_t* out) {
+    if (m_count == 0) {
+        diagnostics::RuntimeAssumptionFailed("sccLen > 0");
+        return false;
+    }
+    detail::WideCopy(out, m_start, m_count);
+    return true;
+}
+
+// --- the array -------------------------------------------------------------------------------------------------------
+
+CPPoolStringArray& CPPoolStringArray::operator=(const Buffers::CPObjectMemory& block) noexcept {
+    using Elements = Buffers::CPObjectVector<CPPoolString>;
+    static_assert(sizeof(Elements) == sizeof(Buffers::CPObjectMemory));
+    if (block.IsNAssignable(sizeof(CPPoolString), &Elements::_vtbl))
+        m_elements = static_cast<const Elements&>(block);
+    else
+        m_elements.free();
+    if (m_sorted) Sort();
+    return *this;
+}
+
+void CPPoolStringArray::Sort() noexcept {
+    // Copies of the array share the block: they must not see it change.
+    if (m_elements.clone()) m_elements.Sort(CompareTexts);
+}
+
+std::size_t CPPoolStringArray::LocateEntry(const CPPoolString& text) const noexcept {
+    if (!m_sorted || !m_elements.key()) return Buffers::NotFound;
+    std::size_t count;
+    const CPPoolString* elements = m_elements.GetArray(count);
+    return Buffers::Sort::vfqfind(&text, elements, count, sizeof(CPPoolString), CompareTexts);
+}
+
+bool CPPoolStringArray::Add(const CPPoolString& text) noexcept {
+    std::size_t position = GetNItems();
+    if (m_sorted && m_elements.key()) {
+        position = LocateEntry(text);
+        if (position < GetNItems() && m_elements[position] == text) return true;
+    }
+    const CPPoolString added(text); // the argument may live in the block that is about to be left
+    return m_elements.clone() && m_elements.Insert(added, position);
+}
+
+bool CPPoolStringArray::Insert(const CPPoolString& text, std::size_t index) noexcept {
+    if (m_sorted || index > GetNItems()) return false;
+    const CPPoolString added(text);
+    return m_elements.clone() && m_elements.Insert(added, index);
+}
+
+bool CPPoolStringArray::Delete(const CPPoolString& text) noexcept {
+    if (!m_sorted) return false;
+    const std::size_t position = LocateEntry(text);
+    if (position >= GetNItems() || m_elements[position] != text) return true;
+    return m_elements.clone() && m_elements.Delete(position, false);
+}
+
+CPPoolString CPPoolStringArray::Flatten(wchar_t separator) const noexcept {
+    std::size_t count;
+    const CPPoolString* elements = m_elements.GetArray(count);
+    if (count == 0) return {};
+    CStringArraySubmitter joined(elements, count, separator);
+    if (joined.GetStringLen() == 0) return CPPoolString::pempty; // one element, null or empty
+    return CStringPool::GetStringRef(&joined);
+}
+
+bool CPPoolStringArray::Inflate(const CPPoolString& text, wchar_t separator) noexcept {
+    const CPPoolString source(text); // may live in the elements that go now
+    m_elements.free();
+    if (source.isnull()) return true;
+    const wchar_t* piece = source;
+    const wchar_t* const end = piece + UnitsOf(source);
+    std::size_t pieces = 1;
+    if (separator)
+        for (const wchar_t* unit = piece; unit < end; ++unit) pieces += *unit == separator;
+    if (!m_elements.Reserve(pieces)) return false;
+    for (const wchar_t* unit = piece; separator && unit < end; ++unit) {
+        if (*unit != separator) continue;
+        CSubStringSubmitter cut(piece, static_cast<std::size_t>(unit - piece));
+        if (!Add(unit == piece ? CPPoolString() : CStringPool::GetStringRef(&cut))) return false;
+        piece = unit + 1;
+    }
+    if (piece == end) return true; // Intended: a trailing empty piece adds nothing, others add the null string
+    CSubStringSubmitter last(piece, static_cast<std::size_t>(end - piece));
+    return Add(CStringPool::GetStringRef(&last));
+}
+
+} // namespace TAVO::String
