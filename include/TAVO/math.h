@@ -9,12 +9,13 @@ namespace Math {
 
 /// A fraction of two signed 32-bit integers, in lowest terms.
 ///
-/// A value is defined while the magnitude of its numerator and its denominator are at most 1073741823 (2^30 - 1). A result
-/// beyond that is written to the log ("... exceed definition space") and replaced by the undefined value 1/0; dividing by
-/// zero gives the undefined value without a log line. The undefined value spreads through all arithmetic.
+/// A value is defined while the magnitude of its numerator and its denominator are at most 1073741823 (2^30 - 1). A
+/// result beyond that is written to the log ("... exceed definition space") and replaced by the undefined value 1/0;
+/// dividing by zero gives the undefined value without a log line. The undefined value spreads through all arithmetic.
 ///
 /// The sign stays in the numerator, with one exception: a product of operands with a negative numerator may carry it in
-/// the denominator ((-2/3) * (3/4) is 1/-2). Equality compares the two stored integers, so such a product differs from -1/2.
+/// the denominator ((-2/3) * (3/4) is 1/-2). Equality compares the two stored integers, so such a product differs from
+/// -1/2.
 ///
 /// Nothing here allocates or throws, and only fract(), fassign() and the comparisons with a double use floating point.
 class TAVO_API CRational {
@@ -69,16 +70,14 @@ public:
     // Intended: a textbook's unary plus gives the value itself; hosts use this one as their absolute value.
     CRational operator+() const noexcept { return Raw(m_num < 0 ? Negated(m_num) : m_num, m_den); }
     /// The reciprocal; 1/0 for zero, 0/1 for the undefined value.
-    CRational operator~() const noexcept {
-        return m_num < 0 ? Raw(Negated(m_den), Negated(m_num)) : Raw(m_den, m_num);
-    }
+    CRational operator~() const noexcept { return m_num < 0 ? Raw(Negated(m_den), Negated(m_num)) : Raw(m_den, m_num); }
 
     /// Whether both stored integers are equal.
     bool operator==(const CRational& b) const noexcept { return m_num == b.m_num && m_den == b.m_den; }
 
-    /// An order of its own: a negative value comes before one that is not. Two negative values are ordered by value, but of
-    /// two values that are not negative the larger one counts as less (3/4 < 1/2), and 0 < 1/2 is false. Do not sort by it.
-    /// May write the multiplication's message to the log.
+    /// An order of its own: a negative value comes before one that is not. Two negative values are ordered by value,
+    /// but of two values that are not negative the larger one counts as less (3/4 < 1/2), and 0 < 1/2 is false. Do not
+    /// sort by it. May write the multiplication's message to the log.
     bool operator<(const CRational& b) const noexcept;
     bool operator>(const CRational& b) const noexcept;
     /// operator< or operator>, or equality of the stored integers.

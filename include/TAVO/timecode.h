@@ -7,12 +7,12 @@
 //   system word  the low four bits are the system code (eSystem), 0x10000 marks an invalid and 0x20000 an unassigned
 //                value; a word below 16 is a defined one
 //
-// Nothing here throws. Failures are flags in the system word; a constructor or function that takes a system word replaces a
-// code above 13 by 0 with the unassigned flag.
-// Threads: plain values without shared state; one object is for one thread at a time.
+// Nothing here throws. Failures are flags in the system word; a constructor or function that takes a system word
+// replaces a code above 13 by 0 with the unassigned flag. Threads: plain values without shared state; one object is for
+// one thread at a time.
 //
-// A number in an expression means what its type says: a 64-bit integer base units, a 32-bit or shorter integer fields, a
-// floating-point number seconds.
+// A number in an expression means what its type says: a 64-bit integer base units, a 32-bit or shorter integer fields,
+// a floating-point number seconds.
 
 #include <TAVO/config.h>
 #include <TAVO/string.h>
@@ -48,9 +48,10 @@ namespace detail {
 
 // The contract's three kinds of numbers, by the width of what is passed. Unsigned numbers have no kind: cast them.
 template <class N>
-using NumberKind = std::enable_if_t<
-    std::is_floating_point<N>::value || (std::is_integral<N>::value && std::is_signed<N>::value),
-    std::conditional_t<std::is_floating_point<N>::value, double, std::conditional_t<sizeof(N) == 8, long long, long32>>>;
+using NumberKind =
+    std::enable_if_t<std::is_floating_point<N>::value || (std::is_integral<N>::value && std::is_signed<N>::value),
+                     std::conditional_t<std::is_floating_point<N>::value, double,
+                                        std::conditional_t<sizeof(N) == 8, long long, long32>>>;
 
 } // namespace detail
 
@@ -75,12 +76,13 @@ public:
     /// The position of @p seconds of real time.
     TCINFO(double seconds, ulong32 sys) noexcept;
     template <class N, class K = detail::NumberKind<N>>
-    TCINFO(N number, ulong32 sys) noexcept : TCINFO(static_cast<K>(number), sys) {}
+    TCINFO(N number, ulong32 sys)
+    noexcept : TCINFO(static_cast<K>(number), sys) {}
 
     TCINFO(const timecode& value) noexcept;
 
-    /// From fields. Invalid when a field is out of range (hours may reach +-743; a negative one makes the whole position
-    /// negative) or the label is one that the drop-frame system skips.
+    /// From fields. Invalid when a field is out of range (hours may reach +-743; a negative one makes the whole
+    /// position negative) or the label is one that the drop-frame system skips.
     TCINFO(long32 hh, ulong32 mm, ulong32 ss, ulong32 ff, ulong32 sys) noexcept;
 
     /// Reads the fixed text form; the separators tell the system. The numbers are not tested against their ranges.
@@ -104,12 +106,12 @@ public:
     /// @return false for a flagged record, with only @p sys written
     bool GetInfo(ulong32* hh, ulong32* mm, ulong32* ss, ulong32* ff, int* sign, ulong32* sys) const noexcept;
 
-    ulong32 ff() const noexcept { return m_ff; }    ///< frame within the second
-    ulong32 ss() const noexcept { return m_ss; }    ///< seconds
-    ulong32 mm() const noexcept { return m_mm; }    ///< minutes
-    ulong32 hh() const noexcept { return m_hh; }    ///< hours within the day
-    long long dd() const noexcept { return m_dd; }  ///< whole days; -1 - days for a negative position
-    ulong32 sys() const noexcept { return m_sys; }  ///< system word
+    ulong32 ff() const noexcept { return m_ff; }   ///< frame within the second
+    ulong32 ss() const noexcept { return m_ss; }   ///< seconds
+    ulong32 mm() const noexcept { return m_mm; }   ///< minutes
+    ulong32 hh() const noexcept { return m_hh; }   ///< hours within the day
+    long long dd() const noexcept { return m_dd; } ///< whole days; -1 - days for a negative position
+    ulong32 sys() const noexcept { return m_sys; } ///< system word
 
 private:
     ulong32 m_ff, m_ss, m_mm, m_hh; // magnitudes
@@ -130,14 +132,15 @@ struct TAVO_API SZTC {
     SZTC(long32 fields, ulong32 sys) noexcept : SZTC(TCINFO(fields, sys)) {}
     SZTC(double seconds, ulong32 sys) noexcept : SZTC(TCINFO(seconds, sys)) {}
     template <class N, class K = detail::NumberKind<N>>
-    SZTC(N number, ulong32 sys) noexcept : SZTC(static_cast<K>(number), sys) {}
+    SZTC(N number, ulong32 sys)
+    noexcept : SZTC(static_cast<K>(number), sys) {}
     SZTC(const TCINFO& record) noexcept;
     SZTC(const timecode& value) noexcept : SZTC(TCINFO(value)) {}
     SZTC(long32 hh, ulong32 mm, ulong32 ss, ulong32 ff, ulong32 sys) noexcept : SZTC(TCINFO(hh, mm, ss, ff, sys)) {}
 
-    /// Reads free text: two digits per field, not tested against their ranges, between separators that a system has, with
-    /// or without a mark ' ', '-' or '+' in front (a missing mark and '+' become ' '). The overflow and error displays are
-    /// kept. Everything else, null included, gives the unassigned form.
+    /// Reads free text: two digits per field, not tested against their ranges, between separators that a system has,
+    /// with or without a mark ' ', '-' or '+' in front (a missing mark and '+' become ' '). The overflow and error
+    /// displays are kept. Everything else, null included, gives the unassigned form.
     SZTC(const wchar_t* freeText) noexcept;
 
     /// The position in base units; 0 when flagged.
@@ -188,7 +191,8 @@ public:
 
     /// @p count base units; 0 when @p sys is unassigned.
     timecode(long long count, ulong32 sys) noexcept;
-    /// @p fields fields; invalid, without a code, when their base units exceed 2147483647. Count 0 when @p sys is flagged.
+    /// @p fields fields; invalid, without a code, when their base units exceed 2147483647. Count 0 when @p sys is
+    /// flagged.
     timecode(long32 fields, ulong32 sys) noexcept;
     /// @p seconds of real time, rounded half away from zero to base units; the end of the range when out of it. Invalid
     /// without a code when not a number. Count 0 when @p sys is flagged.
@@ -225,8 +229,8 @@ public:
     /// True for count 0 and for unassigned values.
     bool operator!() const noexcept { return m_count == 0 || !IsAssigned(); }
 
-    /// Adds counts and keeps the left system. An unassigned left operand becomes the right one; an invalid right one only
-    /// adds its flag. A number is first converted under the left operand's system word.
+    /// Adds counts and keeps the left system. An unassigned left operand becomes the right one; an invalid right one
+    /// only adds its flag. A number is first converted under the left operand's system word.
     timecode& operator+=(const timecode& right) noexcept;
     /// Subtracts counts and keeps the left system. A flagged left operand stays as it is.
     timecode& operator-=(const timecode& right) noexcept;
@@ -254,16 +258,16 @@ public:
     /// The negated count; a flagged value stays.
     timecode operator-() const noexcept;
 
-    /// Scales the count by an integer, exactly, or by a floating-point number, adding 0.5 and truncating toward zero (so
-    /// -48 times 1.0 is -47). Flags stay.
+    /// Scales the count by an integer, exactly, or by a floating-point number, adding 0.5 and truncating toward zero
+    /// (so -48 times 1.0 is -47). Flags stay.
     template <class N, class K = detail::NumberKind<N>> timecode& operator*=(N factor) noexcept {
         return Multiply(static_cast<Factor<K>>(factor));
     }
     template <class N, class K = detail::NumberKind<N>> timecode operator*(N factor) const noexcept {
         return timecode(*this) *= factor;
     }
-    /// Divides the count by an integer, truncating, or by a floating-point number, adding 0.5 and truncating. Count 0 and
-    /// the invalid flag alone for a divisor of 0, and for a floating-point one below 0.000001.
+    /// Divides the count by an integer, truncating, or by a floating-point number, adding 0.5 and truncating. Count 0
+    /// and the invalid flag alone for a divisor of 0, and for a floating-point one below 0.000001.
     template <class N, class K = detail::NumberKind<N>> timecode& operator/=(N divisor) noexcept {
         return Divide(static_cast<Factor<K>>(divisor));
     }
@@ -276,8 +280,8 @@ public:
     /// Equal counts and equal system words; two invalid values are equal whatever they hold.
     bool operator==(const timecode& right) const noexcept;
     bool operator!=(const timecode& right) const noexcept { return !(*this == right); }
-    /// The order of the counts, whatever their systems, with invalid values after all others. Of two invalid values each
-    /// is less than the other, and neither is greater.
+    /// The order of the counts, whatever their systems, with invalid values after all others. Of two invalid values
+    /// each is less than the other, and neither is greater.
     bool operator<(const timecode& right) const noexcept;
     bool operator<=(const timecode& right) const noexcept;
     bool operator>(const timecode& right) const noexcept;
@@ -291,14 +295,46 @@ public:
     template <class N, class K = detail::NumberKind<N>> bool operator>(N n) const noexcept { return As<K>() > K(n); }
     template <class N, class K = detail::NumberKind<N>> bool operator>=(N n) const noexcept { return As<K>() >= K(n); }
 
-    /// Change to system @p sys and round to its nearest frame, halves away from zero. The value keeps its flags and gets
-    /// those of @p sys; unassigned results have count 0, flagged ones are not rounded. At the ends of the 64-bit range the
-    /// boundary toward zero is taken.
+    /// The forms with the number on the left; it is first converted under the value's system word.
+    template <class N, class K = detail::NumberKind<N>>
+    friend timecode operator+(N number, const timecode& value) noexcept {
+        return timecode(static_cast<K>(number), value.sys()) + value;
+    }
+    template <class N, class K = detail::NumberKind<N>>
+    friend timecode operator-(N number, const timecode& value) noexcept {
+        return timecode(static_cast<K>(number), value.sys()) - value;
+    }
+    template <class N, class K = detail::NumberKind<N>>
+    friend timecode operator*(N factor, const timecode& value) noexcept {
+        return value * factor;
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator==(N n, const timecode& t) noexcept {
+        return K(n) == t.As<K>();
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator!=(N n, const timecode& t) noexcept {
+        return K(n) != t.As<K>();
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator<(N n, const timecode& t) noexcept {
+        return K(n) < t.As<K>();
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator<=(N n, const timecode& t) noexcept {
+        return K(n) <= t.As<K>();
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator>(N n, const timecode& t) noexcept {
+        return K(n) > t.As<K>();
+    }
+    template <class N, class K = detail::NumberKind<N>> friend bool operator>=(N n, const timecode& t) noexcept {
+        return K(n) >= t.As<K>();
+    }
+
+    /// Change to system @p sys and round to its nearest frame, halves away from zero. The value keeps its flags and
+    /// gets those of @p sys; unassigned results have count 0, flagged ones are not rounded. At the ends of the 64-bit
+    /// range the boundary toward zero is taken.
     timecode& AlignToSystem(ulong32 sys) noexcept;
     timecode& SetSystemAligned(ulong32 sys) noexcept { return AlignToSystem(sys); }
     timecode& Align() noexcept { return AlignToSystem(m_sys); }
-    /// The same, down to a frame. A negative count between two frames goes to the boundary below the one that a textbook
-    /// would take, except above minus one frame, where it becomes 0.
+    /// The same, down to a frame. A negative count between two frames goes to the boundary below the one that a
+    /// textbook would take, except above minus one frame, where it becomes 0.
     timecode& TruncToSystem(ulong32 sys) noexcept;
     timecode& Trunc() noexcept { return TruncToSystem(m_sys); }
     /// The same, up to a frame. A negative count between two frames goes one frame above the boundary that a textbook
@@ -315,7 +351,8 @@ public:
     /// Values of other systems stay; a flagged value only changes its code.
     timecode& Upconvert(int direction) noexcept;
     timecode& Downconvert(int direction) noexcept;
-    /// Changes to system @p sys and keeps the real time, to the nearest base unit. A flagged value only changes its word.
+    /// Changes to system @p sys and keeps the real time, to the nearest base unit. A flagged value only changes its
+    /// word.
     timecode& XlateToSystem(ulong32 sys) noexcept;
 
     /// Drops whole days and keeps the sign; an unassigned value gets count 0, an invalid one stays.
@@ -328,11 +365,11 @@ public:
     /// Multiplies the count by @p num / @p den, with @p rounding half away from zero. Count 0 and the invalid flag when
     /// @p den is 0; a result above 2147483647 keeps its value and gets the invalid flag.
     timecode& Scale(long32 num, long32 den, bool rounding) noexcept;
-    /// Folds a value outside [lo, hi] back by whole days from the lower bound, else takes the nearer bound with its system
-    /// word. The bounds may come in either order. Any unassigned operand leaves the value as it is.
+    /// Folds a value outside [lo, hi] back by whole days from the lower bound, else takes the nearer bound with its
+    /// system word. The bounds may come in either order. Any unassigned operand leaves the value as it is.
     timecode& Bias(const timecode& lo, const timecode& hi) noexcept;
-    /// Becomes whichever of @p a and @p b is nearer, @p a when both are; an unassigned one of them yields to the other. An
-    /// unassigned value stays, and so does every value when both are unassigned.
+    /// Becomes whichever of @p a and @p b is nearer, @p a when both are; an unassigned one of them yields to the other.
+    /// An unassigned value stays, and so does every value when both are unassigned.
     timecode& RoundTo(const timecode& a, const timecode& b) noexcept;
     /// Unassigned with count 0, code 0.
     timecode& Unassign() noexcept { return Unassign(0); }
@@ -448,23 +485,6 @@ static_assert(sizeof(timecode) == 16, "exchanged between modules by value");
 
 /// The magnitude; an invalid value stays.
 TAVO_API timecode tcabs(const timecode& value) noexcept;
-
-// A number on the left is converted under the value's system word.
-template <class N, class K = detail::NumberKind<N>> timecode operator+(N number, const timecode& value) noexcept {
-    return timecode(static_cast<K>(number), value.sys()) + value;
-}
-template <class N, class K = detail::NumberKind<N>> timecode operator-(N number, const timecode& value) noexcept {
-    return timecode(static_cast<K>(number), value.sys()) - value;
-}
-template <class N, class K = detail::NumberKind<N>> timecode operator*(N factor, const timecode& value) noexcept {
-    return value * factor;
-}
-template <class N, class K = detail::NumberKind<N>> bool operator==(N n, const timecode& t) noexcept { return t == n; }
-template <class N, class K = detail::NumberKind<N>> bool operator!=(N n, const timecode& t) noexcept { return t != n; }
-template <class N, class K = detail::NumberKind<N>> bool operator<(N n, const timecode& t) noexcept { return t > n; }
-template <class N, class K = detail::NumberKind<N>> bool operator<=(N n, const timecode& t) noexcept { return t >= n; }
-template <class N, class K = detail::NumberKind<N>> bool operator>(N n, const timecode& t) noexcept { return t < n; }
-template <class N, class K = detail::NumberKind<N>> bool operator>=(N n, const timecode& t) noexcept { return t <= n; }
 
 } // namespace TimeCode
 } // namespace TAVO

@@ -18,8 +18,8 @@ template <class Integer> constexpr auto Magnitude(Integer value) noexcept {
     return value < 0 ? static_cast<Unsigned>(0 - static_cast<Unsigned>(value)) : static_cast<Unsigned>(value);
 }
 
-// A remainder truncated toward zero has the sign of its dividend, so both operands keep theirs to the end: it is enough to
-// divide magnitudes and to give the one that remains its sign. No division can overflow that way.
+// A remainder truncated toward zero has the sign of its dividend, so both operands keep theirs to the end: it is enough
+// to divide magnitudes and to give the one that remains its sign. No division can overflow that way.
 template <class Integer> Integer Gcd(Integer x, Integer y) noexcept {
     auto u = Magnitude(x);
     auto v = Magnitude(y);
@@ -104,7 +104,8 @@ CRational& CRational::operator+=(const CRational& b) noexcept {
 }
 
 CRational& CRational::operator*=(const CRational& b) noexcept {
-    // Intended: the divisors keep the sign that the remainders leave, so the sign of a product may end in its denominator.
+    // Intended: the divisors keep the sign that the remainders leave, so the sign of a product may end in its
+    // denominator.
     const long long g1 = Gcd(m_num, b.m_den);
     const long long g2 = Gcd(b.m_num, m_den);
     if (g1 == 0 || g2 == 0) return *this = Raw(1, 0);

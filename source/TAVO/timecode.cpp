@@ -65,9 +65,7 @@ timecode::operator long32() const noexcept {
     return static_cast<long32>(RoundAway(static_cast<double>(m_count) / GetFieldBU()));
 }
 
-timecode::operator double() const noexcept {
-    return IsFlagged(m_sys) ? 0.0 : static_cast<double>(m_count) * BULen();
-}
+timecode::operator double() const noexcept { return IsFlagged(m_sys) ? 0.0 : static_cast<double>(m_count) * BULen(); }
 
 long32 timecode::Fields(ulong32 sys, int mode) const noexcept {
     if (IsFlagged(m_sys) || IsFlagged(Normalize(sys))) return 0;

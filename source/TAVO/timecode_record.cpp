@@ -59,7 +59,8 @@ struct Codec {
 };
 constexpr auto kCodecs = []<std::size_t... code>(std::index_sequence<code...>) {
     return std::array{Codec{Split<code>, Join<code>}...};
-}(std::make_index_sequence<kSystemCount>{});
+}
+(std::make_index_sequence<kSystemCount>{});
 
 // A label that a drop-frame system skips.
 constexpr bool IsSkipped(const System& s, ulong32 mm, ulong32 ss, ulong32 ff) noexcept {
@@ -73,7 +74,8 @@ constexpr long long SignedDays(unsigned long long days, bool negative) noexcept 
 
 } // namespace
 
-TCINFO::TCINFO(long long count, ulong32 sys) noexcept : m_ff(0), m_ss(0), m_mm(0), m_hh(0), m_dd(0), m_sys(Normalize(sys)) {
+TCINFO::TCINFO(long long count, ulong32 sys) noexcept
+    : m_ff(0), m_ss(0), m_mm(0), m_hh(0), m_dd(0), m_sys(Normalize(sys)) {
     if (m_sys & (kInvalid | kUnassigned)) return;
     const bool negative = count < 0;
     const auto bits = static_cast<unsigned long long>(count);
@@ -120,8 +122,8 @@ TCINFO::operator long long() const noexcept {
     return static_cast<long long>(negative ? 0 - magnitude : magnitude);
 }
 
-// Intended: the division is unsigned, so that a negative position gives the low half of a huge quotient where a textbook
-// would give the negative number of fields. Hosts that store it know it so.
+// Intended: the division is unsigned, so that a negative position gives the low half of a huge quotient where a
+// textbook would give the negative number of fields. Hosts that store it know it so.
 TCINFO::operator long32() const noexcept {
     const auto count = static_cast<unsigned long long>(static_cast<long long>(*this));
     return static_cast<long32>(count / RowOf(m_sys).Field());

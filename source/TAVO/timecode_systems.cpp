@@ -31,8 +31,8 @@ ulong32 timecode::GetDFSystem(ulong32 sys) noexcept {
 }
 
 ulong32 timecode::GetNDFSystem(ulong32 sys) noexcept {
-    const auto* row = std::find_if(std::begin(kSystems), std::end(kSystems),
-                                   [sys](const System& s) { return s.dropSibling == sys; });
+    const auto* row =
+        std::find_if(std::begin(kSystems), std::end(kSystems), [sys](const System& s) { return s.dropSibling == sys; });
     return IsFlagged(sys) || row == std::end(kSystems) ? kUnassigned : static_cast<ulong32>(row - kSystems);
 }
 
@@ -74,16 +74,15 @@ ulong32 timecode::GetTCSystemOf(ulong32 num, ulong32 den) noexcept {
     if (den == 0) return kUnassigned;
     // Intended: the last system is left to the search by rate, as it always was; the answer is the same.
     const auto* last = std::end(kSystems) - 1;
-    const auto* row = std::find_if(std::begin(kSystems), last, [=](const System& s) {
-        return s.numerator == num && s.denominator == den;
-    });
+    const auto* row = std::find_if(std::begin(kSystems), last,
+                                   [=](const System& s) { return s.numerator == num && s.denominator == den; });
     if (row != last) return static_cast<ulong32>(row - kSystems);
 
     const ulong32 sys = GetBestTCSystem(static_cast<double>(num) / den);
     if (IsFlagged(sys)) return kUnassigned;
     const System& s = kSystems[sys];
-    const bool isMultiple = num % s.numerator == 0 && den % s.denominator == 0 &&
-                            num / s.numerator == den / s.denominator;
+    const bool isMultiple =
+        num % s.numerator == 0 && den % s.denominator == 0 && num / s.numerator == den / s.denominator;
     return isMultiple ? sys : static_cast<ulong32>(kUnassigned);
 }
 

@@ -60,7 +60,8 @@ const wchar_t* EndOf(const wchar_t* text) {
 
 // --- separators ------------------------------------------------------------------------------------------------------
 
-constexpr wchar_t kSeparators[] = {L':', L'.', L',', L';'}; // ';' stands only before the frames, ',' not after the hours
+constexpr wchar_t kSeparators[] = {L':', L'.', L',',
+                                   L';'}; // ';' stands only before the frames, ',' not after the hours
 constexpr std::size_t kSeparatorCount = std::size(kSeparators);
 
 constexpr std::size_t ClassOf(wchar_t separator) {
@@ -122,7 +123,9 @@ constexpr wchar_t kUnassignedText[] = L" --:--:--:--";
 constexpr wchar_t kInvalidText[] = L"*##:##:##:##";
 static_assert(std::size(kUnassignedText) == kFixedLength + 1 && std::size(kInvalidText) == kFixedLength + 1);
 
-void SetText(SZTC& target, const wchar_t (&text)[kFixedLength + 1]) { std::copy_n(text, kFixedLength + 1, target.text); }
+void SetText(SZTC& target, const wchar_t (&text)[kFixedLength + 1]) {
+    std::copy_n(text, kFixedLength + 1, target.text);
+}
 
 void SetSeparators(wchar_t* text, const wchar_t* separators) {
     text[3] = separators[0];
