@@ -5,7 +5,8 @@
 // - the virtual table is the operations in the order written, base first; no virtual destructor, no overloads
 //   (some compilers reverse them), single inheritance between interfaces, no member data;
 // - operations take and return numbers and pointers only, and let no exception out;
-// - an out pointer is written on every path: null unless the result is acfOk. The caller owns one reference to what it gets.
+// - an out pointer is written on every path: null unless the result is acfOk. The caller owns one reference to what it
+// gets.
 #include <cstddef>
 #include <cstdint>
 
@@ -17,7 +18,12 @@
 
 // Levels of the log; the label printed for each is fixed.
 enum _acfDebugLevel : std::int32_t {
-    acfDebugFull = -1, acfDebugError = 1, acfDebugWarning = 2, acfDebugVerbose = 4, acfDebugTrace = 8, acfDebugInfo = 16
+    acfDebugFull = -1,
+    acfDebugError = 1,
+    acfDebugWarning = 2,
+    acfDebugVerbose = 4,
+    acfDebugTrace = 8,
+    acfDebugInfo = 16
 };
 
 // 16-byte identifier of an interface, class, category, vendor or module. All zero names nothing.
@@ -31,12 +37,12 @@ static_assert(sizeof(_acfUID) == 16 && alignof(_acfUID) == 4, "identifiers are e
 // Result code: negative is failure.
 using acfResult = std::int32_t;
 constexpr acfResult acfOk = 0;
-constexpr acfResult acfEnd = 1;                              // an enumeration has nothing more
-constexpr acfResult acfFail = -2147467259;                   // 0x80004005
-constexpr acfResult acfInvalidArgument = -2147483645;        // 0x80000003
-constexpr acfResult acfNoInterface = -2147483644;            // 0x80000004
-constexpr acfResult acfNoAggregation = -2147221232;          // 0x80040110
-constexpr acfResult acfClassNotAvailable = -2147221231;      // 0x80040111
+constexpr acfResult acfEnd = 1;                         // an enumeration has nothing more
+constexpr acfResult acfFail = -2147467259;              // 0x80004005
+constexpr acfResult acfInvalidArgument = -2147483645;   // 0x80000003
+constexpr acfResult acfNoInterface = -2147483644;       // 0x80000004
+constexpr acfResult acfNoAggregation = -2147221232;     // 0x80040110
+constexpr acfResult acfClassNotAvailable = -2147221231; // 0x80040111
 
 // acfTypeOf<I>::uid is the identifier of interface I.
 template <class I> struct acfTypeOf;
@@ -57,14 +63,17 @@ struct IACFComponent : IACFUnknown {};
 // The host's way to create components. outer is reserved for aggregation and must be null.
 struct IACFComponentFactory : IACFUnknown {
     // The one shared object of the class, kept by the factory until it is trimmed.
-    virtual acfResult ACF_CALL CreateComponent(_acfUID const& cls, IACFUnknown* outer, _acfUID const& type, IACFUnknown** out) = 0;
+    virtual acfResult ACF_CALL CreateComponent(_acfUID const& cls, IACFUnknown* outer, _acfUID const& type,
+                                               IACFUnknown** out) = 0;
     // A new object of the class.
-    virtual acfResult ACF_CALL CreateInstance(_acfUID const& cls, IACFUnknown* outer, _acfUID const& type, IACFUnknown** out) = 0;
+    virtual acfResult ACF_CALL CreateInstance(_acfUID const& cls, IACFUnknown* outer, _acfUID const& type,
+                                              IACFUnknown** out) = 0;
 };
 
 // Creates objects of one class.
 struct IACFClassFactory : IACFUnknown {
-    virtual acfResult ACF_CALL CreateInstance(IACFUnknown* framework, IACFUnknown* outer, _acfUID const& type, IACFUnknown** out) = 0;
+    virtual acfResult ACF_CALL CreateInstance(IACFUnknown* framework, IACFUnknown* outer, _acfUID const& type,
+                                              IACFUnknown** out) = 0;
 };
 
 // What a definition tells about its class.
@@ -73,10 +82,12 @@ enum eACFDefinitionText : std::uint32_t { acfTextNames, acfTextVendor, acfTextMo
 
 // Describes one class.
 struct IACFDefinition : IACFUnknown {
-    virtual acfResult ACF_CALL GetIdentifier(eACFDefinitionId which, _acfUID* out) = 0; // null identifier when not given
-    // Writes at most capacity units, terminator included; *needed (may be null) gets the units the whole text takes with it.
-    // acfOk only when all fitted; capacity 0 with a null buffer asks for the length and answers acfEnd.
-    virtual acfResult ACF_CALL GetText(eACFDefinitionText which, wchar_t* buffer, std::uint64_t capacity, std::uint64_t* needed) = 0;
+    virtual acfResult ACF_CALL GetIdentifier(eACFDefinitionId which,
+                                             _acfUID* out) = 0; // null identifier when not given
+    // Writes at most capacity units, terminator included; *needed (may be null) gets the units the whole text takes
+    // with it. acfOk only when all fitted; capacity 0 with a null buffer asks for the length and answers acfEnd.
+    virtual acfResult ACF_CALL GetText(eACFDefinitionText which, wchar_t* buffer, std::uint64_t capacity,
+                                       std::uint64_t* needed) = 0;
 };
 
 // A fixed list, taken when the enumeration was made: classes that register later do not appear.
@@ -88,12 +99,13 @@ struct IACFEnumDefinitions : IACFUnknown {
 
 // The list of known classes; offered by the library over its class registry and by a host over all modules.
 struct IACFDefinitionRegistry : IACFUnknown {
-    virtual acfResult ACF_CALL EnumDefinitions(_acfUID const& category, IACFEnumDefinitions** out) = 0; // null category: all
+    virtual acfResult ACF_CALL EnumDefinitions(_acfUID const& category,
+                                               IACFEnumDefinitions** out) = 0; // null category: all
     virtual acfResult ACF_CALL FindDefinition(_acfUID const& cls, IACFDefinition** out) = 0;
     virtual acfResult ACF_CALL FindClass(wchar_t const* name, _acfUID* cls) = 0; // by one of its names, any case
 };
 
-#define ACF_TYPE(I, a, b, c, d, e, f, g, h, i, j, k) \
+#define ACF_TYPE(I, a, b, c, d, e, f, g, h, i, j, k)                                                                   \
     template <> struct acfTypeOf<I> { static constexpr _acfUID uid = {a, b, c, {d, e, f, g, h, i, j, k}}; }
 ACF_TYPE(IACFUnknown, 0x05553443, 0xC85A, 0x4675, 0xA9, 0x29, 0x59, 0xBC, 0xD6, 0xD1, 0x38, 0xF1);
 ACF_TYPE(IACFComponent, 0x8AD36F5B, 0x30F8, 0x47D8, 0xB7, 0x8C, 0xEA, 0x35, 0xDD, 0x8A, 0xC0, 0x2D);

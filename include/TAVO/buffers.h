@@ -1,6 +1,6 @@
 #pragma once
-// Shared, reference-counted blocks of typed memory (the storage under nearly every value of the library), byte buffers and
-// vectors made of them, sorting and searching of raw arrays, and the checksum machine.
+// Shared, reference-counted blocks of typed memory (the storage under nearly every value of the library), byte buffers
+// and vectors made of them, sorting and searching of raw arrays, and the checksum machine.
 //
 // A handle is one pointer to a block: a header, then the payload, in one heap allocation. Copying a handle shares the
 // block and counts; the last release finalizes the payload and frees the block.
@@ -20,8 +20,8 @@ struct tagCPOVTABL {
     void (*create)(void* payload, std::size_t bytes);
     /// Copy-constructs the source's elements into raw memory; null where a type allows no copies.
     void (*clone)(void* target, const void* source, std::size_t bytes);
-    /// Destroys the elements; called once, with the used size, when the last handle goes. It must not hand out handles to
-    /// the block itself.
+    /// Destroys the elements; called once, with the used size, when the last handle goes. It must not hand out handles
+    /// to the block itself.
     void (*finalize)(void* payload, std::size_t bytes);
     /// The interface @p type inside the payload, or null.
     void* (*queryinterface)(void* payload, const _acfUID& type);
@@ -29,9 +29,9 @@ struct tagCPOVTABL {
 
 /// What every block starts with; the payload follows in the same allocation, 16-byte aligned.
 struct tagCPOMEMHEADER {
-    std::int32_t lRefCnt;     ///< handles sharing the block; 0 or below marks a static block: never counted, never freed
-    std::size_t sAllocated;   ///< payload bytes available
-    std::size_t sUsed;        ///< payload bytes in use, never above sAllocated
+    std::int32_t lRefCnt;   ///< handles sharing the block; 0 or below marks a static block: never counted, never freed
+    std::size_t sAllocated; ///< payload bytes available
+    std::size_t sUsed;      ///< payload bytes in use, never above sAllocated
     const tagCPOVTABL* pVTbl; ///< the payload's type; never null in a live block
 };
 static_assert(sizeof(tagCPOMEMHEADER) == 32, "the payload behind the header is 16-byte aligned");
@@ -68,7 +68,8 @@ public:
     }
 
     /// Makes the block this handle's alone: a shared one is copied (used part only), a private one stays.
-    /// @return true: writing is safe now (or the handle is empty). False when the type allows no copies, the heap refused
+    /// @return true: writing is safe now (or the handle is empty). False when the type allows no copies, the heap
+    /// refused
     ///         or copying threw; the handle then keeps the shared block.
     /// A static block raises an assertion and is copied.
     bool clone();
@@ -80,8 +81,8 @@ public:
     /// The current count of handles; 0 when empty, 0 or "negative" for a static block.
     std::uint32_t lockcnt() const noexcept;
 
-    /// Whether a value of @p size bytes of this type may be assigned: false without size or table; true when empty; else
-    /// when the block has this table and at least @p size used bytes.
+    /// Whether a value of @p size bytes of this type may be assigned: false without size or table; true when empty;
+    /// else when the block has this table and at least @p size used bytes.
     bool IsAssignable(std::size_t size, const tagCPOVTABL* table) const noexcept;
     /// The same for arrays: the used size must be a multiple of @p size.
     bool IsNAssignable(std::size_t size, const tagCPOVTABL* table) const noexcept;
@@ -98,8 +99,8 @@ protected:
 
     /// Shares the source's block, then releases the old one.
     void CopyCPMemory(const CPObjectMemory& source) noexcept;
-    /// Releases the block and allocates one of @p size bytes, all used, not constructed. False (and empty) without a table
-    /// or memory.
+    /// Releases the block and allocates one of @p size bytes, all used, not constructed. False (and empty) without a
+    /// table or memory.
     bool Alloc(std::size_t size, const tagCPOVTABL* table) noexcept;
     /// As Alloc with a used size of 0.
     bool Reserve(std::size_t capacity, const tagCPOVTABL* table) noexcept;
@@ -110,7 +111,8 @@ protected:
     static void Free(tagCPOMEMHEADER* header) noexcept;
     /// Adds one reference of @p header, which must not be null; null when the block turned out to be dead.
     static tagCPOMEMHEADER* Acquire(tagCPOMEMHEADER* header) noexcept;
-    /// A new block outside any handle, count 1; null without memory. Sizes near the end of the address space are refused.
+    /// A new block outside any handle, count 1; null without memory. Sizes near the end of the address space are
+    /// refused.
     static tagCPOMEMHEADER* NewBlock(std::size_t capacity, std::size_t used, const tagCPOVTABL* table) noexcept;
 
     /// Used bytes; 0 when empty.
@@ -154,8 +156,8 @@ public:
 
     /// Releases the buffer and takes a new one of @p size undefined bytes; size 0 leaves it empty and is true.
     bool Alloc(std::size_t size) noexcept { return _Alloc(size, &_vtbl); }
-    /// Changes the size, keeping the bytes; grows to exactly @p size. Within the capacity the block itself changes, also
-    /// for every other handle that shares it: clone() first for a private buffer. False keeps the old buffer.
+    /// Changes the size, keeping the bytes; grows to exactly @p size. Within the capacity the block itself changes,
+    /// also for every other handle that shares it: clone() first for a private buffer. False keeps the old buffer.
     bool Resize(std::size_t size) noexcept { return _Resize(size, m_pMH ? m_pMH->pVTbl : &_vtbl); }
     /// Whether @p address lies inside the block. The bytes of the block's header count too, but for the first.
     bool isMemory(const void* address) const noexcept;
@@ -164,7 +166,8 @@ protected:
     /// As Alloc, with a type table of the caller's.
     bool _Alloc(std::size_t size, const tagCPOVTABL* table) noexcept;
     bool _Resize(std::size_t size, const tagCPOVTABL* table) noexcept;
-    /// Makes room for @p capacity bytes when that is above the used size: the block is then replaced even if it had room.
+    /// Makes room for @p capacity bytes when that is above the used size: the block is then replaced even if it had
+    /// room.
     bool _Reserve(std::size_t capacity, const tagCPOVTABL* table) noexcept;
 
     static void _create(void* payload, std::size_t bytes);
@@ -173,12 +176,11 @@ protected:
     static void* _queryinterface(void* payload, const _acfUID& type);
 };
 
-/// Vector of handles of type T, itself a handle: copies share the elements. Changes are made in place and seen by all who
-/// share the block, unless the call has to replace it; clone() first for a private vector.
-/// T must be movable bitwise and its default must be its empty value.
-/// Instantiated for CPObjectMemory, pooled strings and the hash table's entries; each is a type of its own.
-template <class T>
-class CPObjectVector : public CPObjectMemory {
+/// Vector of handles of type T, itself a handle: copies share the elements. Changes are made in place and seen by all
+/// who share the block, unless the call has to replace it; clone() first for a private vector. T must be movable
+/// bitwise and its default must be its empty value. Instantiated for CPObjectMemory, pooled strings and the hash
+/// table's entries; each is a type of its own.
+template <class T> class CPObjectVector : public CPObjectMemory {
 public:
     static const tagCPOVTABL _vtbl;
     static std::size_t GetTypeID() noexcept;
@@ -196,7 +198,8 @@ public:
     /// Puts a counted copy of @p element before position @p position, or at the end when that is beyond it.
     /// Capacity grows by 16 elements at a time. False only without memory; the vector is then unchanged.
     bool Insert(const T& element, std::size_t position) noexcept;
-    /// Takes out the element at @p index and closes the gap. With @p releaseWhenEmpty the block goes with the last element.
+    /// Takes out the element at @p index and closes the gap. With @p releaseWhenEmpty the block goes with the last
+    /// element.
     bool Delete(std::size_t index, bool releaseWhenEmpty) noexcept;
     /// Index of the first element after @p afterIndex that holds the same block as @p element; all-ones when none does.
     /// Pass all-ones to search from the start, the last result to go on.
@@ -238,8 +241,8 @@ public:
     CPOMVector& operator=(const CPObjectMemory& other) noexcept;
 };
 
-/// A set that holds at most one object per run-time type. What goes in and what comes out are private copies, so copies of
-/// the set and objects outside it never change each other.
+/// A set that holds at most one object per run-time type. What goes in and what comes out are private copies, so copies
+/// of the set and objects outside it never change each other.
 class TAVO_API CPTypedObjectVector {
 public:
     CPTypedObjectVector() noexcept = default;
@@ -247,8 +250,8 @@ public:
     CPTypedObjectVector& operator=(const CPTypedObjectVector&) noexcept = default;
     virtual ~CPTypedObjectVector();
 
-    /// Keeps a private copy of @p object in place of the one of its type. False for an empty handle, a type that allows no
-    /// copies, or without memory; the set is then as it was.
+    /// Keeps a private copy of @p object in place of the one of its type. False for an empty handle, a type that allows
+    /// no copies, or without memory; the set is then as it was.
     bool Set(const CPObjectMemory& object) noexcept;
     /// A private copy of the object of that type; empty when there is none or it could not be copied.
     CPObjectMemory Get(std::size_t typeId) const noexcept;
@@ -269,9 +272,9 @@ namespace Sort {
 using Compare = int (*)(const void* first, const void* second);
 using CompareWith = int (*)(const void* first, const void* second, void* context);
 
-/// Sorts @p count elements of @p size bytes in place, without allocating; not stable. Nothing for fewer than two elements
-/// or size 0. A comparison that throws ends the sort: the array is then some permutation of what it was.
-/// O(n log n), also for the worst order of more than 1024 elements.
+/// Sorts @p count elements of @p size bytes in place, without allocating; not stable. Nothing for fewer than two
+/// elements or size 0. A comparison that throws ends the sort: the array is then some permutation of what it was. O(n
+/// log n), also for the worst order of more than 1024 elements.
 TAVO_API void vfqsort(void* base, std::size_t count, std::size_t size, Compare compare) noexcept;
 /// The same with a context for the comparison.
 TAVO_API void vfpqsort(void* base, std::size_t count, std::size_t size, void* context, CompareWith compare) noexcept;

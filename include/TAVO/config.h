@@ -58,7 +58,8 @@ using ulong32 = unsigned int;
 #endif
 
 static_assert(sizeof(long32) == 4 && sizeof(ulong32) == 4, "32-bit numbers on both platforms");
-static_assert(sizeof(wchar_t) == 2 && static_cast<wchar_t>(-1) > 0, "wide characters have 16 bits: build with -fshort-wchar");
+static_assert(sizeof(wchar_t) == 2 && static_cast<wchar_t>(-1) > 0,
+              "wide characters have 16 bits: build with -fshort-wchar");
 static_assert(sizeof(std::size_t) == 8 && sizeof(void*) == 8, "64-bit targets only");
 
 } // namespace TAVO

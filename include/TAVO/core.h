@@ -9,7 +9,8 @@ namespace TAVO {
 
 /// Starts the process-wide services, counted: the first call starts them, every later call only counts.
 /// Allocation, logging, interning and all value types work without it; only background upkeep needs it.
-/// @return true when the services run; false when starting them failed. A failed call stays counted, so pair every call,
+/// @return true when the services run; false when starting them failed. A failed call stays counted, so pair every
+/// call,
 ///         also a failed one, with one AppExit.
 TAVO_API bool AppInit();
 

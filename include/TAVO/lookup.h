@@ -1,8 +1,8 @@
 #pragma once
 // The library's one hash table: a map from 64-bit hashes, which the caller computes, to items of object memory.
 //
-// 2^n buckets, chosen by the hash's low bits; each bucket is a vector sorted by hash and, for equal hashes, by the derived
-// class's comparison. The table never resizes.
+// 2^n buckets, chosen by the hash's low bits; each bucket is a vector sorted by hash and, for equal hashes, by the
+// derived class's comparison. The table never resizes.
 //
 // Threads: no lock of its own; the owner serialises every access.
 
@@ -17,13 +17,14 @@ enum eHashCollision : std::uint32_t {
     eHashReplace = 1,       ///< equal items: replace the old one; others are inserted beside it
     eHashKeepByHash = 2,    ///< the hash alone decides: keep and return the first entry of that hash
     eHashReplaceByHash = 3, ///< the hash alone decides: replace the first entry of that hash
-    eHashRefuse = 4         ///< equal items: refuse with an empty handle (as does every value above); others are inserted
+    eHashRefuse = 4 ///< equal items: refuse with an empty handle (as does every value above); others are inserted
 };
 
 /// Visitor of a table.
 class IBaseHashTableEnum {
 public:
-    /// @return true to go on (EnumTableBy) or to keep the entry (PurgeTable). An exception counts as the end of the walk.
+    /// @return true to go on (EnumTableBy) or to keep the entry (PurgeTable). An exception counts as the end of the
+    /// walk.
     virtual bool OnItem(unsigned long long hash, const Buffers::CPObjectMemory& item) = 0;
 
 protected:
@@ -50,8 +51,8 @@ public:
 protected:
     /// The order of two items of equal hash: below 0, 0 for equal, above 0. It may not change the table.
     virtual long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) = 0;
-    /// Whether DisposeTable may drop the item; no by default. While it is asked, the table, the walk and the argument hold
-    /// the item: an item that nobody else holds has a count of 3.
+    /// Whether DisposeTable may drop the item; no by default. While it is asked, the table, the walk and the argument
+    /// hold the item: an item that nobody else holds has a count of 3.
     virtual bool IsDisposable(Buffers::CPObjectMemory item);
     /// Called for an item just before DisposeTable and DeleteIndex drop it.
     virtual void OnDispose(const Buffers::CPObjectMemory& item);
@@ -73,11 +74,11 @@ protected:
     bool DeleteItem(unsigned long long hash, const Buffers::CPObjectMemory& probe) noexcept;
     /// Drops the whole bucket that the hash selects, entries of other hashes included, after OnDispose for each; true.
     bool DeleteIndex(unsigned long long hash) noexcept;
-    /// Visits every entry, or with @p byHash those of exactly @p hash. False when stopped, without a visitor or for an empty
-    /// table. The visitor may change the table.
+    /// Visits every entry, or with @p byHash those of exactly @p hash. False when stopped, without a visitor or for an
+    /// empty table. The visitor may change the table.
     bool EnumTableBy(IBaseHashTableEnum* visitor, unsigned long long hash, bool byHash) noexcept;
-    /// Removes every entry that the visitor rejects. True when all were visited, also without a visitor or entries; false
-    /// when the visitor threw: that entry stays.
+    /// Removes every entry that the visitor rejects. True when all were visited, also without a visitor or entries;
+    /// false when the visitor threw: that entry stays.
     bool PurgeTable(IBaseHashTableEnum* visitor) noexcept;
     /// Drops disposable items, bucket after bucket from where the last call ended, for @p budget milliseconds.
     /// @return true when a whole round finished within the budget.

@@ -348,8 +348,9 @@ TAVO_API bool _isCRLF(wchar_t c);
 
 // --- The string pool -----------------------------------------------------------------------------------------------
 //
-// Every distinct text is stored once in the process, as a reference-counted entry. Handles are one pointer; they compare
-// and hash by their entries' precomputed fields. Entries that nobody holds stay until two sweeps in a row find them idle.
+// Every distinct text is stored once in the process, as a reference-counted entry. Handles are one pointer; they
+// compare and hash by their entries' precomputed fields. Entries that nobody holds stay until two sweeps in a row find
+// them idle.
 //
 // Texts of equal length, equal hashes (two of 64 bits) and equal first ten units are one entry.
 // A character above U+FFFF counts 1 in len() when it came as a pair of wide text, and 2 when it came as UTF-8; all its
@@ -361,13 +362,13 @@ namespace detail {
 
 // What a pool entry holds; its text follows in the same block.
 struct tagPOOLENTRY {
-    std::uint32_t idleSweeps;    // how many sweeps in a row found the entry unreferenced
-    std::size_t length;          // units as the key counts them: a pair of wide text counts 1
-    std::size_t utf8Size;        // bytes of the text in UTF-8
-    unsigned long long hash;     // CRC-64 of the text
-    unsigned long long hashi;    // CRC-64 of the text in lower case
-    const wchar_t* text;         // the zero-terminated text behind these fields
-    const unsigned char* utf8;   // the UTF-8 form, null until first asked for
+    std::uint32_t idleSweeps;  // how many sweeps in a row found the entry unreferenced
+    std::size_t length;        // units as the key counts them: a pair of wide text counts 1
+    std::size_t utf8Size;      // bytes of the text in UTF-8
+    unsigned long long hash;   // CRC-64 of the text
+    unsigned long long hashi;  // CRC-64 of the text in lower case
+    const wchar_t* text;       // the zero-terminated text behind these fields
+    const unsigned char* utf8; // the UTF-8 form, null until first asked for
 };
 
 } // namespace detail
@@ -385,13 +386,14 @@ protected:
     ~IStringSubmitter() = default;
 };
 
-/// The process-wide pool. Thread-safe; works from any static constructor or destructor, before AppInit and after AppExit.
+/// The process-wide pool. Thread-safe; works from any static constructor or destructor, before AppInit and after
+/// AppExit.
 ///
 /// The names tell what a call does: Get interns a missing text, Query answers the null string for it; an "i" matches
-/// regardless of case (A to Z) and answers the first variant interned; an "n" takes at most n units or bytes of the text,
-/// never reading at or behind index n, and leaves out a character that this cuts.
-/// Null pointers give the null string, empty texts the empty one; a text with an invalid sequence cannot be interned and
-/// gives the null string, as does exhausted memory.
+/// regardless of case (A to Z) and answers the first variant interned; an "n" takes at most n units or bytes of the
+/// text, never reading at or behind index n, and leaves out a character that this cuts. Null pointers give the null
+/// string, empty texts the empty one; a text with an invalid sequence cannot be interned and gives the null string, as
+/// does exhausted memory.
 class TAVO_API CStringPool {
 public:
     static CPPoolString GetStringRef(const wchar_t* text) noexcept;
@@ -416,13 +418,15 @@ public:
     /// UTF-16, as wide text.
     static CPPoolString GetStringRefn(const unsigned short* text, std::size_t n) noexcept;
 
-    /// Interns what the submitter writes. A text shorter than announced is cut to size; one that starts with 0 is the empty
-    /// string. No announced units raise an assertion and give the null string.
+    /// Interns what the submitter writes. A text shorter than announced is cut to size; one that starts with 0 is the
+    /// empty string. No announced units raise an assertion and give the null string.
     static CPPoolString GetStringRef(IStringSubmitter* submitter) noexcept;
 
-    /// Sweeps the pool for at most @p budget milliseconds, going on where the last sweep ended: an entry found unreferenced
-    /// loses its UTF-8 form, and goes when the next sweep finds it so again. Looking a text up does not prolong its life.
-    /// @return true when a whole round finished in time. False, and nothing is done, unless the calling thread has normal
+    /// Sweeps the pool for at most @p budget milliseconds, going on where the last sweep ended: an entry found
+    /// unreferenced loses its UTF-8 form, and goes when the next sweep finds it so again. Looking a text up does not
+    /// prolong its life.
+    /// @return true when a whole round finished in time. False, and nothing is done, unless the calling thread has
+    /// normal
     ///         priority.
     static bool Collect(ulong32 budget) noexcept;
     /// Recomputes the keys of all entries; false at the first damaged one, and an assertion.
@@ -433,10 +437,9 @@ public:
     static unsigned long long GetNItems() noexcept;
 };
 
-/// Immutable text: a handle of a pool entry, one pointer, never null. The null string is a static entry without text, the
-/// empty string another one with the text ""; the two are different.
-/// Copying costs one atomic increment; comparison by entry costs nothing.
-/// Threads: as for every handle; the UTF-8 form is made safely by whoever asks first.
+/// Immutable text: a handle of a pool entry, one pointer, never null. The null string is a static entry without text,
+/// the empty string another one with the text ""; the two are different. Copying costs one atomic increment; comparison
+/// by entry costs nothing. Threads: as for every handle; the UTF-8 form is made safely by whoever asks first.
 class TAVO_API CPPoolString : private Buffers::CPObjectMemory {
 public:
     static const CPPoolString ptrue;  ///< "true"
@@ -478,8 +481,8 @@ public:
     /// The text, never null; that of the null string is empty. It may hold more units than len() says, by one for each
     /// pair: size a copy by the terminator.
     operator const wchar_t*() const noexcept { return Entry().text; }
-    /// The text in UTF-8, made on first use and kept with the entry while anyone holds it. Empty where UTF-8 has no form
-    /// for the text (by this library's rules two pairs already) or memory is out.
+    /// The text in UTF-8, made on first use and kept with the entry while anyone holds it. Empty where UTF-8 has no
+    /// form for the text (by this library's rules two pairs already) or memory is out.
     operator const unsigned char*() const noexcept;
     /// Units, a pair counting 1.
     std::size_t len() const noexcept { return Entry().length; }
@@ -502,8 +505,8 @@ public:
     void TransferFrom(CPPoolString& other) noexcept;
     /// Checks the entry against its text; false and an assertion when it is damaged.
     bool Verify() const noexcept;
-    /// The text with its trailing decimal number raised by one, its width kept ("clip009" gives "clip010"); without such a
-    /// number 1 is appended. The null string stays null.
+    /// The text with its trailing decimal number raised by one, its width kept ("clip009" gives "clip010"); without
+    /// such a number 1 is appended. The null string stays null.
     CPPoolString inc() const noexcept;
 
     /// Same entry: for strings interned alike the same as equal texts.
@@ -526,8 +529,8 @@ public:
     int cmpp(const wchar_t* other) const noexcept;
     int cmppi(const CPPoolString& other) const noexcept;
     int cmppi(const wchar_t* other) const noexcept;
-    /// 0 when this text ends with the other; -1 when it is shorter. Counted by len(): with pairs in the text it looks one
-    /// unit per pair too early.
+    /// 0 when this text ends with the other; -1 when it is shorter. Counted by len(): with pairs in the text it looks
+    /// one unit per pair too early.
     int cmp_p(const CPPoolString& other) const noexcept;
     int cmp_p(const wchar_t* other) const noexcept;
     int cmp_pi(const CPPoolString& other) const noexcept;
@@ -580,7 +583,8 @@ public:
     bool Insert(const CPPoolString& text, std::size_t index) noexcept;
     /// Sorted arrays only: removes the string; true also when it is not there.
     bool Delete(const CPPoolString& text) noexcept;
-    /// Sorted: where the string stands or would stand. All-ones for an unsorted array, or one that never held an element.
+    /// Sorted: where the string stands or would stand. All-ones for an unsorted array, or one that never held an
+    /// element.
     std::size_t LocateEntry(const CPPoolString& text) const noexcept;
 
     /// All elements joined by the separator as one pooled string; the null string for an empty array, the empty string

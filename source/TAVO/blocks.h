@@ -17,8 +17,12 @@ public:
 
     static tagCPOMEMHEADER* Of(const CPObjectMemory& handle) { return static_cast<const Block&>(handle).m_pMH; }
 
+    static tagCPOMEMHEADER*& RefOf(CPObjectMemory& handle) { return static_cast<Block&>(handle).m_pMH; }
+
     // The payload of a block that holds a T.
-    template <class T> static T* PayloadOf(const CPObjectMemory& handle) { return reinterpret_cast<T*>(Of(handle) + 1); }
+    template <class T> static T* PayloadOf(const CPObjectMemory& handle) {
+        return reinterpret_cast<T*>(Of(handle) + 1);
+    }
 
     // A handle that takes over a reference.
     static CPObjectMemory Adopt(tagCPOMEMHEADER* header) { return Block(header); }

@@ -57,7 +57,7 @@ template <class Unit> Built<Unit> FromUtf8(const unsigned char* source) {
     auto* text = AllocateUnits<Unit>(extent.target + 1);
     if (!text) return {};
     Unit* out = text;
-    ConvertUtf8(source, extent.source, out);
+    ConvertUtf8(source, extent, out);
     *out = 0;
     return {text, static_cast<std::size_t>(out - text)};
 }
@@ -69,7 +69,7 @@ template <class Unit> Built<unsigned char> ToUtf8(const Unit* source) {
     auto* text = AllocateUnits<unsigned char>(extent.target + 1);
     if (!text) return {};
     unsigned char* out = text;
-    ConvertUtf16(source, extent.source, out);
+    ConvertUtf16(source, extent, out);
     *out = 0;
     return {text, static_cast<std::size_t>(out - text)};
 }

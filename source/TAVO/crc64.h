@@ -1,6 +1,6 @@
 #pragma once
-// The library's own checksum (64 bits, the polynomial of ECMA-182, most significant bit first, initial value 0) by slices
-// of eight bytes. Constants: usable before any constructor ran.
+// The library's own checksum (64 bits, the polynomial of ECMA-182, most significant bit first, initial value 0) by
+// slices of eight bytes. Constants: usable before any constructor ran.
 
 #include <array>
 #include <bit>
@@ -31,8 +31,8 @@ constexpr std::array<Table, 8> MakeSlices() {
 
 alignas(64) inline constexpr std::array<Table, 8> kSlices = MakeSlices();
 
-// Four, two or one units of 16 bits: each byte of `units`, lowest first, is fed in turn. Little-endian order of bytes is
-// that of the text in memory, so callers load units and pass them on.
+// Four, two or one units of 16 bits: each byte of `units`, lowest first, is fed in turn. Little-endian order of bytes
+// is that of the text in memory, so callers load units and pass them on.
 constexpr std::uint64_t SwapBytes(std::uint64_t v) {
     v = (v & 0x00FF00FF00FF00FF) << 8 | (v >> 8 & 0x00FF00FF00FF00FF);
     v = (v & 0x0000FFFF0000FFFF) << 16 | (v >> 16 & 0x0000FFFF0000FFFF);

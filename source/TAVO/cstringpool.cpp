@@ -35,8 +35,8 @@ struct Pool {
     }
 };
 
-// Built at load or at first use, whichever is earlier, in storage that no destructor touches: static objects of hosts and
-// plug-ins may use the pool from their constructors and destructors.
+// Built at load or at first use, whichever is earlier, in storage that no destructor touches: static objects of hosts
+// and plug-ins may use the pool from their constructors and destructors.
 alignas(Pool) unsigned char g_storage[sizeof(Pool)];
 
 Pool& ThePool() noexcept {
@@ -51,15 +51,16 @@ void RaiseComplaint(const char* complaint) noexcept {
 
 // --- interning -----------------------------------------------------------------------------------------------------
 
-// An entry that stands on the stack to be searched for: count 0, so never counted or freed, and of its text no more than
-// comparisons look at.
+// An entry that stands on the stack to be searched for: count 0, so never counted or freed, and of its text no more
+// than comparisons look at.
 class Probe {
 public:
     static constexpr std::size_t kUnits = 10;
 
     explicit Probe(const pool::Key& key) noexcept
-        : m_header{0, sizeof(PoolEntry), sizeof(PoolEntry), &g_entryTable},
-          m_entry{0, key.length, key.utf8Size, key.hash, key.hashi, first, nullptr} {}
+        : m_header{0, sizeof(PoolEntry), sizeof(PoolEntry), &g_entryTable}, m_entry{0,        key.length, key.utf8Size,
+                                                                                    key.hash, key.hashi,  first,
+                                                                                    nullptr} {}
     Probe(const Probe&) = delete;
     Probe& operator=(const Probe&) = delete;
 
@@ -96,9 +97,8 @@ CPPoolString Intern(const Source& source, const pool::Key& key, Missing missing,
             complaint = std::exchange(pool.groups.complaint, nullptr);
         }
         CCaseSensitiveHash::Place place;
-        tagCPOMEMHEADER* found = match == Match::Exact || missing == Missing::Create
-                                     ? pool.entries.Find(probe.Block(), place)
-                                     : nullptr;
+        tagCPOMEMHEADER* found =
+            match == Match::Exact || missing == Missing::Create ? pool.entries.Find(probe.Block(), place) : nullptr;
         if (found) {
             result = PoolAccess::Share(found);
         } else if (missing == Missing::Create) {
@@ -164,7 +164,9 @@ struct Utf8Source {
         *to = 0;
     }
     std::size_t Units() const noexcept { return units; }
-    bool Write(wchar_t* out) const noexcept { return detail::ConvertUtf8(text, bytes, out); }
+    bool Write(wchar_t* out) const noexcept {
+        return detail::ConvertUtf8(text, {.source = bytes, .target = units}, out);
+    }
 };
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {

@@ -15,9 +15,9 @@ using Buffers::CPObjectMemory;
 
 namespace {
 
-// First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed from the
-// value and the search widens from there: one or two cache lines instead of a line per halving. Hashes that are not spread
-// cost twice a bisection.
+// First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed from
+// the value and the search widens from there: one or two cache lines instead of a line per halving. Hashes that are not
+// spread cost twice a bisection.
 std::size_t LowerBoundByHash(const CBaseHashTable::HASHENTRY* entries, std::size_t count, unsigned long long hash) {
     if (count == 0) return 0;
     std::size_t low = 0, high = count; // entries before low are below, entries from high on are not
@@ -124,7 +124,9 @@ CBaseHashTable::Place CBaseHashTable::Locate(unsigned long long hash, const CPOb
     return place;
 }
 
-CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept { return Buckets()[place.bucket][place.index]; }
+CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
+    return Buckets()[place.bucket][place.index];
+}
 
 bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, const CPObjectMemory& item) noexcept {
     return EnsureIndex() && Buckets()[place.bucket].Insert(HASHENTRY{hash, item}, place.index);
@@ -144,7 +146,8 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
 
     switch (collision) {
     case eHashKeep:
-    case eHashKeepByHash: return At(place).item;
+    case eHashKeepByHash:
+        return At(place).item;
     case eHashReplace: {
         const CPObjectMemory old = std::exchange(At(place).item, item); // released when the table is whole again
         return item;
@@ -157,7 +160,8 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
         InsertAt(Locate(hash, added), hash, added);
         return added;
     }
-    default: return {};
+    default:
+        return {};
     }
 }
 

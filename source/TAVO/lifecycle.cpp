@@ -4,7 +4,6 @@
 
 #include "poolentry.h"
 
-#include <atomic>
 #include <mutex>
 #include <TAVO/core.h>
 
@@ -95,38 +94,49 @@ void OnProcessEnd() noexcept { g_processEnding = true; }
 bool IsProcessEnding() noexcept { return g_processEnding; }
 
 // The library has no process-wide services so far: upkeep of its own begins and ends here.
-bool StartServices() noexcept { return true; }
+bool StartServices() noexcept { return g_loaded; }
 void StopServices() noexcept {}
 
-bool AppInit() {
+bool CountedServices::Enter() noexcept {
     for (;;) {
-        std::uint32_t count = g_initCount;
+        std::uint32_t count = m_count;
         if (count != 0) {
             // Intended: this also counts on after a failed start, whose count stays raised, and then answers true
             // without trying again. A textbook would take the failed call back; hosts pair every call with one AppExit.
-            if (g_initCount.compare_exchange_weak(count, count + 1)) return g_loaded;
+            if (m_count.compare_exchange_weak(count, count + 1)) return true;
             continue;
         }
         const std::lock_guard lock(g_lifecycleMutex);
-        if (g_initCount.compare_exchange_strong(count, 1)) return g_loaded && StartServices();
+        if (m_count.compare_exchange_strong(count, 1)) return m_start();
     }
 }
 
-void AppExit() {
+void CountedServices::Leave() noexcept {
     for (;;) {
-        std::uint32_t count = g_initCount;
+        std::uint32_t count = m_count;
         if (count != 1) {
             // Intended: from 0 the count wraps, so that the next AppInit does not reach 1 and starts nothing. A
             // textbook would refuse; the count is the host's promise of pairs and is taken as it comes.
-            if (g_initCount.compare_exchange_weak(count, count - 1)) return;
+            if (m_count.compare_exchange_weak(count, count - 1)) return;
             continue;
         }
         const std::lock_guard lock(g_lifecycleMutex);
-        if (!g_initCount.compare_exchange_strong(count, 0)) continue;
-        StopServices();
-        return;
+        if (m_count.compare_exchange_strong(count, 0)) return m_stop();
     }
 }
+
+namespace {
+
+constinit CountedServices g_services(StartServices, StopServices);
+
+} // namespace
+
+bool AppInit() {
+    const bool running = g_services.Enter();
+    return running && g_loaded; // a load that failed and could not be refused shows here
+}
+
+void AppExit() { g_services.Leave(); }
 
 namespace Core::OS {
 

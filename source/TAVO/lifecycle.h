@@ -3,6 +3,8 @@
 
 #include "platform/platform.h"
 
+#include <atomic>
+
 namespace TAVO {
 
 // The diagnostics that the configuration file switches on; all off without it.
@@ -40,6 +42,24 @@ extern Switches g_switches;
 
 // Held while services start or stop, so that a stop and a start never interleave.
 extern Platform::Mutex g_lifecycleMutex;
+
+// Counts starts and stops: the call that raises the count to 1 starts, the one that brings it back to 0 stops, both
+// under g_lifecycleMutex. Every other call only counts and returns at once, possibly before a start is through. Any
+// thread.
+class CountedServices {
+public:
+    constexpr CountedServices(bool (*start)() noexcept, void (*stop)() noexcept) : m_start(start), m_stop(stop) {}
+
+    // True when the services run or are being started by another call; false when starting failed, the count stays
+    // raised.
+    bool Enter() noexcept;
+    void Leave() noexcept;
+
+private:
+    std::atomic<std::uint32_t> m_count{0};
+    bool (*m_start)() noexcept;
+    void (*m_stop)() noexcept;
+};
 
 // Starts the process-wide services in their order; false when one did not start, those before it stay started.
 // Requires: g_lifecycleMutex held.

@@ -2,6 +2,7 @@
 
 #include "logging.h"
 
+#include "diagnostics.h"
 #include "format.h"
 #include "lifecycle.h"
 
@@ -67,7 +68,7 @@ void WriteLine(_acfDebugLevel level, const wchar_t* category, const char* source
 
     const wchar_t* label = FindLevelLabel(level);
     if (!label) {
-        FailCodePoint("Unknown debug level");
+        diagnostics::IllegalCodePoint("Unknown debug level");
         label = L"unknown";
     }
     wchar_t prefix[kPrefixUnits];

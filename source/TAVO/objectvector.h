@@ -10,37 +10,27 @@
 
 namespace TAVO::Buffers {
 
-template <class T>
-const tagCPOVTABL CPObjectVector<T>::_vtbl = {_create, _clone, _finalize, _queryinterface};
+template <class T> const tagCPOVTABL CPObjectVector<T>::_vtbl = {_create, _clone, _finalize, _queryinterface};
 
-template <class T>
-std::size_t CPObjectVector<T>::GetTypeID() noexcept {
-    return reinterpret_cast<std::size_t>(&_vtbl);
-}
+template <class T> std::size_t CPObjectVector<T>::GetTypeID() noexcept { return reinterpret_cast<std::size_t>(&_vtbl); }
 
-template <class T>
-void CPObjectVector<T>::_create(void* payload, std::size_t bytes) {
+template <class T> void CPObjectVector<T>::_create(void* payload, std::size_t bytes) {
     auto* elements = static_cast<T*>(payload);
     for (std::size_t i = 0; i < bytes / sizeof(T); ++i) ::new (static_cast<void*>(elements + i)) T();
 }
 
-template <class T>
-void CPObjectVector<T>::_clone(void* target, const void* source, std::size_t bytes) {
+template <class T> void CPObjectVector<T>::_clone(void* target, const void* source, std::size_t bytes) {
     auto* to = static_cast<T*>(target);
     auto* from = static_cast<const T*>(source);
     for (std::size_t i = 0; i < bytes / sizeof(T); ++i) ::new (static_cast<void*>(to + i)) T(from[i]);
 }
 
-template <class T>
-void CPObjectVector<T>::_finalize(void* payload, std::size_t bytes) {
+template <class T> void CPObjectVector<T>::_finalize(void* payload, std::size_t bytes) {
     auto* elements = static_cast<T*>(payload);
     for (std::size_t i = 0; i < bytes / sizeof(T); ++i) elements[i].~T();
 }
 
-template <class T>
-void* CPObjectVector<T>::_queryinterface(void*, const _acfUID&) {
-    return nullptr;
-}
+template <class T> void* CPObjectVector<T>::_queryinterface(void*, const _acfUID&) { return nullptr; }
 
 namespace detail {
 
@@ -49,47 +39,28 @@ constexpr std::size_t kMostElements = 0xFFFFFFFF;
 
 } // namespace detail
 
-template <class T>
-CPObjectVector<T>::CPObjectVector() noexcept = default;
+template <class T> CPObjectVector<T>::CPObjectVector() noexcept = default;
 
-template <class T>
-CPObjectVector<T>::CPObjectVector(std::size_t count) noexcept {
-    Alloc(count);
-}
+template <class T> CPObjectVector<T>::CPObjectVector(std::size_t count) noexcept { Alloc(count); }
 
-template <class T>
-T* CPObjectVector<T>::Elements() const noexcept {
-    return static_cast<T*>(Payload());
-}
+template <class T> T* CPObjectVector<T>::Elements() const noexcept { return static_cast<T*>(Payload()); }
 
-template <class T>
-std::size_t CPObjectVector<T>::GetNItems() const noexcept {
-    return GetSize() / sizeof(T);
-}
+template <class T> std::size_t CPObjectVector<T>::GetNItems() const noexcept { return GetSize() / sizeof(T); }
 
-template <class T>
-bool CPObjectVector<T>::isEmpty() const noexcept {
-    return GetNItems() == 0;
-}
+template <class T> bool CPObjectVector<T>::isEmpty() const noexcept { return GetNItems() == 0; }
 
-template <class T>
-T& CPObjectVector<T>::operator[](std::size_t index) noexcept {
+template <class T> T& CPObjectVector<T>::operator[](std::size_t index) noexcept { return Elements()[index]; }
+
+template <class T> const T& CPObjectVector<T>::operator[](std::size_t index) const noexcept {
     return Elements()[index];
 }
 
-template <class T>
-const T& CPObjectVector<T>::operator[](std::size_t index) const noexcept {
-    return Elements()[index];
-}
-
-template <class T>
-T* CPObjectVector<T>::GetArray(std::size_t& count) const noexcept {
+template <class T> T* CPObjectVector<T>::GetArray(std::size_t& count) const noexcept {
     count = GetNItems();
     return Elements();
 }
 
-template <class T>
-bool CPObjectVector<T>::Alloc(std::size_t count) noexcept {
+template <class T> bool CPObjectVector<T>::Alloc(std::size_t count) noexcept {
     free();
     if (count == 0) return true;
     if (count > detail::kMostElements || !CPObjectMemory::Alloc(count * sizeof(T), &_vtbl)) return false;
@@ -99,8 +70,7 @@ bool CPObjectVector<T>::Alloc(std::size_t count) noexcept {
 
 // Gives the vector a block for `capacity` elements, more than it has now; the count stays. A block of this handle alone
 // moves bitwise, or not at all; a shared one stays with the others, and its elements are shared one by one.
-template <class T>
-bool CPObjectVector<T>::GrowTo(std::size_t capacity) noexcept {
+template <class T> bool CPObjectVector<T>::GrowTo(std::size_t capacity) noexcept {
     if (capacity > detail::kMostElements) return false;
     if (!m_pMH) return CPObjectMemory::Reserve(capacity * sizeof(T), &_vtbl);
     const std::size_t bytes = capacity * sizeof(T);
@@ -112,15 +82,13 @@ bool CPObjectVector<T>::GrowTo(std::size_t capacity) noexcept {
     return true;
 }
 
-template <class T>
-bool CPObjectVector<T>::Reserve(std::size_t count) noexcept {
+template <class T> bool CPObjectVector<T>::Reserve(std::size_t count) noexcept {
     if (count <= GetNItems()) return true;
     if (IsPrivate() && count * sizeof(T) <= GetAllocSize() && count <= detail::kMostElements) return true;
     return GrowTo(count);
 }
 
-template <class T>
-bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
+template <class T> bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
     const std::size_t old = GetNItems();
     if (count == old) return true;
     if (count > detail::kMostElements) return false;
@@ -140,8 +108,7 @@ bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
     return SetSize(count * sizeof(T));
 }
 
-template <class T>
-bool CPObjectVector<T>::Insert(const T& element, std::size_t position) noexcept {
+template <class T> bool CPObjectVector<T>::Insert(const T& element, std::size_t position) noexcept {
     const std::size_t count = GetNItems();
     T inserted(element); // counted before anything moves: the argument may live in this very vector
     // Growth is linear by 16 elements on purpose: most vectors are short, and long ones are reserved by their builders.
@@ -154,8 +121,7 @@ bool CPObjectVector<T>::Insert(const T& element, std::size_t position) noexcept 
     return true;
 }
 
-template <class T>
-bool CPObjectVector<T>::Delete(std::size_t index, bool releaseWhenEmpty) noexcept {
+template <class T> bool CPObjectVector<T>::Delete(std::size_t index, bool releaseWhenEmpty) noexcept {
     const std::size_t count = GetNItems();
     if (index >= count) return false;
     T* slot = Elements() + index;
@@ -169,8 +135,7 @@ bool CPObjectVector<T>::Delete(std::size_t index, bool releaseWhenEmpty) noexcep
     return true;
 }
 
-template <class T>
-std::size_t CPObjectVector<T>::Find(const T& element, std::size_t afterIndex) const noexcept {
+template <class T> std::size_t CPObjectVector<T>::Find(const T& element, std::size_t afterIndex) const noexcept {
     // Bitwise: two elements are the same when they hold the same block. All-ones wraps to the start.
     for (std::size_t i = afterIndex + 1; i < GetNItems(); ++i)
         if (std::memcmp(static_cast<const void*>(Elements() + i), static_cast<const void*>(&element), sizeof(T)) == 0)
@@ -178,8 +143,7 @@ std::size_t CPObjectVector<T>::Find(const T& element, std::size_t afterIndex) co
     return NotFound;
 }
 
-template <class T>
-void CPObjectVector<T>::Sort(int (*compare)(const void*, const void*)) noexcept {
+template <class T> void CPObjectVector<T>::Sort(int (*compare)(const void*, const void*)) noexcept {
     Buffers::Sort::vfqsort(Elements(), GetNItems(), sizeof(T), compare);
 }
 

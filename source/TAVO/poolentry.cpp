@@ -19,8 +19,7 @@ void CreateNothing(void*, std::size_t) {}
 void Finalize(void* payload, std::size_t) { FreeUtf8(*static_cast<PoolEntry*>(payload)); }
 void* NoInterface(void*, const _acfUID&) { return nullptr; }
 
-template <std::size_t Size>
-struct StaticBlock {
+template <std::size_t Size> struct StaticBlock {
     tagCPOMEMHEADER header;
     PoolEntry entry;
     wchar_t text[Size];
@@ -32,8 +31,7 @@ constexpr unsigned long long HashOf(const char* text) {
     return crc;
 }
 
-template <std::size_t Size>
-constexpr tagCPOMEMHEADER StaticHeader() {
+template <std::size_t Size> constexpr tagCPOMEMHEADER StaticHeader() {
     const std::size_t size = sizeof(PoolEntry) + Size * sizeof(wchar_t);
     return {0, size, size, &g_entryTable};
 }
@@ -60,10 +58,14 @@ constinit const CPPoolString CPPoolString::pempty(&g_empty.header);
 
 tagCPOMEMHEADER* StaticEntry(Static which) noexcept {
     switch (which) {
-    case Static::Empty: return &g_empty.header;
-    case Static::True: return &g_true.header;
-    case Static::False: return &g_false.header;
-    default: return &g_null.header;
+    case Static::Empty:
+        return &g_empty.header;
+    case Static::True:
+        return &g_true.header;
+    case Static::False:
+        return &g_false.header;
+    default:
+        return &g_null.header;
     }
 }
 

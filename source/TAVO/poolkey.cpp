@@ -52,7 +52,8 @@ public:
 private:
     static constexpr std::uint64_t kEach = 0x0001000100010001;
 
-    // 0x80 in every unit that is A to Z; all units below 80. Adding 3F carries into bit 7 from 41 on, adding 25 from 5B on.
+    // 0x80 in every unit that is A to Z; all units below 80. Adding 3F carries into bit 7 from 41 on, adding 25 from 5B
+    // on.
     static std::uint64_t Capitals(std::uint64_t units) {
         return (units + 0x3F * kEach) & ~(units + 0x25 * kEach) & 0x80 * kEach;
     }

@@ -29,8 +29,8 @@ bool KeyOfUtf8(const unsigned char* text, std::size_t limit, Key& key, std::size
 bool KeyOfUnits(const wchar_t* text, std::size_t count, Key& key);
 
 // The key that a stored text has when it came from UTF-8: characters above FFFF, which are stored as two units without
-// the usual offset, count 2 and hash their low 16 bits. Surrogates that UTF-8 encoded one by one look the same in store;
-// `joined` tells how to read two of them in a row.
+// the usual offset, count 2 and hash their low 16 bits. Surrogates that UTF-8 encoded one by one look the same in
+// store; `joined` tells how to read two of them in a row.
 Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined);
 
 // Of exactly `count` ASCII bytes without a zero.

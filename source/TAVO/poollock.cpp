@@ -16,8 +16,9 @@ void Lock::Wait() noexcept {
             m_state.compare_exchange_weak(free, kTaken, std::memory_order_acquire))
             return;
     }
-    // Whoever sleeps has left "awaited" behind, so the holder's exchange tells it to wake somebody; that needs the mutex,
-    // which is held from the exchange here until the sleep has begun. Taking the lock as awaited may wake once in vain.
+    // Whoever sleeps has left "awaited" behind, so the holder's exchange tells it to wake somebody; that needs the
+    // mutex, which is held from the exchange here until the sleep has begun. Taking the lock as awaited may wake once
+    // in vain.
     try {
         boost::this_thread::disable_interruption waitingForTheLockIsNoInterruptionPoint;
         boost::unique_lock<boost::mutex> sleepers(m_sleepers);

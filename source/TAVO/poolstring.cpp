@@ -132,7 +132,8 @@ bool CPPoolString::Verify() const noexcept {
 
 namespace {
 
-// Each comparison has one body over {text, length}; a handle gives its entry's, raw text what stands before its terminator.
+// Each comparison has one body over {text, length}; a handle gives its entry's, raw text what stands before its
+// terminator.
 struct Operand {
     const wchar_t* text; // null: the null string
     std::size_t length;

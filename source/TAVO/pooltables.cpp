@@ -145,8 +145,8 @@ long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObj
     return detail::WideCompareN(a.text, b.text, kComparedUnits);
 }
 
-// The argument, the walk and the table hold the entry: with a count of 3 nobody else does. Then no handle is left to copy
-// from, and look-ups need the lock, so the verdict stays true while the lock is held.
+// The argument, the walk and the table hold the entry: with a count of 3 nobody else does. Then no handle is left to
+// copy from, and look-ups need the lock, so the verdict stays true while the lock is held.
 bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
     PoolEntry& entry = *Block::PayloadOf<PoolEntry>(item);
     const auto held = static_cast<std::int32_t>(item.lockcnt());

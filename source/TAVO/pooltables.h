@@ -8,8 +8,8 @@
 
 namespace TAVO::String {
 
-// Groups by case-insensitive hash. It counts no entry: otherwise no first variant could ever be swept. An entry that goes
-// leaves its group first.
+// Groups by case-insensitive hash. It counts no entry: otherwise no first variant could ever be swept. An entry that
+// goes leaves its group first.
 class CCaseInsensitiveHash final : public Lookup::CBaseHashTable {
 public:
     CCaseInsensitiveHash();

@@ -8,7 +8,7 @@
 #include <TAVO/config.h>
 
 #if (defined(__SSE2__) || defined(_M_X64)) && !defined(TAVO_NO_SIMD)
-#include <emmintrin.h>
+#include <tmmintrin.h>
 #define TAVO_SSE2 1
 #endif
 
@@ -28,6 +28,8 @@ TAVO_INLINE Block All8(int value) { return _mm_set1_epi8(static_cast<char>(value
 TAVO_INLINE Block All16(int value) { return _mm_set1_epi16(static_cast<short>(value)); }
 TAVO_INLINE Block And(Block a, Block b) { return _mm_and_si128(a, b); }
 TAVO_INLINE Block Or(Block a, Block b) { return _mm_or_si128(a, b); }
+// b without the bits of a.
+TAVO_INLINE Block AndNot(Block a, Block b) { return _mm_andnot_si128(a, b); }
 TAVO_INLINE Block Equal8(Block a, Block b) { return _mm_cmpeq_epi8(a, b); }
 TAVO_INLINE Block Equal16(Block a, Block b) { return _mm_cmpeq_epi16(a, b); }
 // Unsigned a >= b.
@@ -35,7 +37,6 @@ TAVO_INLINE Block AtLeast8(Block a, Block b) { return _mm_cmpeq_epi8(_mm_max_epu
 // Signed a < b.
 TAVO_INLINE Block Below8(Block a, Block b) { return _mm_cmplt_epi8(a, b); }
 TAVO_INLINE Block Subtract8(Block a, Block b) { return _mm_sub_epi8(a, b); }
-TAVO_INLINE Block Add16(Block a, Block b) { return _mm_add_epi16(a, b); }
 template <int bits> TAVO_INLINE Block ShiftLeft16(Block a) { return _mm_slli_epi16(a, bits); }
 template <int bits> TAVO_INLINE Block ShiftRight16(Block a) { return _mm_srli_epi16(a, bits); }
 // One bit per byte: its highest.
@@ -45,14 +46,47 @@ TAVO_INLINE Block WidenLow(Block a) { return _mm_unpacklo_epi8(a, _mm_setzero_si
 TAVO_INLINE Block WidenHigh(Block a) { return _mm_unpackhi_epi8(a, _mm_setzero_si128()); }
 // Bytes of two blocks of 16-bit units below 100, in order.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
+TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
+// 32-bit lanes.
+TAVO_INLINE Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
+    return _mm_set_epi32(static_cast<int>(d), static_cast<int>(c), static_cast<int>(b), static_cast<int>(a));
+}
+TAVO_INLINE Block All32(std::uint32_t value) { return _mm_set1_epi32(static_cast<int>(value)); }
+template <int bits> TAVO_INLINE Block ShiftLeft32(Block a) { return _mm_slli_epi32(a, bits); }
+template <int bits> TAVO_INLINE Block ShiftRight32(Block a) { return _mm_srli_epi32(a, bits); }
+template <int bits> TAVO_INLINE Block ShiftRight64(Block a) { return _mm_srli_epi64(a, bits); }
+// The low 16 bits of the four 32-bit lanes, in the low half.
+TAVO_INLINE Block Low16Of32(Block a) {
+    a = _mm_shufflehi_epi16(_mm_shufflelo_epi16(a, _MM_SHUFFLE(3, 3, 2, 0)), _MM_SHUFFLE(3, 3, 2, 0));
+    return _mm_shuffle_epi32(a, _MM_SHUFFLE(3, 3, 2, 0));
+}
+// The 16-bit units as 32-bit lanes, low and high half.
+TAVO_INLINE Block Widen32Low(Block a) { return _mm_unpacklo_epi16(a, _mm_setzero_si128()); }
+TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzero_si128()); }
+TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
+// Lanes of 16-bit numbers from -128 to 127 as bytes.
+TAVO_INLINE Block PackSigned(Block a, Block b) { return _mm_packs_epi16(a, b); }
 // The sum of all unsigned bytes.
 TAVO_INLINE std::size_t Sum8(Block a) {
     const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
     return static_cast<std::size_t>(_mm_cvtsi128_si64(halves) + _mm_cvtsi128_si64(_mm_srli_si128(halves, 8)));
 }
 
+// Moving bytes by a table needs SSSE3, which nearly every processor has: functions marked TAVO_SHUFFLES may call
+// Shuffle, and may be called when HasShuffle() is true.
+#if defined(_MSC_VER)
+#define TAVO_SHUFFLES
+inline bool HasShuffle() { return false; }
+#else
+#define TAVO_SHUFFLES __attribute__((target("ssse3")))
+inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
+#endif
+// Byte i of the result is byte index[i]; 0 for an index with the highest bit.
+TAVO_SHUFFLES inline Block Shuffle(Block a, Block index) { return _mm_shuffle_epi8(a, index); }
+
 #else
 
+#define TAVO_SHUFFLES
 struct Block {
     std::uint8_t b[16];
 };
@@ -89,6 +123,9 @@ inline Block And(Block a, Block b) {
 inline Block Or(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x | y; });
 }
+inline Block AndNot(Block a, Block b) {
+    return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return ~x & y; });
+}
 inline Block Equal8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x == y ? 0xFF : 0; });
 }
@@ -104,9 +141,45 @@ inline Block Below8(Block a, Block b) {
 inline Block Subtract8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x - y; });
 }
-inline Block Add16(Block a, Block b) {
-    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x + y; });
+inline Block Subtract16(Block a, Block b) {
+    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x - y; });
 }
+inline Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
+    const std::uint32_t lanes[] = {a, b, c, d};
+    return Load(lanes);
+}
+inline Block All32(std::uint32_t value) { return Lanes32(value, value, value, value); }
+template <int bits> Block ShiftLeft32(Block a) {
+    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x << bits; });
+}
+template <int bits> Block ShiftRight32(Block a) {
+    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x >> bits; });
+}
+template <int bits> Block ShiftRight64(Block a) {
+    return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x >> bits; });
+}
+inline Block Low16Of32(Block a) {
+    Block x{};
+    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 2, a.b + i * 4, 2);
+    return x;
+}
+inline Block Widen32Low(Block a) {
+    Block x{};
+    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 4, a.b + i * 2, 2);
+    return x;
+}
+inline bool HasShuffle() { return true; }
+inline Block Shuffle(Block a, Block index) {
+    Block x;
+    for (int i = 0; i < 16; ++i) x.b[i] = index.b[i] & 0x80 ? 0 : a.b[index.b[i] & 15];
+    return x;
+}
+inline Block HighHalf(Block a) {
+    Block x{};
+    std::memcpy(x.b, a.b + 8, 8);
+    return x;
+}
+inline Block Widen32High(Block a) { return Widen32Low(HighHalf(a)); }
 template <int bits> Block ShiftLeft16(Block a) {
     return detail::Map<std::uint16_t>(a, a, [](int x, int) { return x << bits; });
 }
@@ -133,6 +206,7 @@ inline Block Narrow(Block a, Block b) {
     for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
     return x;
 }
+inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
 inline std::size_t Sum8(Block a) {
     std::size_t sum = 0;
     for (std::uint8_t byte : a.b) sum += byte;
@@ -140,6 +214,13 @@ inline std::size_t Sum8(Block a) {
 }
 
 #endif
+
+// Set bits, without the processor's instruction, which the baseline lacks.
+inline std::size_t CountBits(std::uint64_t x) {
+    x -= (x >> 1) & 0x5555555555555555;
+    x = (x & 0x3333333333333333) + ((x >> 2) & 0x3333333333333333);
+    return static_cast<std::size_t>((((x + (x >> 4)) & 0x0F0F0F0F0F0F0F0F) * 0x0101010101010101) >> 56);
+}
 
 // The index of the first zero unit, at most n.
 #if defined(TAVO_SSE2)

@@ -30,10 +30,10 @@ namespace {
 
 // The one sort behind both spellings. Ranges are inclusive, in element indexes; the order of equal elements is visible
 // to callers, so every step is fixed.
-template <class Order>
-class Sorter {
+template <class Order> class Sorter {
 public:
-    Sorter(void* base, std::size_t size, Order order) : m_base(static_cast<char*>(base)), m_size(size), m_order(order) {}
+    Sorter(void* base, std::size_t size, Order order)
+        : m_base(static_cast<char*>(base)), m_size(size), m_order(order) {}
 
     void Run(std::size_t count) {
         Range pending[64]; // the larger part waits, so the depth stays below the bits of the count
@@ -125,8 +125,7 @@ private:
     Order m_order;
 };
 
-template <class Order>
-void Quicksort(void* base, std::size_t count, std::size_t size, Order order) noexcept {
+template <class Order> void Quicksort(void* base, std::size_t count, std::size_t size, Order order) noexcept {
     if (count < 2 || size == 0) return;
     try {
         Sorter<Order>(base, size, order).Run(count);

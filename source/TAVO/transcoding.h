@@ -139,6 +139,7 @@ struct Extent {
     std::size_t source = 0;     // its units
     std::size_t characters = 0; // its characters; a pair is one
     std::size_t target = 0;     // the units it converts to: UTF-16 of UTF-8, UTF-8 of UTF-16
+    bool beyond = false;        // it holds a value above 10FFFF, which measures 2 units and has no form
     Ending ending = Ending::Length;
 };
 
@@ -146,11 +147,12 @@ Extent MeasureUtf8(const unsigned char* text, std::size_t length);
 Extent MeasureUtf16(const wchar_t* text, std::size_t length);
 Extent MeasureUtf16(const unsigned short* text, std::size_t length);
 
-// Convert `length` units that were measured, writing no more than the measured target units. UTF-8 may hold a value
-// above 10FFFF, which measures 2 units and has no form: false then, with `out` behind what was written before it.
-bool ConvertUtf8(const unsigned char* text, std::size_t length, wchar_t*& out);
-bool ConvertUtf8(const unsigned char* text, std::size_t length, unsigned short*& out);
-void ConvertUtf16(const wchar_t* text, std::size_t length, unsigned char*& out);
-void ConvertUtf16(const unsigned short* text, std::size_t length, unsigned char*& out);
+// Convert a measured text (`source` and `target` of the extent); `out` ends behind what was written, and nothing behind
+// the measured target units is touched. False: a value above 10FFFF was met, `out` is behind the units before it; what
+// is behind those is untouched if `beyond` is set, else undefined.
+bool ConvertUtf8(const unsigned char* text, const Extent& extent, wchar_t*& out);
+bool ConvertUtf8(const unsigned char* text, const Extent& extent, unsigned short*& out);
+void ConvertUtf16(const wchar_t* text, const Extent& extent, unsigned char*& out);
+void ConvertUtf16(const unsigned short* text, const Extent& extent, unsigned char*& out);
 
 } // namespace TAVO::String::detail

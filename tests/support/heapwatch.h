@@ -20,8 +20,7 @@ public:
 
 // Runs `body` with the first, second, third ... allocation failing until it runs through with none refused.
 // `body` must check that objects stay usable; that nothing leaks is checked here.
-template <class Body>
-void ForEachFailingAllocation(Body body, int limit = 10000) {
+template <class Body> void ForEachFailingAllocation(Body body, int limit = 10000) {
     for (int allowed = 0; allowed < limit; ++allowed) {
         const auto before = LiveBlocks();
         bool refused;

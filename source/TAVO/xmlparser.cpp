@@ -1,0 +1,727 @@
+// The parser. One pass, no recursion: open elements wait on a stack of the parser's own.
+
+#include "xmlparser.h"
+
+#include "scratch.h"
+#include "transcoding.h"
+#include "xmlnames.h"
+#include "xmlstrings.h"
+
+namespace TAVO::XML::detail {
+
+namespace {
+
+using namespace String::detail; // stepping and folding of text
+
+// The inclusive ranges of characters that a reference may name.
+struct CharacterRange {
+    ulong32 first, last;
+};
+constexpr CharacterRange kCharacters[] = {{0x09, 0x09},   {0x0A, 0x0A},     {0x0D, 0x0D},
+                                          {0x20, 0xD7FF}, {0xE000, 0xFFFD}, {0x10000, 0x10FFFF}};
+
+constexpr bool IsCharacter(ulong32 value) {
+    for (const CharacterRange& range : kCharacters)
+        if (value >= range.first && value <= range.last) return true;
+    return false;
+}
+
+// From here on a character cannot be interned from wide text: its first unit would lie in the low surrogates.
+constexpr ulong32 kFirstUninternable = 0x100000;
+
+// Up to this many attributes names are compared one by one, above it by a table.
+constexpr std::size_t kFewAttributes = 16;
+
+template <class Unit> class Parser {
+public:
+    Parser(const Unit* text, std::size_t units) : m_begin(text), m_end(text + units), m_at(text) {}
+    Parser(const Parser&) = delete;
+    Parser& operator=(const Parser&) = delete;
+    ~Parser() {
+        for (std::size_t i = 0; i < m_children.Count(); ++i) Buffers::Block::Free(m_children[i]);
+        for (std::size_t i = 0; i < m_open.Count(); ++i) Buffers::Block::Free(m_open[i].node);
+        DropAttributes();
+    }
+
+    ParseResult Run() {
+        ParseResult result;
+        if (Document()) {
+            result.root = std::move(m_root);
+        } else {
+            result.code = m_code;
+            result.offset = static_cast<std::size_t>(m_errorAt - m_begin);
+        }
+        return result;
+    }
+
+private:
+    static constexpr bool kUtf8 = sizeof(Unit) == 1;
+
+    // What an element's content has shown itself to be.
+    enum class Content : std::uint8_t { Open, Children, Data, DataEnded };
+
+    struct OpenElement {
+        tagCPOMEMHEADER* node;
+        const Unit* name; // as the start tag spelt it
+        std::size_t nameUnits;
+        std::size_t firstChild; // in m_children
+        Content content;
+    };
+
+    enum class TagEnd { Open, Empty, Instruction };
+
+    // --- errors ------------------------------------------------------------------------------------------------------
+
+    TAVO_NOINLINE bool Fail(ErrorCode code, const Unit* at) {
+        m_code = code;
+        m_errorAt = at;
+        return false;
+    }
+    bool OutOfMemory() { return Fail(kDomError, m_at); }
+
+    // --- looking ahead
+    // -------------------------------------------------------------------------------------------------
+
+    bool AtEnd() const { return m_at == m_end; }
+
+    // Whether the ASCII text `what` stands at `at`; never looks behind the end.
+    template <std::size_t Size> bool Stands(const Unit* at, const char (&what)[Size]) const {
+        if (static_cast<std::size_t>(m_end - at) < Size - 1) return false;
+        for (std::size_t i = 0; i < Size - 1; ++i)
+            if (at[i] != static_cast<Unit>(what[i])) return false;
+        return true;
+    }
+
+    // The first place from `at` on where `what` stands, null when it does not.
+    template <std::size_t Size> const Unit* Find(const Unit* at, const char (&what)[Size]) const {
+        for (; m_end - at >= static_cast<std::ptrdiff_t>(Size - 1); ++at)
+            if (*at == static_cast<Unit>(what[0]) && Stands(at, what)) return at;
+        return nullptr;
+    }
+
+    void SkipBlanks() {
+        while (m_at != m_end && IsBlank(*m_at)) ++m_at;
+    }
+
+    // --- the document
+    // --------------------------------------------------------------------------------------------------
+
+    bool Document() {
+        if (Stands(m_at, "\xEF\xBB\xBF") && kUtf8) m_at += 3;
+        if (!kUtf8 && !AtEnd() && static_cast<unsigned>(*m_at) == 0xFEFF) ++m_at;
+        SkipBlanks();
+        if (AtEnd()) return Fail(kEndOfFile, m_end);
+        for (; SkipBlanks(), !AtEnd();)
+            if (!TopLevelItem()) return false;
+        return true;
+    }
+
+    bool TopLevelItem() {
+        const Unit* tag = m_at;
+        if (*tag != '<') return Fail(kInvalidTag, tag);
+        if (tag + 1 == m_end) return Fail(kOpenEnclosure, m_end);
+        switch (tag[1]) {
+        case '!':
+            return SkipDeclaration();
+        case '?':
+            return Instruction(true);
+        case '/':
+            return tag + 2 == m_end ? Fail(kOpenEnclosure, m_end) : Fail(kBadTerminationTag, tag);
+        default:
+            if (m_root.key()) return Fail(kRootMissing, tag); // the code of a second root, by contract
+            return Element();
+        }
+    }
+
+    // The declaration is the instruction named "xml"; it counts at top level only.
+    bool Instruction(bool topLevel) {
+        const Unit* start = m_at;
+        m_at += 2;
+        const Unit* name = m_at;
+        if (!Name()) return false;
+        const bool declaration = topLevel && m_at - name == 3 && Stands(name, "xml");
+        TagEnd end;
+        if (!AttributesOf(TagEnd::Instruction, end)) return false;
+        const bool good = !declaration || Declaration(start);
+        DropAttributes();
+        return good;
+    }
+
+    bool Declaration(const Unit* start) {
+        const CPPoolString *version = FindAttribute("version"), *encoding = FindAttribute("encoding");
+        if (version && version->cmp(L"1.0") != 0) return Fail(kBadVersion, start);
+        if (!encoding) return true;
+        static constexpr const wchar_t* kUtf8Names[] = {L"UTF-8"};
+        static constexpr const wchar_t* kUtf16Names[] = {L"UTF-16", L"ISO-10646-UCS-2", L"Unicode"};
+        const wchar_t* const* names = kUtf8 ? kUtf8Names : kUtf16Names;
+        for (std::size_t i = 0; i < (kUtf8 ? std::size(kUtf8Names) : std::size(kUtf16Names)); ++i)
+            if (encoding->cmpi(names[i]) == 0) return true;
+        return Fail(kUnsupportedEncoding, start);
+    }
+
+    const CPPoolString* FindAttribute(const char* name) {
+        for (std::size_t i = 0; i < m_attributes.Count(); ++i) {
+            const wchar_t* units = AttributeAt(i).name;
+            std::size_t k = 0;
+            while (name[k] && units[k] == static_cast<unsigned char>(name[k])) ++k;
+            if (!name[k] && !units[k]) return &AttributeAt(i).value;
+        }
+        return nullptr;
+    }
+
+    // --- rules that differ from the XML recommendation, each in one place
+    // -----------------------------------------------
+
+    // Intended: "<!" runs to the next '>' outside quotes, comments at top level included, so an apostrophe in a comment
+    // opens a string and a DOCTYPE's internal subset ends at its first '>'. A textbook would look for "-->" and "]>";
+    // licence texts in comments are the usual victims, and documents that pass today are accepted by this rule.
+    bool SkipDeclaration() {
+        const Unit* start = m_at;
+        const bool comment = Stands(start, "<!--");
+        for (const Unit* at = start + 2; at != m_end; ++at) {
+            if (*at == '>') {
+                m_at = at + 1;
+                return true;
+            }
+            if (*at != '"' && *at != '\'') continue;
+            const Unit quote = *at;
+            const Unit* opened = at;
+            do ++at;
+            while (at != m_end && *at != quote);
+            if (at == m_end) return Fail(kOpenString, opened);
+        }
+        return comment ? Fail(kOpenComment, start) : Fail(kEndOfFile, m_end);
+    }
+
+    // Inside an element a comment ends at "-->", which may not overlap "<!--".
+    bool SkipComment() {
+        const Unit* end = Find(m_at + 4, "-->");
+        if (!end) return Fail(kOpenComment, m_at);
+        m_at = end + 3;
+        return true;
+    }
+
+    // Intended: the look-up of the five predefined references stops at the first that does NOT match in full and takes
+    // its character: "&lt;" gives '>', every other reference '<', and three units are skipped either way. A textbook
+    // would stop at the match; stored documents were read, and their texts compared, by this rule. Requires: m_at at
+    // the '&'. The character goes to `value`.
+    bool PredefinedReference(ulong32& value) {
+        const Unit* body = m_at + 1;
+        constexpr std::ptrdiff_t kSkipped = 3; // "lt;" and "gt;"
+        value = Stands(body, "lt;") ? '>' : '<';
+        if (m_end - body < kSkipped) return Fail(kEndOfFile, m_end);
+        // The skip counts units and may end inside a character.
+        const Unit* at = body;
+        while (at < body + kSkipped) {
+            const std::size_t units = CharacterUnits(at);
+            at += units ? units : 1;
+        }
+        m_at = body + kSkipped;
+        return at == m_at || Fail(kIllegalCharacter, m_at);
+    }
+
+    // Intended: the hexadecimal form begins its digits at the 'x', finds none and yields 0, so it always fails; and ':'
+    // counts as a digit of value 10. A textbook would read hexadecimal digits and refuse the colon.
+    // Requires: m_at at the '&' of "&#".
+    bool NumericReference(ulong32& value) {
+        const Unit* start = m_at;
+        const Unit* at = start + 2;
+        value = 0;
+        constexpr ulong32 kTooLarge = 0x110000;
+        for (; at != m_end && *at >= '0' && *at <= ':'; ++at)
+            if ((value = value * 10 + (*at - '0')) > kTooLarge) value = kTooLarge; // saturates: never wraps into range
+        if (at == m_end || *at != ';' || !IsCharacter(value)) return Fail(kBadEscape, start);
+        if (value >= kFirstUninternable) return Fail(kIllegalCharacter, start);
+        m_at = at + 1;
+        return true;
+    }
+
+    // Content is children or data; text beside children is refused. After a child nothing but markup may come.
+    bool MixedContent(const Unit* at) { return Fail(kMixedContent, at); }
+
+    // --- names
+    // ---------------------------------------------------------------------------------------------------------
+
+    // Moves behind the name at m_at.
+    bool Name() {
+        if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        const Unit* start = m_at;
+        ulong32 value;
+        const Unit* at = m_at;
+        if (!NameCharacter(at, value) || !IsNameStart(value)) return Fail(kInvalidTag, start);
+        do m_at = at;
+        while (m_at != m_end && NameCharacter(at, value) && IsNameChar(value));
+        return true;
+    }
+
+    // Decodes the character at `at`, never reading behind the end; false where none stands that a name could hold.
+    bool NameCharacter(const Unit*& at, ulong32& value) const {
+        value = *at;
+        if (TAVO_LIKELY(value < 0x80)) {
+            ++at;
+            return true;
+        }
+        if constexpr (kUtf8) return StepUtf8(value, at); // validated, so whole
+        if (IsSurrogate(*at)) return false;
+        ++at;
+        return true;
+    }
+
+    CPPoolString InternName(const Unit* name, std::size_t units) {
+        if (IsAscii(name, units)) return m_names.Get(name, units);
+        m_text.Cut(0);
+        for (const Unit* at = name; at < name + units;) {
+            ulong32 value;
+            NameCharacter(at, value);
+            if (!m_text.Push(static_cast<wchar_t>(value))) return {};
+        }
+        return String::pool::InternWide(m_text.First(), m_text.Count());
+    }
+
+    static bool IsAscii(const Unit* text, std::size_t units) {
+        for (std::size_t i = 0; i < units; ++i)
+            if (text[i] >= 0x80) return false;
+        return true;
+    }
+
+    // --- tags
+    // ----------------------------------------------------------------------------------------------------------
+
+    // Reads attributes up to the end of a start tag or, with TagEnd::Instruction, of an instruction, and moves behind
+    // it.
+    bool AttributesOf(TagEnd kind, TagEnd& end) {
+        m_seen.Cut(0);
+        for (;;) {
+            SkipBlanks();
+            if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+            const Unit c = *m_at;
+            if (kind == TagEnd::Instruction) {
+                if (c == '?') return Close("?>", TagEnd::Instruction, end);
+                if (c == '>') return Fail(kOpenEnclosure, m_at);
+            } else {
+                if (c == '>') return Close(">", TagEnd::Open, end);
+                if (c == '/') return Close("/>", TagEnd::Empty, end);
+            }
+            if (c == '<') return Fail(kOpenEnclosure, m_at);
+            if (!AttributeHere()) return false;
+        }
+    }
+
+    template <std::size_t Size> bool Close(const char (&mark)[Size], TagEnd kind, TagEnd& end) {
+        if (!Stands(m_at, mark)) return Fail(kOpenEnclosure, m_at + 1);
+        m_at += Size - 1;
+        end = kind;
+        return true;
+    }
+
+    bool AttributeHere() {
+        const Unit* name = m_at;
+        if (!Name()) return Fail(kBadAttribute, name);
+        const auto nameUnits = static_cast<std::size_t>(m_at - name);
+        SkipBlanks();
+        if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        if (*m_at != '=') return Fail(kBadAttribute, m_at);
+        ++m_at;
+        SkipBlanks();
+        if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        if (*m_at != '"' && *m_at != '\'') return Fail(kBadAttribute, m_at);
+
+        Attribute attribute{InternName(name, nameUnits), {}};
+        if (attribute.name.isnull()) return OutOfMemory();
+        if (!Value(attribute.value)) return false;
+        if (IsDuplicate(attribute.name)) return Fail(kBadAttribute, name);
+        // An empty value is dropped: an attribute that is missing reads the same.
+        if (!attribute.value.isdef()) return true;
+        return Keep(std::move(attribute)) || OutOfMemory();
+    }
+
+    Attribute& AttributeAt(std::size_t index) { return reinterpret_cast<Attribute&>(m_attributes[index]); }
+
+    bool Keep(Attribute&& attribute) {
+        if (!m_attributes.Reserve(1)) return false;
+        RawAttribute raw;
+        ::new (static_cast<void*>(&raw)) Attribute(std::move(attribute));
+        m_attributes.Push(raw);
+        return m_attributes.Count() <= kFewAttributes || See(m_attributes.Count() - 1);
+    }
+
+    void DropAttributes() {
+        for (std::size_t i = 0; i < m_attributes.Count(); ++i) AttributeAt(i).~Attribute();
+        m_attributes.Cut(0);
+    }
+
+    bool IsDuplicate(const CPPoolString& name) {
+        const std::size_t count = m_attributes.Count();
+        if (count <= kFewAttributes) {
+            for (std::size_t i = 0; i < count; ++i)
+                if (AttributeAt(i).name == name) return true;
+            return false;
+        }
+        for (std::size_t slot = Hash(name);; ++slot) {
+            const std::uint32_t index = m_seen[slot & (m_seen.Count() - 1)];
+            if (index == 0) return false;
+            if (AttributeAt(index - 1).name == name) return true;
+        }
+    }
+
+    static std::size_t Hash(const CPPoolString& name) {
+        return (reinterpret_cast<std::size_t>(String::PoolAccess::Block(name)) >> 4) * 0x9E3779B97F4A7C15 >> 20;
+    }
+
+    // Enters attribute `index` into the table of names: open addressing, a power of two, at most half full; 0 is free.
+    bool See(std::size_t index) {
+        if (2 * (index + 1) > m_seen.Count()) {
+            const std::size_t slots = m_seen.Count() ? m_seen.Count() * 2 : 4 * kFewAttributes;
+            m_seen.Cut(0);
+            if (!m_seen.Reserve(slots)) return false;
+            for (std::size_t i = 0; i < slots; ++i) m_seen.Push(0);
+            for (std::size_t i = 0; i < index; ++i) Enter(i);
+        }
+        Enter(index);
+        return true;
+    }
+
+    void Enter(std::size_t index) {
+        std::size_t slot = Hash(AttributeAt(index).name);
+        while (m_seen[slot & (m_seen.Count() - 1)]) ++slot;
+        m_seen[slot & (m_seen.Count() - 1)] = static_cast<std::uint32_t>(index + 1);
+    }
+
+    // --- elements
+    // ------------------------------------------------------------------------------------------------------
+
+    // The element at m_at with everything below it.
+    bool Element() {
+        if (!StartTag()) return false;
+        while (!m_open.Empty())
+            if (!ContentItem()) return false;
+        return true;
+    }
+
+    bool StartTag() {
+        ++m_at;
+        const Unit* name = m_at;
+        if (!Name()) return false;
+        const auto nameUnits = static_cast<std::size_t>(m_at - name);
+        tagCPOMEMHEADER* node = NewNode();
+        if (!node) return OutOfMemory();
+        if (!m_open.Push({node, name, nameUnits, m_children.Count(), Content::Open})) {
+            Buffers::Block::Free(node);
+            return OutOfMemory();
+        }
+        TagEnd end;
+        if (!AttributesOf(TagEnd::Open, end)) return false;
+        Node& element = NodeOf(node);
+        element.name = InternName(name, nameUnits);
+        if (element.name.isnull()) return OutOfMemory();
+        if (!m_attributes.Empty()) {
+            if (!Attributes::Build(element.attributes, &AttributeAt(0), m_attributes.Count())) return OutOfMemory();
+            m_attributes.Cut(0); // moved
+        }
+        return end != TagEnd::Empty || FinishElement();
+    }
+
+    // The innermost open element is complete: it gets its children and becomes a child of the next one, or the root.
+    bool FinishElement() {
+        const OpenElement element = m_open.Last();
+        const std::size_t children = m_children.Count() - element.firstChild;
+        if (children) {
+            Node& node = NodeOf(element.node);
+            auto* run =
+                reinterpret_cast<CPXMLObject*>(m_children.First() + element.firstChild); // a handle is one pointer
+            if (!Elements::Build(node.elements, run, children)) return OutOfMemory();
+            node.contentKind = kElements;
+            m_children.Cut(element.firstChild); // moved
+        }
+        if (m_open.Count() == 1) {
+            m_open.Cut(0);
+            m_root = NodeAccess::Adopt(element.node);
+            return true;
+        }
+        if (!m_children.Push(element.node)) return OutOfMemory();
+        m_open.Cut(m_open.Count() - 1);
+        return true;
+    }
+
+    // One item of the innermost open element's content.
+    bool ContentItem() {
+        OpenElement& element = m_open.Last();
+        SkipBlanks();
+        if (AtEnd()) return Fail(kEndOfFile, m_end);
+        const Unit* at = m_at;
+        if (*at != '<') return element.content == Content::Open ? Data() : MixedContent(at);
+        if (at + 1 == m_end) return Fail(kOpenEnclosure, m_end);
+        switch (at[1]) {
+        case '/':
+            return EndTag();
+        case '?':
+            return Instruction(false);
+        case '!':
+            if (Stands(at, "<![CDATA[")) return element.content == Content::Open ? Data() : MixedContent(at);
+            return Stands(at, "<!--") ? SkipComment() : SkipDeclaration();
+        default:
+            if (element.content == Content::DataEnded) return MixedContent(at);
+            element.content = Content::Children;
+            return StartTag();
+        }
+    }
+
+    bool EndTag() {
+        const OpenElement& element = m_open.Last();
+        const Unit* tag = m_at;
+        // After data a wrong end tag is mixed content by its code.
+        const ErrorCode wrong = element.content == Content::DataEnded ? kMixedContent : kBadTerminationTag;
+        m_at += 2;
+        if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        const Unit* name = m_at;
+        if (static_cast<std::size_t>(m_end - name) > element.nameUnits && name[element.nameUnits] == '>' &&
+            std::memcmp(name, element.name, element.nameUnits * sizeof(Unit)) == 0) {
+            m_at = name + element.nameUnits + 1;
+            return FinishElement();
+        }
+        if (!Name() || !SameName(name, static_cast<std::size_t>(m_at - name), element)) return Fail(wrong, tag);
+        SkipBlanks();
+        if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        if (*m_at != '>') return Fail(kOpenEnclosure, m_at);
+        ++m_at;
+        return FinishElement();
+    }
+
+    // Names of other spelling may be the same: UTF-8 has overlong forms.
+    bool SameName(const Unit* name, std::size_t units, const OpenElement& element) {
+        if (units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0) return true;
+        return kUtf8 && !(IsAscii(name, units) && IsAscii(element.name, element.nameUnits)) &&
+               InternName(name, units) == NodeOf(element.node).name;
+    }
+
+    // --- text
+    // ----------------------------------------------------------------------------------------------------------
+
+    // The first unit from `at` on that text cannot simply run over: a blank, a control, a character above 7F, '&', or
+    // one of the two stops; the end when there is none.
+    const Unit* RunEnd(const Unit* at, Unit stop1, Unit stop2) const {
+        if constexpr (kUtf8) {
+            const auto printable = Simd::All8(0x21), reference = Simd::All8('&');
+            const auto first = Simd::All8(stop1), second = Simd::All8(stop2);
+            for (; m_end - at >= static_cast<std::ptrdiff_t>(Simd::kBlock); at += Simd::kBlock) {
+                const auto block = Simd::Load(at);
+                // Signed: bytes from 80 on are below too.
+                const auto special = Simd::Or(Simd::Or(Simd::Below8(block, printable), Simd::Equal8(block, reference)),
+                                              Simd::Or(Simd::Equal8(block, first), Simd::Equal8(block, second)));
+                if (const auto mask = Simd::Mask(special)) return at + std::countr_zero(mask);
+            }
+        }
+        while (at != m_end && static_cast<unsigned>(*at) - 0x21u < 0x5Fu && *at != '&' && *at != stop1 && *at != stop2)
+            ++at;
+        return at;
+    }
+
+    // Whether text may run over the blank at `at`: a single space with something printable on both sides.
+    bool IsSingleSpace(const Unit* at, const Unit* start, Unit stop) const {
+        return *at == ' ' && at != start && at + 1 != m_end && static_cast<unsigned>(at[1]) > 0x20 && at[1] != stop;
+    }
+
+    // The value at m_at, quotes included.
+    bool Value(CPPoolString& value) {
+        const Unit* opened = m_at;
+        const Unit quote = *opened;
+        const Unit* start = opened + 1;
+        const Unit* at = start;
+        for (;;) {
+            at = RunEnd(at, quote, quote);
+            if (at == m_end) return Fail(kOpenString, opened);
+            if (*at == quote) break;
+            if (!IsSingleSpace(at, start, quote)) return ValueInPieces(value);
+            ++at;
+        }
+        m_at = at + 1;
+        value = at == start ? CPPoolString::pempty : m_values.Get(start, static_cast<std::size_t>(at - start));
+        return !value.isnull() || OutOfMemory();
+    }
+
+    // A value with references, runs of blanks or characters above 7F.
+    bool ValueInPieces(CPPoolString& value) {
+        const Unit* opened = m_at++;
+        BeginText();
+        while (!AtEnd() && *m_at != *opened)
+            if (!Character()) return false;
+        if (AtEnd()) return Fail(kOpenString, opened);
+        ++m_at;
+        return EndText(value);
+    }
+
+    // The data at m_at, up to and including the element's end tag or what else may follow it.
+    bool Data() {
+        OpenElement& element = m_open.Last();
+        const Unit* start = m_at;
+        for (const Unit* at = start;;) {
+            at = RunEnd(at, '<', ']');
+            if (at == m_end) break;
+            if (*at == '<') {
+                // Nearly always the whole data stands here as it is.
+                if (at == start || !Stands(at, "</")) break;
+                CPPoolString data = m_values.Get(start, static_cast<std::size_t>(at - start));
+                m_at = at;
+                return StoreData(element, std::move(data));
+            }
+            if (*at == ']') {
+                if (Stands(at, "]]>")) return Fail(kBadDataTerminator, at);
+            } else if (!IsSingleSpace(at, start, '<')) {
+                break;
+            }
+            ++at;
+        }
+        return DataInPieces(element);
+    }
+
+    bool DataInPieces(OpenElement& element) {
+        BeginText();
+        for (;;) {
+            if (AtEnd()) return Fail(kEndOfFile, m_end);
+            if (*m_at == '<') {
+                if (Stands(m_at, "<![CDATA[")) {
+                    if (!CDataSection()) return false;
+                } else if (Stands(m_at, "<!--")) {
+                    if (!SkipComment()) return false;
+                } else if (Stands(m_at, "<!")) {
+                    if (!SkipDeclaration()) return false;
+                } else {
+                    break; // an end tag, an instruction, or a child that must not be
+                }
+            } else if (*m_at == ']' && Stands(m_at, "]]>")) {
+                return Fail(kBadDataTerminator, m_at);
+            } else if (!Character()) {
+                return false;
+            }
+        }
+        CPPoolString data;
+        return EndText(data) && StoreData(element, std::move(data));
+    }
+
+    bool StoreData(OpenElement& element, CPPoolString&& data) {
+        element.content = Content::DataEnded;
+        if (data.isnull()) return OutOfMemory();
+        if (!data.isdef()) return true; // empty sections are no data
+        Node& node = NodeOf(element.node);
+        node.data = std::move(data);
+        node.contentKind = kData;
+        return true;
+    }
+
+    bool CDataSection() {
+        const Unit* start = m_at;
+        const Unit* end = Find(start + 9, "]]>");
+        if (!end) return Fail(kOpenCData, start);
+        for (m_at = start + 9; m_at != end;)
+            if (!OneCharacter()) return false;
+        m_at = end + 3;
+        return true;
+    }
+
+    // --- text piece by piece: references, blanks, characters above 7F ------------------------------------------------
+
+    void BeginText() {
+        m_text.Cut(0);
+        m_blankPending = false;
+    }
+
+    bool EndText(CPPoolString& text) { // a pending blank is dropped
+        text = String::pool::InternWide(m_text.First(), m_text.Count());
+        return !text.isnull() || OutOfMemory();
+    }
+
+    // The next character of text or value: source blanks collapse, and are dropped where nothing stands before or
+    // behind.
+    bool Character() {
+        if (IsBlank(*m_at)) {
+            m_blankPending = true;
+            ++m_at;
+            return true;
+        }
+        if (*m_at != '&') return OneCharacter();
+        ulong32 value;
+        const bool numeric = m_end - m_at > 1 && m_at[1] == '#';
+        return (numeric ? NumericReference(value) : PredefinedReference(value)) && Put(value);
+    }
+
+    // Units of the good character at `at`; 0 for a bad one, which only UTF-16 can have after validation.
+    std::size_t CharacterUnits(const Unit* at) const {
+        const auto left = static_cast<std::size_t>(m_end - at);
+        if constexpr (kUtf8)
+            return Utf8Sequence(at, left);
+        else
+            return Utf16Sequence(at, left);
+    }
+
+    // One source character as it stands.
+    bool OneCharacter() {
+        const std::size_t units = CharacterUnits(m_at);
+        if (units == 0) return Fail(kIllegalCharacter, m_at);
+        if constexpr (kUtf8) {
+            ulong32 value;
+            const Unit* at = m_at;
+            StepUtf8(value, at);
+            // A zero would end the text in the pool; encoded surrogates and what lies too high have no wide form.
+            if (value == 0 || (value >= 0xD800 && value <= 0xDFFF) || value >= kFirstUninternable)
+                return Fail(kIllegalCharacter, m_at);
+            m_at = at;
+            return Put(value);
+        } else {
+            // Copied unit by unit, pairs included, so that nothing is lost.
+            if (!PutBlank()) return false;
+            for (std::size_t i = 0; i < units; ++i)
+                if (!m_text.Push(m_at[i])) return OutOfMemory();
+            m_at += units;
+            return true;
+        }
+    }
+
+    bool PutBlank() {
+        const bool put = m_blankPending && !m_text.Empty();
+        m_blankPending = false;
+        return !put || m_text.Push(L' ') || OutOfMemory();
+    }
+
+    bool Put(ulong32 value) {
+        if (!PutBlank() || !m_text.Reserve(2)) return OutOfMemory();
+        wchar_t units[2], *end = units;
+        EncodeUtf16(end, value);
+        for (const wchar_t* unit = units; unit < end; ++unit) m_text.Push(*unit);
+        return true;
+    }
+
+    // --- state
+    // ---------------------------------------------------------------------------------------------------------
+
+    // Room for an Attribute that is moved bitwise.
+    struct RawAttribute {
+        alignas(Attribute) unsigned char bytes[sizeof(Attribute)];
+    };
+
+    const Unit* m_begin;
+    const Unit* m_end;
+    const Unit* m_at;
+    ErrorCode m_code = kSuccess;
+    const Unit* m_errorAt = nullptr;
+
+    CPXMLObject m_root;
+    Scratch<OpenElement> m_open;
+    Scratch<tagCPOMEMHEADER*> m_children; // finished elements whose parents are open, the outermost parent's first
+    Scratch<RawAttribute> m_attributes;   // of the tag that is being read
+    Scratch<std::uint32_t> m_seen;        // hash table over m_attributes, used above kFewAttributes
+    Scratch<wchar_t> m_text;              // the text that is being put together
+    bool m_blankPending = false;
+    StringCache<256> m_names;
+    StringCache<1024> m_values;
+};
+
+template <class Unit> ParseResult ParseText(const Unit* text, std::size_t units) noexcept {
+    return Parser<Unit>(text, units).Run();
+}
+
+} // namespace
+
+ParseResult Parse(const unsigned char* text, std::size_t units) noexcept { return ParseText(text, units); }
+ParseResult Parse(const wchar_t* text, std::size_t units) noexcept { return ParseText(text, units); }
+
+} // namespace TAVO::XML::detail

@@ -1,0 +1,169 @@
+// Linux: the reader of configuration files, UTF-8 as the code page, and library names.
+
+#include "platform/platform.h"
+
+#include <cstring>
+#include <fstream>
+#include <gtest/gtest.h>
+#include <string>
+#include <sys/mman.h>
+#include <unistd.h>
+#include <vector>
+
+using namespace TAVO;
+
+namespace {
+
+// What the reader finds for the key "Level" of section "Debug" in a file with this content.
+int ReadLevel(const std::string& content) {
+    char path[] = "/tmp/tavo_ini_XXXXXX";
+    close(mkstemp(path));
+    std::ofstream(path, std::ios::binary) << content;
+    const std::vector<wchar_t> wide(path, path + sizeof path);
+    const int value = Platform::ReadConfigurationInteger(wide.data(), L"Debug", L"Level");
+    unlink(path);
+    return value;
+}
+
+std::string Utf16File(const char* text) {
+    std::string bytes = "\xFF\xFE";
+    for (; *text; ++text) (bytes += *text) += '\0';
+    return bytes;
+}
+
+} // namespace
+
+TEST(ConfigurationFile, ReadsWhatTheOtherSystemReads) {
+    const struct {
+        const char* content;
+        int value;
+    } rows[] = {
+        {"[Debug]\nLevel=5\n", 5},
+        {"[Debug]\r\nLevel=5", 5},
+        {"[DEBUG]\nLEVEL=5\n", 5},
+        {"  [ Debug ] ; ours\n\t Level \t=\t 5 \t\r\n", 5},
+        {"[Debug]\nLevel=-5\n", -5},
+        {"[Debug]\nLevel=+5\n", 5},
+        {"[Debug]\nLevel=0x1F\n", 31},
+        {"[Debug]\nLevel=0X1f\n", 31},
+        {"[Debug]\nLevel=12ab\n", 12},
+        {"[Debug]\nLevel=abc\n", 0},
+        {"[Debug]\nLevel=\n", 0},
+        {"[Debug]\nLevel=-\n", 0},
+        {"[Debug]\nLevel=\"7\"\n", 7},
+        {"[Debug]\nLevel=\"\n", 0},
+        {"[Debug]\nLevel=4294967297\n", 1},
+        {"[Debug]\nLevel 5\n", 0},
+        {"[Debug]\n;Level=5\nLevel=6\n", 6},
+        {"[Debug]\nLevel=5\nLevel=6\n", 5},
+        {"[Debug]\nLevels=5\nLeve=6\n", 0},
+        {"[Debu]\nLevel=5\n[Debugs]\nLevel=6\n", 0},
+        {"Level=5\n[Other]\nLevel=6\n", 0},
+        {"[Other]\nLevel=6\n[Debug]\nLevel=5\n", 5},
+        {"[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
+        {"\xEF\xBB\xBF[Debug]\nLevel=5\n", 5},
+        {"[Debug\nLevel=5\n", 5},
+        {"[", 0},
+        {"=", 0},
+        {"\n\n\r\n", 0},
+        {"", 0},
+    };
+    for (const auto& row : rows) EXPECT_EQ(ReadLevel(row.content), row.value) << row.content;
+    EXPECT_EQ(ReadLevel(Utf16File("[Debug]\r\nLevel=5\r\n")), 5);
+    EXPECT_EQ(ReadLevel(std::string("\xFF\xFE\x5B", 3)), 0);
+    EXPECT_EQ(ReadLevel(std::string(70000, '\n') + "[Debug]\nLevel=5\n"), 0) << "only the first 64 KiB are read";
+    EXPECT_EQ(Platform::ReadConfigurationInteger(L"/tmp/no such file.ini", L"Debug", L"Level"), 0);
+}
+
+TEST(ConfigurationFile, ReadsNothingBehindACut) {
+    const std::string content = "[Debug]\nA=1\nLevel=\"0x15\"";
+    for (std::size_t length = 0; length < content.size() - 5; ++length)
+        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0);
+}
+
+TEST(ConfigurationPath, DropsVersionDigits) {
+    const struct {
+        const wchar_t* path;
+        std::size_t stem;
+    } rows[] = {
+        {L"/lib/libTAVO.so", 12},
+        {L"/lib/libTAVO.so.1", 12},
+        {L"/lib/libTAVO.so.1.20.3", 12},
+        {L"/lib/a-1.2.so.3", 10},
+        {L"/lib/libTAVO.1.2", 14},
+        {L"/lib/libTAVO.so.", 15},
+        {L"/lib/libTAVO.so.x1", 15},
+        {L"/a.b/libTAVO", 0},
+        {L"/a.so.1/lib", 0},
+        {L".so", 0},
+        {L"", 0},
+    };
+    for (const auto& row : rows) {
+        std::size_t length = 0;
+        while (row.path[length]) ++length;
+        EXPECT_EQ(Platform::FindConfigurationStem(row.path, length), row.stem) << row.stem;
+    }
+}
+
+TEST(CodePage, IsUtf8) {
+    const struct {
+        const char* narrow;
+        const wchar_t* wide;
+    } rows[] = {
+        {"\x7F\xC2\x80\xDF\xBF", L"\x7F\x80\x7FF"},
+        {"\xE0\xA0\x80\xED\x9F\xBF\xEE\x80\x80\xEF\xBF\xBF", L"\x800\xD7FF\xE000\xFFFF"},
+        {"\xF0\x90\x80\x80\xF4\x8F\xBF\xBF", L"\xD800\xDC00\xDBFF\xDFFF"},
+    };
+    for (const auto& row : rows) {
+        wchar_t wide[16];
+        char narrow[32];
+        ASSERT_GT(Platform::AnsiToWide(row.narrow, -1, wide, 16), 0);
+        EXPECT_STREQ(wide, row.wide);
+        ASSERT_GT(Platform::WideToAnsi(row.wide, -1, narrow, 32), 0);
+        EXPECT_STREQ(narrow, row.narrow);
+    }
+}
+
+TEST(CodePage, ReplacesWhatHasNoForm) {
+    const struct {
+        const char* narrow;
+        const wchar_t* wide;
+    } rows[] = {
+        {"a\x80z", L"a\xFFFDz"},
+        {"\xC0\x80", L"\xFFFD\xFFFD"}, // overlong
+        {"\xC1z", L"\xFFFDz"},
+        {"\xE0\x9F\xBF", L"\xFFFD\xFFFD\xFFFD"}, // overlong
+        {"\xED\xA0\x80", L"\xFFFD\xFFFD\xFFFD"}, // surrogate
+        {"\xF0\x8F\xBF\xBF", L"\xFFFD\xFFFD\xFFFD\xFFFD"},
+        {"\xF4\x90\x80\x80", L"\xFFFD\xFFFD\xFFFD\xFFFD"}, // above the last
+        {"\xF5\xFF", L"\xFFFD\xFFFD"},
+        {"\xE2\x82z", L"\xFFFDz"}, // one for a start that is cut short
+        {"\xF0\x9F\x98", L"\xFFFD"},
+    };
+    for (const auto& row : rows) {
+        wchar_t wide[16];
+        ASSERT_GT(Platform::AnsiToWide(row.narrow, -1, wide, 16), 0);
+        EXPECT_STREQ(wide, row.wide) << row.narrow;
+    }
+    for (const wchar_t* lone : {L"\xD800", L"\xDC00", L"\xDBFF"}) {
+        char narrow[8];
+        ASSERT_EQ(Platform::WideToAnsi(lone, -1, narrow, 8), 4);
+        EXPECT_STREQ(narrow, "\xEF\xBF\xBD");
+    }
+    char narrow[8];
+    EXPECT_EQ(Platform::WideToAnsi(L"\xD83D\xDE00", 1, narrow, 8), 3) << "a length that cuts a pair";
+    wchar_t wide[8];
+    EXPECT_EQ(Platform::AnsiToWide("\xF0\x9F\x98\x80", 4, wide, 1), 0) << "a pair needs two";
+    EXPECT_EQ(Platform::AnsiToWide("\xF0\x9F\x98\x80", 4, wide, 2), 2);
+}
+
+TEST(Memory, ProtectedPagesAreUnreadable) {
+    char* pages =
+        static_cast<char*>(mmap(nullptr, 2 * Platform::PageSize, PROT_READ, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0));
+    ASSERT_NE(pages, MAP_FAILED);
+    mprotect(pages + Platform::PageSize, Platform::PageSize, PROT_NONE);
+    EXPECT_TRUE(Platform::IsReadable(pages + Platform::PageSize - 1)) << "the last byte before";
+    EXPECT_FALSE(Platform::IsReadable(pages + Platform::PageSize));
+    munmap(pages, 2 * Platform::PageSize);
+    EXPECT_FALSE(Platform::IsReadable(pages));
+}

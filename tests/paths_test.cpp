@@ -1,0 +1,225 @@
+// Path texts: taking apart, joining, checking, creating.
+
+#include "support/heapwatch.h"
+#include "support/scratch.h"
+
+#include <algorithm>
+#include <random>
+
+using namespace TAVO::Files;
+using support::ScratchFolder;
+using support::WideText;
+
+namespace {
+
+WideText Part(const wchar_t* text, std::size_t length) { return WideText(std::vector<wchar_t>(text, text + length)); }
+
+struct ParseRow {
+    const wchar_t* path;
+    ePathRoot kind;
+    const wchar_t *root, *folder, *stem, *extension;
+};
+
+const ParseRow kParseRows[] = {
+    {L"name", PathRootNone, L"", L"", L"name", L""},
+    {L"name.ext", PathRootNone, L"", L"", L"name", L".ext"},
+    {L"a.b.c", PathRootNone, L"", L"", L"a.b", L".c"},
+    {L".profile", PathRootNone, L"", L"", L".profile", L""},
+    {L".a.b", PathRootNone, L"", L"", L".a", L".b"},
+    {L"a.", PathRootNone, L"", L"", L"a", L"."},
+    {L".", PathRootNone, L"", L"", L".", L""},
+    {L"..", PathRootNone, L"", L"", L"..", L""},
+    {L"...", PathRootNone, L"", L"", L"..", L"."},
+    {L"x/..", PathRootNone, L"", L"x/", L"..", L""},
+    {L"dir.d/name", PathRootNone, L"", L"dir.d/", L"name", L""},
+    {L"a\\b/c//d.e", PathRootNone, L"", L"a\\b/c//", L"d", L".e"},
+    {L"a/", PathRootNone, L"", L"a/", L"", L""},
+    {L"/", PathRootRooted, L"/", L"", L"", L""},
+    {L"\\a\\b.c", PathRootRooted, L"\\", L"a\\", L"b", L".c"},
+    {L"/home/x", PathRootRooted, L"/", L"home/", L"x", L""},
+    {L"C:", PathRootDriveRelative, L"C:", L"", L"", L""},
+    {L"c:a\\b", PathRootDriveRelative, L"c:", L"a\\", L"b", L""},
+    {L"C:\\", PathRootDrive, L"C:\\", L"", L"", L""},
+    {L"z:/a/b.c", PathRootDrive, L"z:/", L"a/", L"b", L".c"},
+    {L"1:\\a", PathRootNone, L"", L"1:\\", L"a", L""},
+    {L"\u00C4:\\a", PathRootNone, L"", L"\u00C4:\\", L"a", L""},
+    {L"\\\\server\\share", PathRootNetwork, L"\\\\server\\share", L"", L"", L""},
+    {L"\\\\server\\share\\a\\b.c", PathRootNetwork, L"\\\\server\\share\\", L"a\\", L"b", L".c"},
+    {L"//server/share/a", PathRootNetwork, L"//server/share/", L"", L"a", L""},
+    {L"\\\\server", PathRootRooted, L"\\", L"\\", L"server", L""},
+    {L"\\\\server\\", PathRootRooted, L"\\", L"\\server\\", L"", L""},
+    {L"\\\\server\\\\x", PathRootRooted, L"\\", L"\\server\\\\", L"x", L""},
+    {L"\\\\\\x", PathRootRooted, L"\\", L"\\\\", L"x", L""},
+    {L"\\\\?\\C:\\a", PathRootDevice, L"\\\\?\\C:\\", L"", L"a", L""},
+    {L"\\\\?\\C:a", PathRootDevice, L"\\\\?\\", L"", L"C:a", L""},
+    {L"\\\\.\\pipe\\x", PathRootDevice, L"\\\\.\\", L"pipe\\", L"x", L""},
+    {L"\\\\?\\UNC\\server\\share\\a", PathRootDevice, L"\\\\?\\UNC\\server\\share\\", L"", L"a", L""},
+    {L"\\\\?\\unc\\server\\share", PathRootDevice, L"\\\\?\\unc\\server\\share", L"", L"", L""},
+    {L"\\\\?\\UNC\\server", PathRootDevice, L"\\\\?\\", L"UNC\\", L"server", L""},
+    {L"\\\\?\\", PathRootDevice, L"\\\\?\\", L"", L"", L""},
+    {L"//./C:/x", PathRootDevice, L"//./C:/", L"", L"x", L""},
+};
+
+} // namespace
+
+TEST(ParsePath, FollowsTheTable) {
+    for (const auto& row : kParseRows) {
+        SCOPED_TRACE(testing::PrintToString(row.path));
+        tagPATHPARSEINFO parts;
+        tagCPATHPARSEINFO texts;
+        ASSERT_TRUE(FU_ParsePath(row.path, parts) && FU_ParsePath(row.path, texts));
+        EXPECT_EQ(parts.eRoot, row.kind);
+        EXPECT_EQ(texts.eRoot, row.kind);
+        EXPECT_EQ(Part(parts.pRoot, parts.nRoot), WideText(row.root));
+        EXPECT_EQ(Part(parts.pFolder, parts.nFolder), WideText(row.folder));
+        EXPECT_EQ(Part(parts.pStem, parts.nStem), WideText(row.stem));
+        EXPECT_EQ(Part(parts.pExtension, parts.nExtension), WideText(row.extension));
+        EXPECT_STREQ(*texts.sRoot, row.root);
+        EXPECT_STREQ(*texts.sFolder, row.folder);
+        EXPECT_STREQ(*texts.sStem, row.stem);
+        EXPECT_STREQ(*texts.sExtension, row.extension);
+        EXPECT_STREQ(*FU_FormatPath(parts), row.path);
+        EXPECT_STREQ(*FU_FormatPath(texts), row.path);
+    }
+}
+
+TEST(ParsePath, NothingGivesAnEmptyRecord) {
+    for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""}) {
+        tagPATHPARSEINFO parts;
+        tagCPATHPARSEINFO texts;
+        ASSERT_TRUE(FU_ParsePath(L"C:\\a\\b.c", parts) && FU_ParsePath(L"C:\\a\\b.c", texts));
+        EXPECT_FALSE(FU_ParsePath(nothing, parts) || FU_ParsePath(nothing, texts));
+        EXPECT_EQ(parts.nRoot + parts.nFolder + parts.nStem + parts.nExtension, 0u);
+        EXPECT_EQ(parts.eRoot, PathRootNone);
+        EXPECT_FALSE(texts.sRoot || texts.sFolder || texts.sStem || texts.sExtension);
+        EXPECT_STREQ(*FU_FormatPath(parts), L"");
+        EXPECT_STREQ(*FU_FormatPath(texts), L"");
+    }
+}
+
+TEST(FormatPath, RestoresWhatWasTakenApart) {
+    const wchar_t kUnits[] = L"aC.:\\/?UN ";
+    std::mt19937 random(20261121);
+    for (int round = 0; round < 20000; ++round) {
+        std::vector<wchar_t> units(1 + random() % 14);
+        for (auto& unit : units) unit = kUnits[random() % (std::size(kUnits) - 1)];
+        if (round % 3 == 0) units.insert(units.begin(), {L'\\', L'\\', L'?', L'\\', L'U', L'N', L'C', L'\\'});
+        const WideText path(units);
+        tagPATHPARSEINFO parts;
+        ASSERT_TRUE(FU_ParsePath(path, parts));
+        ASSERT_EQ(parts.nRoot + parts.nFolder + parts.nStem + parts.nExtension, path.Length());
+        ASSERT_STREQ(*FU_FormatPath(parts), path);
+        ASSERT_TRUE(parts.nFolder == 0 || TAVO::String::_isSlash(parts.pFolder[parts.nFolder - 1]));
+    }
+}
+
+TEST(FormatPath, PutsInWhatIsMissing) {
+    const struct {
+        const wchar_t *root, *folder, *stem, *extension, *expected;
+    } kRows[] = {
+        {L"", L"a", L"b", L"c", L"a/b.c"},
+        {L"C:\\", L"a", L"b", L".c", L"C:\\a\\b.c"},
+        {L"", L"a\\b", L"c", L"", L"a\\b\\c"},
+        {L"", L"a/", L"b", L"", L"a/b"},
+        {L"", L"a", L"", L"", L"a"},
+        {L"", L"a", L"", L"txt", L"a/.txt"},
+        {L"//s/x/", L"a\\b", L"c", L"", L"//s/x/a\\b/c"},
+        {L"", L"", L"", L".", L"."},
+    };
+    for (const auto& row : kRows) {
+        tagCPATHPARSEINFO info;
+        info.sRoot = row.root;
+        info.sFolder = row.folder;
+        info.sStem = row.stem;
+        info.sExtension = row.extension;
+        EXPECT_STREQ(*FU_FormatPath(info), row.expected);
+    }
+}
+
+TEST(FormatPath, LongPathsAndFailingAllocations) {
+    const WideText path = support::Widen("C:\\" + std::string(700, 'a') + "\\" + std::string(300, 'b') + ".ext");
+    support::ForEachFailingAllocation([&] {
+        tagCPATHPARSEINFO info;
+        const bool parsed = FU_ParsePath(path, info);
+        EXPECT_EQ(static_cast<bool>(info.sRoot), parsed) << "all or nothing";
+        EXPECT_EQ(static_cast<bool>(info.sExtension), parsed);
+        if (!parsed) return;
+        const auto joined = FU_FormatPath(info);
+        EXPECT_TRUE(!joined || WideText(*joined) == path);
+    });
+}
+
+TEST(StraightPath, FollowsTheTable) {
+    const wchar_t* kStraight[] = {L"a",
+                                  L"a/b.c",
+                                  L"a\\b",
+                                  L"a/",
+                                  L".profile",
+                                  L"a..b",
+                                  L"C:\\a",
+                                  L"C:\\",
+                                  L"C:a",
+                                  L"/",
+                                  L"/a/b",
+                                  L"\\\\server\\share\\a",
+                                  L"\\\\?\\C:\\a",
+                                  L"\\\\.\\a",
+                                  L" a",
+                                  L"\u65E5\u672C",
+                                  L"\U0001F600"};
+    const wchar_t* kOthers[] = {L"",
+                                L".",
+                                L"..",
+                                L"../a",
+                                L"a/../b",
+                                L"a/.",
+                                L"a//b",
+                                L"a/\\",
+                                L"//a",
+                                L"a*",
+                                L"a?",
+                                L"a\"",
+                                L"<",
+                                L">",
+                                L"a|b",
+                                L"ab:c",
+                                L"C:\\a:",
+                                L"C:..",
+                                L"C::",
+                                L"a.",
+                                L"a ",
+                                L"a /b",
+                                L"a./b",
+                                L"a\tb",
+                                L"a\x7F",
+                                L"a\x85",
+                                L"C:\\\\a",
+                                L"\\\\..\\share\\a",
+                                L"\\\\s*\\share\\a",
+                                L"\\\\?\\C:\\..",
+                                L"\\\\?\\?",
+                                L"1:\\a",
+                                L"\x01",
+                                L"\x1F",
+                                L"...",
+                                L"\\\\s\\share.\\a"};
+    for (const wchar_t* path : kStraight) EXPECT_TRUE(FU_IsStraightPath(path)) << testing::PrintToString(path);
+    for (const wchar_t* path : kOthers) EXPECT_FALSE(FU_IsStraightPath(path)) << testing::PrintToString(path);
+    EXPECT_FALSE(FU_IsStraightPath(nullptr));
+}
+
+TEST(CreatePath, MakesEveryMissingFolder) {
+    ScratchFolder folder;
+    EXPECT_TRUE(FU_CreatePath(folder / L"a\\b/c"));
+    EXPECT_TRUE(OS::_TestDirExists(folder / L"a/b/c"));
+    EXPECT_TRUE(FU_CreatePath(folder / L"a/b/c")) << "exists already";
+    EXPECT_TRUE(FU_CreatePath(folder / L"a//d/e\\")) << "separators twice and at the end";
+    EXPECT_TRUE(OS::_TestDirExists(folder / L"a/d/e"));
+    EXPECT_TRUE(FU_CreatePath(folder / L"\U0001F600/\u00E4"));
+    EXPECT_TRUE(FU_CreatePath(L"."));
+    support::Put(folder / L"file", "");
+    EXPECT_FALSE(FU_CreatePath(folder / L"file")) << "a file in the way";
+    EXPECT_FALSE(FU_CreatePath(folder / L"x/../file/y"));
+    EXPECT_TRUE(OS::_TestDirExists(folder / L"x")) << "nothing is undone";
+    EXPECT_FALSE(FU_CreatePath(nullptr) || FU_CreatePath(L""));
+}

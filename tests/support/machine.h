@@ -1,0 +1,34 @@
+#pragma once
+// What the tests need of the machine: copies of the library with a configuration of their own, and child processes.
+
+#include <string>
+
+namespace support {
+
+// The library copied as `name` + the system's extension into a fresh folder, beside a configuration file with this
+// text, and loaded. Null text: no file.
+class LibraryCopy {
+public:
+    LibraryCopy(const std::string& name, const char* configuration);
+    ~LibraryCopy();
+    LibraryCopy(const LibraryCopy&) = delete;
+    LibraryCopy& operator=(const LibraryCopy&) = delete;
+
+    // The copy's function of that C++ name; `windowsName` where its parameters make it another.
+    template <class Function> Function Find(const char* name, const char* windowsName = nullptr) const {
+        return reinterpret_cast<Function>(FindSymbol(name, windowsName ? windowsName : name));
+    }
+    bool IsLoaded() const { return m_module != nullptr; }
+
+private:
+    void* FindSymbol(const char* name, const char* windowsName) const;
+
+    std::string m_folder, m_library, m_configuration;
+    void* m_module = nullptr;
+};
+
+// Runs this program again, under a debugger that lets it run, with one (disabled) test only. Gives what reached the
+// debugger: its output channel on Windows, standard error elsewhere. `exitCode` is the child's.
+std::string RunUnderDebugger(const char* test, int& exitCode);
+
+} // namespace support
