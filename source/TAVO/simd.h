@@ -76,9 +76,13 @@ TAVO_INLINE std::size_t Sum8(Block a) {
 // Shuffle, and may be called when HasShuffle() is true.
 #if defined(_MSC_VER)
 #define TAVO_SHUFFLES
-inline bool HasShuffle() { return false; }
 #else
 #define TAVO_SHUFFLES __attribute__((target("ssse3")))
+#endif
+// TAVO_NO_SHUFFLE builds what processors without it run.
+#if defined(_MSC_VER) || defined(TAVO_NO_SHUFFLE)
+inline bool HasShuffle() { return false; }
+#else
 inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
 #endif
 // Byte i of the result is byte index[i]; 0 for an index with the highest bit.
