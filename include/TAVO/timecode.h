@@ -114,6 +114,9 @@ public:
     ulong32 sys() const noexcept { return m_sys; } ///< system word
 
 private:
+    void BreakDownDropFrame(long long count) noexcept;
+    template <class Fields> void Set(const Fields& fields, bool negative) noexcept;
+
     ulong32 m_ff, m_ss, m_mm, m_hh; // magnitudes
     long long m_dd;                 // carries the sign, so that -0 hours can be told from 0 hours
     ulong32 m_sys;

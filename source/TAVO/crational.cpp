@@ -3,6 +3,7 @@
 #include <TAVO/develop.h>
 #include <TAVO/math.h>
 
+#include <bit>
 #include <cmath>
 #include <type_traits>
 
@@ -18,15 +19,31 @@ template <class Integer> constexpr auto Magnitude(Integer value) noexcept {
     return value < 0 ? static_cast<Unsigned>(0 - static_cast<Unsigned>(value)) : static_cast<Unsigned>(value);
 }
 
-// A remainder truncated toward zero has the sign of its dividend, so both operands keep theirs to the end: it is enough
-// to divide magnitudes and to give the one that remains its sign. No division can overflow that way.
+// Both above zero; without a division.
+template <class Unsigned> Unsigned BinaryGcd(Unsigned u, Unsigned v) noexcept {
+    const int shift = std::countr_zero(u | v);
+    u >>= std::countr_zero(u);
+    do {
+        v >>= std::countr_zero(v);
+        const Unsigned smaller = u < v ? u : v;
+        v = u < v ? v - u : u - v;
+        u = smaller;
+    } while (v != 0);
+    return u << shift;
+}
+
+// Euclid's algorithm with remainders truncated toward zero. A remainder has the sign of its dividend, so both operands
+// keep theirs to the end: it is enough to divide magnitudes, which cannot overflow, and to give the one that remains
+// its sign.
 template <class Integer> Integer Gcd(Integer x, Integer y) noexcept {
+    if (x == 0) return y;
+    if (y == 0) return x;
     auto u = Magnitude(x);
     auto v = Magnitude(y);
+    if (x > 0 && y > 0) return static_cast<Integer>(BinaryGcd(u, v));
     const auto signedAs = [](auto magnitude, Integer original) {
         return static_cast<Integer>(original < 0 ? 0 - magnitude : magnitude);
     };
-    if (u == 0) return y;
     for (;;) {
         v %= u;
         if (v == 0) return signedAs(u, x);
@@ -68,7 +85,7 @@ void CRational::_normalize() noexcept {
     auto n = Magnitude(m_num);
     auto d = Magnitude(m_den);
     if (d > 1) {
-        const auto g = static_cast<ulong32>(Gcd<long long>(n, d));
+        const auto g = n == 0 ? d : BinaryGcd(n, d);
         n /= g;
         d /= g;
     }
@@ -94,20 +111,25 @@ CRational& CRational::Store(long long n, long long d, const wchar_t* message) no
 // All intermediate results fit 64 bits: a quotient by the common divisor is at most 2^31, and the two quotients of the
 // denominators have no common factor, so they are not both 2^31.
 CRational& CRational::operator+=(const CRational& b) noexcept {
-    const long long d = Gcd(m_den, b.m_den);
+    constexpr const wchar_t* message = L"CRational::operator +(): Result exceeded definition space";
+    const long long d = _gcd(m_den, b.m_den);
     if (d == 0) return *this = Raw(1, 0);
+    if (d == 1) // nothing to reduce
+        return Store(static_cast<long long>(b.m_den) * m_num + static_cast<long long>(b.m_num) * m_den,
+                     static_cast<long long>(b.m_den) * m_den, message);
     const long long leftShare = m_den / d;
     const long long rightShare = b.m_den / d;
     const long long n = rightShare * m_num + b.m_num * leftShare;
-    const auto g = static_cast<long long>(Magnitude(Gcd(n, d)));
-    return Store(n / g, (b.m_den / g) * leftShare, L"CRational::operator +(): Result exceeded definition space");
+    const long long g =
+        _gcd64(static_cast<long long>(Magnitude(n) % Magnitude(d)), static_cast<long long>(Magnitude(d)));
+    return Store(n / g, (b.m_den / g) * leftShare, message);
 }
 
 CRational& CRational::operator*=(const CRational& b) noexcept {
     // Intended: the divisors keep the sign that the remainders leave, so the sign of a product may end in its
     // denominator.
-    const long long g1 = Gcd(m_num, b.m_den);
-    const long long g2 = Gcd(b.m_num, m_den);
+    const long long g1 = _gcd(m_num, b.m_den);
+    const long long g2 = _gcd(b.m_num, m_den);
     if (g1 == 0 || g2 == 0) return *this = Raw(1, 0);
     return Store((m_num / g1) * (b.m_num / g2), (m_den / g2) * (b.m_den / g1),
                  L"CRational::operator *(): Result exceeded definition space");

@@ -16,6 +16,8 @@ struct DropRule {
     ulong32 block;
 };
 constexpr DropRule kKeepsAll{0, 1};
+constexpr DropRule kDropVideo{40, 10};
+constexpr DropRule kDropFilm{50, 4};
 
 struct System {
     const wchar_t* name;
@@ -48,13 +50,13 @@ struct System {
 constexpr System kSystems[] = {
     {L"PAL", 25, 1, 48, kKeepsAll, L":::", kUnassigned, eSystemHD50},
     {L"NTSC", 30000, 1001, 40, kKeepsAll, L"::.", eSystemNTSCDF, eSystemHDNTSC},
-    {L"NTSC(DF)", 30000, 1001, 40, {40, 10}, L".:.", kUnassigned, eSystemHDNTSCDF},
+    {L"NTSC(DF)", 30000, 1001, 40, kDropVideo, L".:.", kUnassigned, eSystemHDNTSCDF},
     {L"FILM", 24, 1, 50, kKeepsAll, L"::,", kUnassigned, kUnassigned},
     {L"HDFILM", 24000, 1001, 50, kKeepsAll, L":.,", eSystemHDFilmDF, kUnassigned},
-    {L"HDFILM(DF)", 24000, 1001, 50, {50, 4}, L"..,", kUnassigned, kUnassigned},
+    {L"HDFILM(DF)", 24000, 1001, 50, kDropFilm, L"..,", kUnassigned, kUnassigned},
     {L"HD50", 50, 1, 24, kKeepsAll, L":.:", kUnassigned, kUnassigned},
     {L"HDNTSC", 60000, 1001, 20, kKeepsAll, L":..", eSystemHDNTSCDF, kUnassigned},
-    {L"HDNTSC(DF)", 60000, 1001, 20, {40, 10}, L"...", kUnassigned, kUnassigned},
+    {L"HDNTSC(DF)", 60000, 1001, 20, kDropVideo, L"...", kUnassigned, kUnassigned},
     {L"PAL(PX)", 25, 2, 96, kKeepsAll, L".,:", kUnassigned, kUnassigned},
     {L"NTSC(PX)", 15, 1, 80, kKeepsAll, L":,;", kUnassigned, kUnassigned},
     {L"FILM(PX)", 12, 1, 100, kKeepsAll, L":,,", kUnassigned, kUnassigned},
