@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <gtest/gtest.h>
+#include <memory>
 #include <string>
 #include <TAVO/timecode.h>
 
@@ -183,6 +184,16 @@ TEST(TimecodeExchangeText, Reading) {
         EXPECT_EQ(value.sys(), row.sys) << row.text;
         EXPECT_EQ(static_cast<long long>(value), row.count) << row.text;
     }
+}
+
+// A text that fills the array has no terminator: reading stops at its end.
+TEST(TimecodeExchangeText, WithoutTerminator) {
+    const std::string head = "10:00:00:00 {25/", tail(48 - head.size(), '1');
+    const auto boxed = std::make_unique<SZUTC>(Holding<SZUTC>((head + tail).c_str()));
+    EXPECT_EQ(timecode(*boxed).sys(), kUnassigned);
+    const auto zeros =
+        std::make_unique<SZUTC>(Holding<SZUTC>((head + std::string(tail.size() - 1, '0') + "1").c_str()));
+    EXPECT_EQ(timecode(*zeros), timecode(10 * 4320000LL, 0));
 }
 
 TEST(TimecodeExchangeText, Canonicalising) {

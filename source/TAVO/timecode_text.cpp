@@ -51,7 +51,7 @@ private:
 };
 
 // The terminator of `text`, or the end of its array.
-template <std::size_t N> const wchar_t* EndOf(const wchar_t (&text)[N]) { return std::find(text, text + N, L'\0'); }
+template <std::size_t N> const wchar_t* EndWithin(const wchar_t (&text)[N]) { return std::find(text, text + N, L'\0'); }
 
 const wchar_t* EndOf(const wchar_t* text) {
     while (*text) ++text;
@@ -202,7 +202,7 @@ TCINFO::TCINFO(const SZTC& source) noexcept : TCINFO() {
 
     std::replace(text + 1, text + kFixedLength, L'-', L'0');
     SetSeparators(text, L":::");
-    Scanner scan(text + 1, EndOf(fixed.text));
+    Scanner scan(text + 1, EndWithin(fixed.text));
     ulong32 hh, mm, ss, ff;
     if (!(scan.Number(hh, 2) && scan.Literal(L':') && scan.Number(mm, 2) && scan.Literal(L':') && scan.Number(ss, 2) &&
           scan.Literal(L':') && scan.Number(ff, 2))) {
@@ -304,7 +304,7 @@ SZUTC::SZUTC(timecode value) noexcept {
 }
 
 SZUTC::operator timecode() const noexcept {
-    const wchar_t* end = EndOf(text);
+    const wchar_t* end = EndWithin(text);
     Exchange e{};
     if (!ReadExchange(Scanner(text, end), e)) return timecode();
     ulong32 sys = timecode::GetTCSystemOf(e.numerator, e.denominator);
