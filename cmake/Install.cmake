@@ -15,10 +15,11 @@ write_basic_package_version_file(${CMAKE_BINARY_DIR}/TAVOConfigVersion.cmake COM
 install(FILES ${CMAKE_BINARY_DIR}/TAVOConfig.cmake ${CMAKE_BINARY_DIR}/TAVOConfigVersion.cmake
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/TAVO)
 
-if(WIN32)
-  set(TAVO_PC_CFLAGS "")
-else()
+# The Linux library takes wchar_t to have 16 bits; whoever includes its headers must too.
+set(TAVO_PC_CFLAGS "")
+if(NOT WIN32)
   set(TAVO_PC_CFLAGS "-fshort-wchar")
 endif()
+file(RELATIVE_PATH TAVO_PC_UP ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
 configure_file(cmake/TAVO.pc.in ${CMAKE_BINARY_DIR}/TAVO.pc @ONLY)
 install(FILES ${CMAKE_BINARY_DIR}/TAVO.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

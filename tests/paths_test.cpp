@@ -150,59 +150,16 @@ TEST(FormatPath, LongPathsAndFailingAllocations) {
 }
 
 TEST(StraightPath, FollowsTheTable) {
-    const wchar_t* kStraight[] = {L"a",
-                                  L"a/b.c",
-                                  L"a\\b",
-                                  L"a/",
-                                  L".profile",
-                                  L"a..b",
-                                  L"C:\\a",
-                                  L"C:\\",
-                                  L"C:a",
-                                  L"/",
-                                  L"/a/b",
-                                  L"\\\\server\\share\\a",
-                                  L"\\\\?\\C:\\a",
-                                  L"\\\\.\\a",
-                                  L" a",
-                                  L"\u65E5\u672C",
-                                  L"\U0001F600"};
-    const wchar_t* kOthers[] = {L"",
-                                L".",
-                                L"..",
-                                L"../a",
-                                L"a/../b",
-                                L"a/.",
-                                L"a//b",
-                                L"a/\\",
-                                L"//a",
-                                L"a*",
-                                L"a?",
-                                L"a\"",
-                                L"<",
-                                L">",
-                                L"a|b",
-                                L"ab:c",
-                                L"C:\\a:",
-                                L"C:..",
-                                L"C::",
-                                L"a.",
-                                L"a ",
-                                L"a /b",
-                                L"a./b",
-                                L"a\tb",
-                                L"a\x7F",
-                                L"a\x85",
-                                L"C:\\\\a",
-                                L"\\\\..\\share\\a",
-                                L"\\\\s*\\share\\a",
-                                L"\\\\?\\C:\\..",
-                                L"\\\\?\\?",
-                                L"1:\\a",
-                                L"\x01",
-                                L"\x1F",
-                                L"...",
-                                L"\\\\s\\share.\\a"};
+    // clang-format off
+    const wchar_t* kStraight[] = {
+        L"a", L"a/b.c", L"a\\b", L"a/", L".profile", L"a..b", L"C:\\a", L"C:\\", L"C:a", L"/", L"/a/b", L" a",
+        L"\\\\server\\share\\a", L"\\\\?\\C:\\a", L"\\\\.\\a", L"\u65E5\u672C", L"\U0001F600"};
+    const wchar_t* kOthers[] = {
+        L"", L".", L"..", L"...", L"../a", L"a/../b", L"a/.", L"a//b", L"a/\\", L"//a", L"C:\\\\a", L"C:..", // ways around
+        L"\\\\..\\share\\a", L"\\\\?\\C:\\..", L"\\\\s\\share.\\a", L"a.", L"a ", L"a /b", L"a./b",
+        L"a*", L"a?", L"a\"", L"<", L">", L"a|b", L"\\\\s*\\share\\a", L"\\\\?\\?", // characters
+        L"ab:c", L"C:\\a:", L"C::", L"1:\\a", L"a\tb", L"\x01", L"\x1F", L"a\x7F", L"a\x85"};
+    // clang-format on
     for (const wchar_t* path : kStraight) EXPECT_TRUE(FU_IsStraightPath(path)) << testing::PrintToString(path);
     for (const wchar_t* path : kOthers) EXPECT_FALSE(FU_IsStraightPath(path)) << testing::PrintToString(path);
     EXPECT_FALSE(FU_IsStraightPath(nullptr));

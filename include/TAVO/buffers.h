@@ -69,10 +69,9 @@ public:
 
     /// Makes the block this handle's alone: a shared one is copied (used part only), a private one stays.
     /// @return true: writing is safe now (or the handle is empty). False when the type allows no copies, the heap
-    /// refused
-    ///         or copying threw; the handle then keeps the shared block.
+    ///         refused or copying threw; the handle then keeps the shared block.
     /// A static block raises an assertion and is copied.
-    bool clone();
+    bool clone() noexcept;
 
     /// 0 for an empty handle, never 0 for another; from the block's address.
     std::uint32_t hash() const noexcept;
@@ -126,6 +125,8 @@ protected:
     static std::size_t queryinterface(const CPObjectMemory& other, const _acfUID& type) noexcept;
     /// Whether this handle is the block's only one, so that the block may be changed or moved.
     bool IsPrivate() const noexcept;
+    /// Whether the block is static. It may lie in read-only memory, so every change goes to a new block instead.
+    bool IsStatic() const noexcept;
     /// The payload, null when empty.
     void* Payload() const noexcept { return m_pMH ? m_pMH + 1 : nullptr; }
 
@@ -157,7 +158,8 @@ public:
     /// Releases the buffer and takes a new one of @p size undefined bytes; size 0 leaves it empty and is true.
     bool Alloc(std::size_t size) noexcept { return _Alloc(size, &_vtbl); }
     /// Changes the size, keeping the bytes; grows to exactly @p size. Within the capacity the block itself changes,
-    /// also for every other handle that shares it: clone() first for a private buffer. False keeps the old buffer.
+    /// also for every other handle that shares it: clone() first for a private buffer. A static block is left for a new
+    /// one. False keeps the old buffer.
     bool Resize(std::size_t size) noexcept { return _Resize(size, m_pMH ? m_pMH->pVTbl : &_vtbl); }
     /// Whether @p address lies inside the block. The bytes of the block's header count too, but for the first.
     bool isMemory(const void* address) const noexcept;
@@ -177,9 +179,9 @@ protected:
 };
 
 /// Vector of handles of type T, itself a handle: copies share the elements. Changes are made in place and seen by all
-/// who share the block, unless the call has to replace it; clone() first for a private vector. T must be movable
-/// bitwise and its default must be its empty value. Instantiated for CPObjectMemory, pooled strings and the hash
-/// table's entries; each is a type of its own.
+/// who share the block, unless the call has to replace it (a static one always); clone() first for a private vector. T
+/// must be movable bitwise and its default must be its empty value. Instantiated for CPObjectMemory, pooled strings and
+/// the hash table's entries; each is a type of its own.
 template <class T> class CPObjectVector : public CPObjectMemory {
 public:
     static const tagCPOVTABL _vtbl;
@@ -223,6 +225,11 @@ protected:
 
     T* Elements() const noexcept;
     bool GrowTo(std::size_t capacity) noexcept;
+    bool LeaveStatic() noexcept;
+    // Insert with a capacity of its own choice and without counting. False leaves the element where it is.
+    bool InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept;
+    // Takes the element out, uncounted, and closes the gap. Requires: an index below the count, a block that may change.
+    T Extract(std::size_t index, bool releaseWhenEmpty) noexcept;
 };
 
 extern template class TAVO_TEMPLATE_DECL CPObjectVector<CPObjectMemory>;

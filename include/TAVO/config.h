@@ -1,8 +1,13 @@
 #pragma once
-// Compiler and platform marks: the one header that may name compilers. Everything else is plain C++.
+// The version, and marks of compilers and platforms: the one header that may name compilers. Everything else is plain
+// C++.
 
 #include <cstddef>
 #include <cstdint>
+
+/// The version of the library that these headers belong to; the build takes its own from here. Hosts and plug-ins of
+/// one process must agree in the first number.
+#define TAVO_VERSION "1.0.0"
 
 #if defined(_WIN32)
 #define TAVO_EXPORT __declspec(dllexport)

@@ -36,6 +36,16 @@ TAVO_API bool _istrue_(bool condition, const char* text);
 /// Raises an assertion with caption "RTA_ON_FALSE" when @p condition is false; returns the condition.
 TAVO_API bool _isfalse_(bool condition, const char* text);
 
+/// The diagnostics that the configuration file switched on: section "Debug" of the file that has the library's path and
+/// the extension ".ini".
+struct tagSWITCHES {
+    bool AssertBox;        ///< assertions show a message box
+    bool LogFailedHRESULT; ///< negative result codes write a trace line
+    bool BreakOnHRESULT;   ///< negative result codes raise an assertion
+};
+/// The switches, fixed when the library was loaded; all false without the file.
+TAVO_API tagSWITCHES GetSwitches() noexcept;
+
 namespace OS {
 
 /// The runtime assertion: shows a message box when the configuration asks for it ("AssertBox"), writes an ERROR line in

@@ -115,8 +115,7 @@ public:
     /// found, its last folder is created (only that one) and the open is tried again. This is so for every open, also
     /// one that only reads: it then fails and leaves an empty folder behind.
     /// @return false for a null or empty path, while a file is open, for combinations that the flags exclude, and when
-    /// the
-    ///         system refuses.
+    ///         the system refuses.
     bool Open(const wchar_t* path, eFileAccess access, eOpenFileOptions options) noexcept;
     /// Closes the file, if one is open; a temporary one is deleted. Always true.
     bool Close() noexcept;

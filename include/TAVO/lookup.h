@@ -49,7 +49,8 @@ public:
     virtual ~CBaseHashTable();
 
 protected:
-    /// The order of two items of equal hash: below 0, 0 for equal, above 0. It may not change the table.
+    /// The order of two items of equal hash: below 0, 0 for equal, above 0. It may not change the table. If it throws,
+    /// nothing is found and nothing is inserted.
     virtual long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) = 0;
     /// Whether DisposeTable may drop the item; no by default. While it is asked, the table, the walk and the argument
     /// hold the item: an item that nobody else holds has a count of 3.
@@ -81,7 +82,7 @@ protected:
     /// false when the visitor threw: that entry stays.
     bool PurgeTable(IBaseHashTableEnum* visitor) noexcept;
     /// Drops disposable items, bucket after bucket from where the last call ended, for @p budget milliseconds.
-    /// @return true when a whole round finished within the budget.
+    /// @return true when a whole round finished within the budget; false also when the derived class threw.
     bool DisposeTable(std::uint32_t budget) noexcept;
 
     /// Where an item stands, or where it would be inserted. Valid until the table changes.
@@ -94,16 +95,18 @@ protected:
     Place Locate(unsigned long long hash, const Buffers::CPObjectMemory& probe) noexcept;
     /// The entry at a place that was found.
     HASHENTRY& At(const Place& place) noexcept;
-    /// Inserts at a place that was not found. False without memory; the table is then as it was.
-    bool InsertAt(const Place& place, unsigned long long hash, const Buffers::CPObjectMemory& item) noexcept;
+    /// Inserts at a place that was not found, taking over the reference. False without memory: item and table are then as
+    /// they were.
+    bool InsertAt(const Place& place, unsigned long long hash, Buffers::CPObjectMemory&& item) noexcept;
+    /// Takes the entry at a place that was found out of the table, with its reference.
+    Buffers::CPObjectMemory RemoveAt(const Place& place) noexcept;
 
 private:
-    using Bucket = Buffers::CPObjectVector<HASHENTRY>;
+    friend class TableAccess; // the library's own road to the buckets
+
+    class Bucket;
 
     Bucket* Buckets() const noexcept;
-    bool EnsureIndex() noexcept;
-    int CompareEntry(const HASHENTRY& entry, unsigned long long hash, const Buffers::CPObjectMemory& probe);
-    void Remove(std::size_t bucket, std::size_t index) noexcept;
     void DisposeEntry(std::size_t bucket, std::size_t index);
 
     unsigned long long m_mask;

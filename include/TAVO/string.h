@@ -572,7 +572,8 @@ public:
     explicit CPPoolStringArray(bool sorted) noexcept : m_sorted(sorted) {}
     CPPoolStringArray(const CPPoolStringArray& other) noexcept = default;
     CPPoolStringArray& operator=(const CPPoolStringArray& other) noexcept = default;
-    /// Shares the block if it holds pooled strings, else becomes empty; then sorts a sorted array (duplicates stay).
+    /// Shares the block if it holds pooled strings, else becomes empty; then sorts a sorted array (duplicates stay;
+    /// empty when there is no memory for sorting a copy).
     CPPoolStringArray& operator=(const Buffers::CPObjectMemory& block) noexcept;
 
     /// Sorts the elements by cmp.
@@ -601,6 +602,9 @@ public:
     const CPPoolString& operator[](std::size_t index) const noexcept { return m_elements[index]; }
 
 private:
+    bool IsInOrder() const noexcept;
+    bool AddPiece(const wchar_t* start, std::size_t units) noexcept;
+
     Buffers::CPObjectVector<CPPoolString> m_elements;
     bool m_sorted;
 };

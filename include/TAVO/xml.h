@@ -108,7 +108,8 @@ public:
     /// Removes the attribute, then adds it anew at the end. An empty value therefore removes it and gives false.
     bool SetAttribute(const CPPoolString& name, const CPPoolString& value) noexcept;
     bool SetAttribute(const CPPoolString& name, const wchar_t* value) noexcept;
-    /// Formatted text as value; a conversion is described at the library's log. False also when memory is out.
+    /// Adds or sets formatted text; formats are those of _logWrite (develop.h), without its limit. False also when
+    /// memory is out.
     bool printfAttribute(const CPPoolString& name, const wchar_t* format, ...) noexcept;
     bool SprintfAttribute(const CPPoolString& name, const wchar_t* format, ...) noexcept;
     /// Removes an attribute. False for a bad name only: true also when there is nothing to remove.
@@ -150,8 +151,7 @@ public:
     /// Inserts before the child at @p index, or appends when that is beyond the end. The child may be default, or an
     /// empty handle. Refused, unlike Add, when this element has data.
     /// @return @p index as it was given, even when the child was appended at a smaller one. So an index of all-ones
-    /// reads
-    ///         as failure although the child was appended.
+    ///         reads as failure although the child was appended.
     xmlret Insert(const CPXMLObject& child, std::size_t index) noexcept;
     /// Puts the child in place of the one at @p index. False for a default child.
     template <class Index, std::enable_if_t<std::is_integral<Index>::value, int> = 0>
@@ -161,7 +161,7 @@ public:
     /// Puts the child, which may be default, in the slot at @p position; a position outside this element's children is
     /// read, and the first slot that holds the same node is replaced.
     /// @return the slot's index, all-ones when there is none; 0, with nothing replaced, on a node that is not live and
-    /// named.
+    ///         named.
     xmlret Replace(const CPXMLObject& child, const CPXMLObject* position) noexcept;
     /// Puts the child in place of the first slot that holds the same node as @p old.
     xmlret Replace(const CPXMLObject& child, const CPXMLObject& old) noexcept;
@@ -261,8 +261,9 @@ public:
     // An xml declaration, then the element and all below it; no byte order mark. `pretty` adds line ends (CR LF) and
     // two blanks per level. False for an unnamed element, one with children and data, an empty handle as child, an
     // unknown encoding and, but for the raw encoding, text with characters from U+100000 up or half a pair; also
-    // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost. Not
-    // everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
+    // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost.
+    //
+    // Not everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
     // its ends, runs of them and line breaks, unless one of & < > " ' makes it a CDATA section.
 
     /// Writes a file. One that exists is replaced at once: when writing fails, it is deleted.
@@ -318,7 +319,8 @@ public:
 private:
     bool Refuse() noexcept;
     template <class Unit> bool ParseUnits(const Unit* text, std::size_t units) noexcept;
-    bool ParseUtf16(const void* data, std::size_t units, bool swap) noexcept;
+    bool ParseUtf16(const void* data, std::size_t most, bool swap) noexcept;
+    bool ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t units) noexcept;
 
     Buffers::CPPlainMemory m_errorText; // zero-terminated wide text
     unsigned long long m_errorOffset;

@@ -30,7 +30,7 @@ struct Pool {
         for (Static which : {Static::True, Static::False}) {
             tagCPOMEMHEADER* block = StaticEntry(which);
             CCaseSensitiveHash::Place place;
-            if (!entries.Find(block, place)) entries.Add(place, Block::Adopt(block));
+            if (!entries.Find(pool::StoredText(EntryOf(block)), place)) entries.Add(place, Block::Adopt(block));
         }
     }
 };
@@ -51,156 +51,67 @@ void RaiseComplaint(const char* complaint) noexcept {
 
 // --- interning -----------------------------------------------------------------------------------------------------
 
-// An entry that stands on the stack to be searched for: count 0, so never counted or freed, and of its text no more
-// than comparisons look at.
-class Probe {
-public:
-    static constexpr std::size_t kUnits = 10;
-
-    explicit Probe(const pool::Key& key) noexcept
-        : m_header{0, sizeof(PoolEntry), sizeof(PoolEntry), &g_entryTable}, m_entry{0,        key.length, key.utf8Size,
-                                                                                    key.hash, key.hashi,  first,
-                                                                                    nullptr} {}
-    Probe(const Probe&) = delete;
-    Probe& operator=(const Probe&) = delete;
-
-    tagCPOMEMHEADER* Block() noexcept { return &m_header; }
-
-private:
-    tagCPOMEMHEADER m_header;
-    PoolEntry m_entry; // directly behind its header, as in a block
-
-public:
-    wchar_t first[kUnits + 1]; // terminated; for the source to fill
-};
-
 enum class Missing { Create, Leave };
 enum class Match { Exact, AnyCase };
 
-// The one road behind every way to intern. A source knows the text in its own form:
-//   void First(wchar_t (&units)[11])   the first ten units, terminated
-//   std::size_t Units()                units of the whole text
-//   bool Write(wchar_t* out)           the whole text; false when it has no wide form
-template <class Source>
-CPPoolString Intern(const Source& source, const pool::Key& key, Missing missing, Match match) noexcept {
-    Probe probe(key);
-    source.First(probe.first);
-
-    Pool& pool = ThePool();
-    const char* complaint = nullptr;
-    CPPoolString result;
-    {
-        pool::Guard guard(pool.lock);
-        if (match == Match::AnyCase) {
-            // Counted before the lock is left: without a handle outside, a sweep may take the entry.
-            if (tagCPOMEMHEADER* found = pool.groups.Find(probe.Block())) return PoolAccess::Share(found);
-            complaint = std::exchange(pool.groups.complaint, nullptr);
-        }
-        CCaseSensitiveHash::Place place;
-        tagCPOMEMHEADER* found =
-            match == Match::Exact || missing == Missing::Create ? pool.entries.Find(probe.Block(), place) : nullptr;
-        if (found) {
-            result = PoolAccess::Share(found);
-        } else if (missing == Missing::Create) {
-            wchar_t* text;
-            if (tagCPOMEMHEADER* block = NewEntry(source.Units(), key, text)) {
-                const CPObjectMemory entry(Block::Adopt(block));
-                if (source.Write(text) && pool.entries.Add(place, entry)) result = PoolAccess::Share(block);
-            }
-        }
+// The one road behind every way to intern: a counted entry, null when there is none. Counted before the lock is left:
+// without a handle outside, a sweep may take the entry.
+template <class Text>
+tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match) noexcept {
+    if (match == Match::AnyCase) {
+        if (tagCPOMEMHEADER* found = pool.groups.Find(text, pool.entries)) return Block::Acquire(found);
+        if (missing == Missing::Leave) return nullptr;
     }
-    RaiseComplaint(complaint);
-    return result;
+    CCaseSensitiveHash::Place place;
+    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place)) return Block::Acquire(found);
+    if (missing == Missing::Leave) return nullptr;
+    wchar_t* out;
+    tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
+    if (!block) return nullptr;
+    CPObjectMemory entry(Block::Adopt(block));
+    return text.Write(out) && pool.entries.Add(place, std::move(entry)) ? Block::Acquire(block) : nullptr;
 }
 
-struct WideSource {
-    const wchar_t* text;
-    std::size_t units;
-
-    void First(wchar_t (&out)[Probe::kUnits + 1]) const noexcept {
-        const std::size_t count = units < Probe::kUnits ? units : Probe::kUnits;
-        detail::WideCopy(out, text, count);
-        out[count] = 0;
-    }
-    std::size_t Units() const noexcept { return units; }
-    bool Write(wchar_t* out) const noexcept {
-        detail::WideCopy(out, text, units);
-        return true;
-    }
-};
-
-struct AsciiSource {
-    const unsigned char* text;
-    std::size_t count;
-
-    void First(wchar_t (&out)[Probe::kUnits + 1]) const noexcept {
-        const std::size_t units = count < Probe::kUnits ? count : Probe::kUnits;
-        for (std::size_t i = 0; i < units; ++i) out[i] = text[i];
-        out[units] = 0;
-    }
-    std::size_t Units() const noexcept { return count; }
-    bool Write(wchar_t* out) const noexcept {
-        for (std::size_t i = 0; i < count; ++i) out[i] = text[i];
-        return true;
-    }
-};
-
-// UTF-8 whose sequences are all good.
-struct Utf8Source {
-    const unsigned char* text;
-    std::size_t bytes;
-    std::size_t units; // the key's length, where a character above FFFF counts 2: all of the text
-
-    void First(wchar_t (&out)[Probe::kUnits + 1]) const noexcept {
-        const unsigned char* in = text;
-        wchar_t* to = out;
-        while (in < text + bytes && to < out + Probe::kUnits) {
-            ulong32 value;
-            wchar_t units[2], *next = units;
-            detail::StepUtf8(value, in);
-            if (!detail::EncodeUtf16(next, value)) break;
-            for (const wchar_t* unit = units; unit < next && to < out + Probe::kUnits;) *to++ = *unit++;
-        }
-        *to = 0;
-    }
-    std::size_t Units() const noexcept { return units; }
-    bool Write(wchar_t* out) const noexcept {
-        return detail::ConvertUtf8(text, {.source = bytes, .target = units}, out);
-    }
-};
+template <class Text> CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
+    Pool& pool = ThePool();
+    pool.lock.Enter();
+    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match);
+    const char* complaint = std::exchange(pool.groups.complaint, nullptr);
+    pool.lock.Leave();
+    if (TAVO_UNLIKELY(complaint != nullptr)) RaiseComplaint(complaint);
+    return entry ? PoolAccess::Adopt(entry) : CPPoolString();
+}
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {
     if (!text) return {};
+    if (limit == 0 || !*text) return CPPoolString::pempty;
     pool::Key key;
     std::size_t units;
-    if (limit == 0 || !*text) return CPPoolString::pempty;
     if (!pool::KeyOfWide(text, limit, key, units)) return {};
     if (units == 0) return CPPoolString::pempty; // a pair that the limit cuts
-    return Intern(WideSource{text, units}, key, missing, match);
+    return Intern(pool::WideText{key, text, units}, missing, match);
 }
 
 CPPoolString InternText(const unsigned char* text, std::size_t limit, Missing missing, Match match) noexcept {
     if (!text) return {};
+    if (limit == 0 || !*text) return CPPoolString::pempty;
     pool::Key key;
     std::size_t bytes;
-    if (limit == 0 || !*text) return CPPoolString::pempty;
     if (!pool::KeyOfUtf8(text, limit, key, bytes)) return {};
     if (bytes == 0) return CPPoolString::pempty;
-    return Intern(Utf8Source{text, bytes, key.length}, key, missing, match);
+    if (key.length == bytes) return Intern(pool::AsciiText{key, text, bytes}, missing, match);
+    return Intern(pool::Utf8Text{key, text, bytes}, missing, match);
 }
 
 // What a submitter wrote, already in the block that becomes the entry.
 CPPoolString InternBlock(tagCPOMEMHEADER* block) noexcept {
-    const CPObjectMemory entry(Block::Adopt(block));
-    const PoolEntry& text = EntryOf(block);
-    Probe probe({text.length, text.utf8Size, text.hash, text.hashi});
-    WideSource{text.text, UnitsOf(block)}.First(probe.first);
-
+    CPObjectMemory entry(Block::Adopt(block));
     Pool& pool = ThePool();
     pool::Guard guard(pool.lock);
     CCaseSensitiveHash::Place place;
-    if (tagCPOMEMHEADER* found = pool.entries.Find(probe.Block(), place)) return PoolAccess::Share(found);
-    return pool.entries.Add(place, entry) ? PoolAccess::Share(block) : CPPoolString();
+    if (tagCPOMEMHEADER* found = pool.entries.Find(pool::StoredText(EntryOf(block)), place))
+        return PoolAccess::Share(found);
+    return pool.entries.Add(place, std::move(entry)) ? PoolAccess::Share(block) : CPPoolString();
 }
 
 // --- visitors ------------------------------------------------------------------------------------------------------
@@ -245,8 +156,8 @@ void ClearTables(Pool& pool) noexcept {
     pool.entries.EnumTableBy(&diagnosis, 0, false);
     Develop::_logWrite(acfDebugTrace, L"TAVO", kSource, 0,
                        L"SPool ClearTable: diagnosis done, %u items still referenced", diagnosis.referenced);
+    pool.groups.Clear(); // first: it holds entries without counting them
     pool.entries.ClearTable();
-    pool.groups.ClearTable();
 }
 
 } // namespace
@@ -257,14 +168,14 @@ CPPoolString InternAscii(const unsigned char* text, std::size_t count) noexcept 
     if (count == 0) return CPPoolString::pempty;
     Key key;
     KeyOfAscii(text, count, key);
-    return Intern(AsciiSource{text, count}, key, Missing::Create, Match::Exact);
+    return Intern(AsciiText{key, text, count}, Missing::Create, Match::Exact);
 }
 
 CPPoolString InternWide(const wchar_t* text, std::size_t count) noexcept {
     if (count == 0) return CPPoolString::pempty;
     Key key;
     if (!KeyOfUnits(text, count, key)) return {};
-    return Intern(WideSource{text, count}, key, Missing::Create, Match::Exact);
+    return Intern(WideText{key, text, count}, Missing::Create, Match::Exact);
 }
 
 void Unload() noexcept {
@@ -330,7 +241,8 @@ CPPoolString CStringPool::GetStringRef(IStringSubmitter* submitter) noexcept {
         text[announced] = 0;
         pool::Key key;
         std::size_t units;
-        if (!pool::KeyOfWide(text, announced, key, units)) return {};
+        // Up to the terminator: the text is whole, so a pair without its second half is a fault, not cut.
+        if (!pool::KeyOfWide(text, SIZE_MAX, key, units)) return {};
         if (units == 0) return CPPoolString::pempty;
         block = Block::Acquire(block);
         holder.free();

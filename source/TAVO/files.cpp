@@ -60,7 +60,7 @@ void Report(ulong32* target, std::uint32_t count) {
 
 } // namespace
 
-// --- CFile -----------------------------------------------------------------------------------------------------------
+// --- CFile ----------------------------------------------------------------------------------------------------------
 
 CFile& CFile::operator=(CFile&& other) noexcept {
     if (this == &other) return *this;
@@ -137,8 +137,7 @@ bool CFile::RenameFile(const wchar_t* from, const wchar_t* to) noexcept {
     return HasText(from) && HasText(to) && Platform::RenameWithoutReplacing(from, to);
 }
 
-// --- tests and actions
-// -------------------------------------------------------------------------------------------------
+// --- tests and actions ----------------------------------------------------------------------------------------------
 
 bool _TestFileExists(const wchar_t* path) noexcept {
     return HasText(path) && Platform::GetPathKind(path) == Platform::PathKind::File;
@@ -152,8 +151,7 @@ bool _TestDirExists(const wchar_t* path) noexcept {
 
 bool _CreateDir(const wchar_t* path) noexcept { return HasText(path) && Platform::MakeDirectory(path); }
 
-// --- enumeration
-// -------------------------------------------------------------------------------------------------------
+// --- enumeration ----------------------------------------------------------------------------------------------------
 
 namespace {
 

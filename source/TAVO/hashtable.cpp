@@ -1,5 +1,7 @@
 // The hash table: sorted buckets behind an index of 2^n handles.
 
+#include "hashtable.h"
+
 #include "diagnostics.h"
 #include "objectvector.h"
 
@@ -14,46 +16,6 @@ namespace TAVO::Lookup {
 using Buffers::CPObjectMemory;
 
 namespace {
-
-// First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed from
-// the value and the search widens from there: one or two cache lines instead of a line per halving. Hashes that are not
-// spread cost twice a bisection.
-std::size_t LowerBoundByHash(const CBaseHashTable::HASHENTRY* entries, std::size_t count, unsigned long long hash) {
-    if (count == 0) return 0;
-    std::size_t low = 0, high = count; // entries before low are below, entries from high on are not
-    std::size_t guess = static_cast<std::size_t>(((hash >> 32) * count) >> 32);
-    if (entries[guess].hash < hash) {
-        low = guess + 1;
-        for (std::size_t step = 1; low < high; step *= 2) {
-            const std::size_t probe = low + step - 1;
-            if (probe >= high) break;
-            if (entries[probe].hash >= hash) {
-                high = probe;
-                break;
-            }
-            low = probe + 1;
-        }
-    } else {
-        high = guess;
-        for (std::size_t step = 1; low < high; step *= 2) {
-            if (step > high) break;
-            const std::size_t probe = high - step;
-            if (entries[probe].hash < hash) {
-                low = probe + 1;
-                break;
-            }
-            high = probe;
-        }
-    }
-    while (low < high) {
-        const std::size_t middle = low + (high - low) / 2;
-        if (entries[middle].hash < hash)
-            low = middle + 1;
-        else
-            high = middle;
-    }
-    return low;
-}
 
 bool SameBlock(const CPObjectMemory& a, const CPObjectMemory& b) { return a.key() == b.key(); }
 
@@ -76,14 +38,7 @@ void CBaseHashTable::OnDispose(const CPObjectMemory&) {}
 
 void CBaseHashTable::ClearTable() noexcept { m_index.free(); }
 
-CBaseHashTable::Bucket* CBaseHashTable::Buckets() const noexcept {
-    // Buckets are handles of object memory like all others; what they hold is checked where they are used.
-    static_assert(sizeof(Bucket) == sizeof(CPObjectMemory));
-    std::size_t count;
-    return static_cast<Bucket*>(m_index.GetArray(count));
-}
-
-bool CBaseHashTable::EnsureIndex() noexcept { return !m_index.isEmpty() || m_index.Alloc(m_buckets); }
+CBaseHashTable::Bucket* CBaseHashTable::Buckets() const noexcept { return TableAccess::Buckets(*this); }
 
 unsigned long long CBaseHashTable::GetNItems() const noexcept {
     unsigned long long items = 0;
@@ -92,49 +47,32 @@ unsigned long long CBaseHashTable::GetNItems() const noexcept {
     return items;
 }
 
-// The order of {hash, probe} against an entry: below 0, 0 or above 0.
-int CBaseHashTable::CompareEntry(const HASHENTRY& entry, unsigned long long hash, const CPObjectMemory& probe) {
-    if (hash != entry.hash) return hash > entry.hash ? 1 : -1;
-    if (SameBlock(probe, entry.item) || !probe.key() || !entry.item.key()) return 0;
-    const long32 order = CompareItems(probe, entry.item);
-    return order < 0 ? -1 : order > 0;
-}
-
 CBaseHashTable::Place CBaseHashTable::Locate(unsigned long long hash, const CPObjectMemory& probe) noexcept {
-    Place place{static_cast<std::size_t>(hash & m_mask), 0, false};
-    const Bucket* buckets = Buckets();
-    if (!buckets) return place;
-    std::size_t count;
-    const HASHENTRY* entries = buckets[place.bucket].GetArray(count);
-    place.index = LowerBoundByHash(entries, count, hash);
-    // Entries of equal hash stand in the order of their items; nearly always there is one. Bisect the run.
-    std::size_t end = place.index;
-    for (std::size_t step = 1; end < count && entries[end].hash == hash; step *= 2) end += step;
-    if (end > count) end = count;
-    while (place.index < end) {
-        const std::size_t middle = place.index + (end - place.index) / 2;
-        const int order = CompareEntry(entries[middle], hash, probe);
-        if (order > 0) {
-            place.index = middle + 1;
-        } else {
-            end = middle;
-            place.found = order == 0;
-        }
+    const auto order = [&](const CPObjectMemory& item) {
+        if (SameBlock(probe, item) || !probe.key() || !item.key()) return 0;
+        const long32 compared = CompareItems(probe, item);
+        return compared < 0 ? -1 : compared > 0 ? 1 : 0;
+    };
+    try {
+        return TableAccess::Locate(*this, hash, order);
+    } catch (...) {
+        // Nothing is found there, and nothing can be inserted.
+        return {static_cast<std::size_t>(hash & m_mask), Buffers::NotFound, false};
     }
-    return place;
 }
 
 CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
     return Buckets()[place.bucket][place.index];
 }
 
-bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, const CPObjectMemory& item) noexcept {
-    return EnsureIndex() && Buckets()[place.bucket].Insert(HASHENTRY{hash, item}, place.index);
+bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, CPObjectMemory&& item) noexcept {
+    if (place.index == Buffers::NotFound) return false; // the comparison threw
+    if (m_index.isEmpty() && !m_index.Alloc(m_buckets)) return false;
+    return Buckets()[place.bucket].Put(hash, std::move(item), place.index);
 }
 
-void CBaseHashTable::Remove(std::size_t bucket, std::size_t index) noexcept {
-    // The vector closes its gap before it releases the item, and the bucket goes with its last entry.
-    Buckets()[bucket].Delete(index, true);
+CPObjectMemory CBaseHashTable::RemoveAt(const Place& place) noexcept {
+    return Buckets()[place.bucket].Take(place.index);
 }
 
 CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMemory& item,
@@ -142,7 +80,7 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
     if (!item.key()) return {};
     const bool byHash = collision == eHashKeepByHash || collision == eHashReplaceByHash;
     const Place place = Locate(hash, byHash ? CPObjectMemory() : item);
-    if (!place.found) return InsertAt(place, hash, item) ? item : CPObjectMemory();
+    if (!place.found) return InsertAt(place, hash, CPObjectMemory(item)) ? item : CPObjectMemory();
 
     switch (collision) {
     case eHashKeep:
@@ -154,10 +92,10 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
     }
     case eHashReplaceByHash: {
         // The new item may belong elsewhere among the entries of its hash: out with the old one, in at the right place.
-        const CPObjectMemory added(item), old(At(place).item);
-        Bucket& bucket = Buckets()[place.bucket];
-        bucket.Delete(place.index, false); // keeps the room, so the insertion cannot fail
-        InsertAt(Locate(hash, added), hash, added);
+        // Taking out keeps the room, so the insertion cannot fail.
+        const CPObjectMemory added(item), old(Buckets()[place.bucket].Take(place.index, false));
+        const Place ordered = Locate(hash, added);
+        InsertAt(ordered.index == Buffers::NotFound ? place : ordered, hash, CPObjectMemory(added));
         return added;
     }
     default:
@@ -173,7 +111,7 @@ CPObjectMemory CBaseHashTable::FindItem(unsigned long long hash, const CPObjectM
 bool CBaseHashTable::DeleteItem(unsigned long long hash, const CPObjectMemory& probe) noexcept {
     if (m_index.isEmpty()) return true;
     const Place place = Locate(hash, probe);
-    if (place.found) Remove(place.bucket, place.index);
+    if (place.found) RemoveAt(place);
     return place.found;
 }
 
@@ -225,7 +163,7 @@ bool CBaseHashTable::PurgeTable(IBaseHashTableEnum* visitor) noexcept {
                 // The visitor may have moved the entry: remove what it rejected, not what stands there now.
                 if (Buckets() && index < Buckets()[bucket].GetNItems() &&
                     SameBlock(Buckets()[bucket][index].item, entry.item))
-                    Remove(bucket, index);
+                    Buckets()[bucket].Take(index);
             }
         return true;
     } catch (...) {
@@ -244,6 +182,7 @@ bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
         }
         return true;
     } catch (...) {
+        m_cursor = (m_cursor + 1) & m_mask; // one item that always throws must not keep the sweep from all others
         return false;
     }
 }
@@ -258,7 +197,7 @@ void CBaseHashTable::DisposeEntry(std::size_t bucket, std::size_t index) {
     const CPObjectMemory item(Buckets()[bucket][index].item);
     if (!IsDisposable(item)) return;
     OnDispose(item);
-    if (stands(&item)) Remove(bucket, index);
+    if (stands(&item)) Buckets()[bucket].Take(index);
 }
 
 } // namespace TAVO::Lookup

@@ -6,6 +6,7 @@
 
 #include <mutex>
 #include <TAVO/core.h>
+#include <TAVO/develop.h>
 
 namespace TAVO {
 
@@ -137,6 +138,14 @@ bool AppInit() {
 }
 
 void AppExit() { g_services.Leave(); }
+
+namespace Develop {
+
+tagSWITCHES GetSwitches() noexcept {
+    return {g_switches.assertBox, g_switches.logFailedHResult, g_switches.breakOnHResult};
+}
+
+} // namespace Develop
 
 namespace Core::OS {
 

@@ -22,32 +22,6 @@ struct Logger {
 
 constinit std::atomic<Logger> g_logger{Logger{nullptr}};
 
-// Lets one thread show boxes at a time; that thread may show a nested one, since a box runs the host's message
-// handlers. Constant-initialised and never destroyed: statics of others may assert before our constructors and after
-// our destructors.
-class AssertionLock {
-public:
-    void lock() noexcept {
-        const std::uint32_t self = Platform::GetThreadId();
-        if (m_owner.load(std::memory_order_relaxed) != self) {
-            m_mutex.lock();
-            m_owner.store(self, std::memory_order_relaxed);
-        }
-        ++m_depth;
-    }
-
-    void unlock() noexcept {
-        if (--m_depth) return;
-        m_owner.store(0, std::memory_order_relaxed);
-        m_mutex.unlock();
-    }
-
-private:
-    Platform::Mutex m_mutex;
-    std::atomic<std::uint32_t> m_owner{0};
-    std::uint32_t m_depth = 0; // the owner's alone
-};
-
 constinit AssertionLock g_assertionLock;
 
 // Every line of the host's logger leaves the library here.

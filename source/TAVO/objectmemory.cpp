@@ -120,6 +120,7 @@ bool CPObjectMemory::Reserve(std::size_t capacity, const tagCPOVTABL* table) noe
 }
 
 bool CPObjectMemory::IsPrivate() const noexcept { return m_pMH && LoadCount(m_pMH) == 1; }
+bool CPObjectMemory::IsStatic() const noexcept { return m_pMH && LoadCount(m_pMH) <= 0; }
 
 bool CPObjectMemory::Incalloc(std::size_t extra) noexcept {
     if (!extra || !IsPrivate()) return false;
@@ -133,13 +134,12 @@ bool CPObjectMemory::Incalloc(std::size_t extra) noexcept {
 }
 
 bool CPObjectMemory::SetSize(std::size_t size) noexcept {
-    // A static block may lie in read-only memory.
-    if (!m_pMH || LoadCount(m_pMH) <= 0 || size > m_pMH->sAllocated) return false;
+    if (!m_pMH || IsStatic() || size > m_pMH->sAllocated) return false;
     m_pMH->sUsed = size;
     return true;
 }
 
-bool CPObjectMemory::clone() {
+bool CPObjectMemory::clone() noexcept {
     if (!m_pMH) return true;
     const std::int32_t count = LoadCount(m_pMH);
     if (count <= 0) diagnostics::RuntimeAssumptionFailed("m_pMH->lRefCnt>0");

@@ -82,6 +82,8 @@ template <class T> bool CPObjectVector<T>::GrowTo(std::size_t capacity) noexcept
     return true;
 }
 
+template <class T> bool CPObjectVector<T>::LeaveStatic() noexcept { return !IsStatic() || GrowTo(GetNItems()); }
+
 template <class T> bool CPObjectVector<T>::Reserve(std::size_t count) noexcept {
     if (count <= GetNItems()) return true;
     if (IsPrivate() && count * sizeof(T) <= GetAllocSize() && count <= detail::kMostElements) return true;
@@ -93,46 +95,53 @@ template <class T> bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
     if (count == old) return true;
     if (count > detail::kMostElements) return false;
     if (count < old) {
+        if (!LeaveStatic()) return false;
         // One at a time from the end: a finalizer that looks at the vector never sees a dead element.
         for (std::size_t last = old; last-- > count;) {
-            T gone(std::move(Elements()[last]));
-            if (!SetSize(last * sizeof(T))) {
-                ::new (static_cast<void*>(Elements() + last)) T(std::move(gone));
-                return false;
-            }
+            const T gone(std::move(Elements()[last]));
+            SetSize(last * sizeof(T));
         }
         return true;
     }
-    if (count * sizeof(T) > GetAllocSize() && !GrowTo(count)) return false;
+    if ((IsStatic() || count * sizeof(T) > GetAllocSize()) && !GrowTo(count)) return false;
     _create(Elements() + old, (count - old) * sizeof(T));
     return SetSize(count * sizeof(T));
 }
 
 template <class T> bool CPObjectVector<T>::Insert(const T& element, std::size_t position) noexcept {
-    const std::size_t count = GetNItems();
     T inserted(element); // counted before anything moves: the argument may live in this very vector
     // Growth is linear by 16 elements on purpose: most vectors are short, and long ones are reserved by their builders.
-    if (GetSize() + sizeof(T) > GetAllocSize() && !GrowTo(count + 16)) return false;
-    if (!SetSize((count + 1) * sizeof(T))) return false; // a static block
+    return InsertMoved(std::move(inserted), position, GetNItems() + 16);
+}
+
+template <class T>
+bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept {
+    const std::size_t count = GetNItems();
+    if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(capacityWhenFull)) return false;
+    SetSize((count + 1) * sizeof(T));
     if (position > count) position = count;
     T* slot = Elements() + position;
     std::memmove(static_cast<void*>(slot + 1), static_cast<const void*>(slot), (count - position) * sizeof(T));
-    ::new (static_cast<void*>(slot)) T(std::move(inserted));
+    ::new (static_cast<void*>(slot)) T(std::move(element));
     return true;
 }
 
 template <class T> bool CPObjectVector<T>::Delete(std::size_t index, bool releaseWhenEmpty) noexcept {
-    const std::size_t count = GetNItems();
-    if (index >= count) return false;
-    T* slot = Elements() + index;
-    if (!SetSize((count - 1) * sizeof(T))) return false; // a static block
+    if (index >= GetNItems() || !LeaveStatic()) return false;
+    Extract(index, releaseWhenEmpty);
+    return true;
+}
+
+template <class T> T CPObjectVector<T>::Extract(std::size_t index, bool releaseWhenEmpty) noexcept {
     // The element leaves and the gap closes before anything is released: a finalizer may look at the vector.
-    alignas(T) unsigned char storage[sizeof(T)];
-    std::memcpy(storage, static_cast<const void*>(slot), sizeof(T));
+    const std::size_t count = GetNItems();
+    T* slot = Elements() + index;
+    T taken(std::move(*slot));
+    slot->~T();
+    SetSize((count - 1) * sizeof(T));
     std::memmove(static_cast<void*>(slot), static_cast<const void*>(slot + 1), (count - 1 - index) * sizeof(T));
     if (count == 1 && releaseWhenEmpty) free();
-    std::launder(reinterpret_cast<T*>(storage))->~T();
-    return true;
+    return taken;
 }
 
 template <class T> std::size_t CPObjectVector<T>::Find(const T& element, std::size_t afterIndex) const noexcept {
@@ -144,7 +153,7 @@ template <class T> std::size_t CPObjectVector<T>::Find(const T& element, std::si
 }
 
 template <class T> void CPObjectVector<T>::Sort(int (*compare)(const void*, const void*)) noexcept {
-    Buffers::Sort::vfqsort(Elements(), GetNItems(), sizeof(T), compare);
+    if (GetNItems() > 1 && LeaveStatic()) Buffers::Sort::vfqsort(Elements(), GetNItems(), sizeof(T), compare);
 }
 
 } // namespace TAVO::Buffers

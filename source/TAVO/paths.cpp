@@ -50,9 +50,10 @@ private:
     std::size_t m_length = 0;
 };
 
-// --- roots
-// ------------------------------------------------------------------------------------------------------------- Each
-// returns the units its form of root takes at the start of `path`, 0 when the path does not start with that form.
+// --- roots ----------------------------------------------------------------------------------------------------------
+//
+// Each function returns the units its form of root takes at the start of `path`, 0 when the path does not start with
+// that form.
 
 // "server\share\", the last separator optional; neither name may be empty.
 std::size_t MatchShare(const wchar_t* path) {
@@ -107,8 +108,7 @@ ePathRoot MatchRoot(const wchar_t* path, std::size_t& length) {
     return PathRootNone;
 }
 
-// --- parts
-// -------------------------------------------------------------------------------------------------------------
+// --- parts ----------------------------------------------------------------------------------------------------------
 
 bool IsDots(const wchar_t* name, std::size_t length) {
     return name[0] == L'.' && (length == 1 || (length == 2 && name[1] == L'.'));
@@ -144,8 +144,7 @@ wchar_t MissingSeparator(const tagPATHPARSEINFO& info) {
     return L'/';
 }
 
-// --- straight paths
-// ----------------------------------------------------------------------------------------------------
+// --- straight paths -------------------------------------------------------------------------------------------------
 
 bool IsForbidden(wchar_t c) {
     if (c < 0x20 || (c >= 0x7F && c < 0xA0)) return true;

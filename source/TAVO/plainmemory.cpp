@@ -1,5 +1,6 @@
 // The shared byte buffer.
 
+#include <algorithm>
 #include <cstring>
 #include <TAVO/buffers.h>
 
@@ -30,14 +31,11 @@ bool CPPlainMemory::_Alloc(std::size_t size, const tagCPOVTABL* table) noexcept 
 
 bool CPPlainMemory::_Resize(std::size_t size, const tagCPOVTABL* table) noexcept {
     if (size == GetSize()) return true;
-    if (size > GetSize() && size > GetAllocSize()) {
-        tagCPOMEMHEADER* grown = NewBlock(size, size, table);
-        if (!grown) return false;
-        if (m_pMH) {
-            std::memmove(grown + 1, m_pMH + 1, m_pMH->sUsed);
-            Free(m_pMH);
-        }
-        m_pMH = grown;
+    if (size > GetAllocSize() || IsStatic()) {
+        tagCPOMEMHEADER* block = NewBlock(size, size, table);
+        if (!block) return false;
+        if (m_pMH) std::memmove(block + 1, m_pMH + 1, std::min(size, GetSize()));
+        Free(std::exchange(m_pMH, block));
         return true;
     }
     // Intended: the block changes in place even when it is shared, so every holder sees the new size. A textbook buffer

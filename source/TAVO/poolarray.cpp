@@ -58,13 +58,24 @@ CPPoolStringArray& CPPoolStringArray::operator=(const Buffers::CPObjectMemory& b
         m_elements = static_cast<const Elements&>(block);
     else
         m_elements.free();
-    if (m_sorted) Sort();
+    if (!m_sorted) return *this;
+    Sort();
+    // Without memory for a copy of its own a shared block stays as it is, and a set out of order finds nothing.
+    if (!IsInOrder()) m_elements.free();
     return *this;
+}
+
+bool CPPoolStringArray::IsInOrder() const noexcept {
+    std::size_t count;
+    const CPPoolString* elements = m_elements.GetArray(count);
+    for (std::size_t i = 1; i < count; ++i)
+        if (elements[i - 1].cmp(elements[i]) > 0) return false;
+    return true;
 }
 
 void CPPoolStringArray::Sort() noexcept {
     // Copies of the array share the block: they must not see it change.
-    if (m_elements.clone()) m_elements.Sort(CompareTexts);
+    if (!IsInOrder() && m_elements.clone()) m_elements.Sort(CompareTexts);
 }
 
 std::size_t CPPoolStringArray::LocateEntry(const CPPoolString& text) const noexcept {
@@ -106,6 +117,15 @@ CPPoolString CPPoolStringArray::Flatten(wchar_t separator) const noexcept {
     return CStringPool::GetStringRef(&joined);
 }
 
+bool CPPoolStringArray::AddPiece(const wchar_t* start, std::size_t units) noexcept {
+    CSubStringSubmitter cut(start, units);
+    const CPPoolString piece = units ? CStringPool::GetStringRef(&cut) : CPPoolString();
+    // A piece with half a pair cannot be interned and is the null string; any other failed for want of memory.
+    pool::Key key;
+    if (units && piece.isnull() && pool::KeyOfUnits(start, units, key)) return false;
+    return Add(piece);
+}
+
 bool CPPoolStringArray::Inflate(const CPPoolString& text, wchar_t separator) noexcept {
     const CPPoolString source(text); // may live in the elements that go now
     m_elements.free();
@@ -118,13 +138,12 @@ bool CPPoolStringArray::Inflate(const CPPoolString& text, wchar_t separator) noe
     if (!m_elements.Reserve(pieces)) return false;
     for (const wchar_t* unit = piece; separator && unit < end; ++unit) {
         if (*unit != separator) continue;
-        CSubStringSubmitter cut(piece, static_cast<std::size_t>(unit - piece));
-        if (!Add(unit == piece ? CPPoolString() : CStringPool::GetStringRef(&cut))) return false;
+        if (!AddPiece(piece, static_cast<std::size_t>(unit - piece))) return false;
         piece = unit + 1;
     }
-    if (piece == end) return true; // Intended: a trailing empty piece adds nothing, others add the null string
-    CSubStringSubmitter last(piece, static_cast<std::size_t>(end - piece));
-    return Add(CStringPool::GetStringRef(&last));
+    // Intended: a trailing empty piece adds nothing, while others add the null string. A textbook split would treat all
+    // alike; lists that end in a separator would grow by an element.
+    return piece == end || AddPiece(piece, static_cast<std::size_t>(end - piece));
 }
 
 } // namespace TAVO::String

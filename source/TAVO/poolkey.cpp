@@ -2,7 +2,7 @@
 
 #include "poolkey.h"
 
-#include "crc64.h"
+#include "crc64fold.h"
 #include "transcoding.h"
 
 #include <cstring>
@@ -77,6 +77,15 @@ constexpr bool MayHoldSurrogate(std::uint64_t units) { return (units & (units <<
 
 constexpr std::size_t Utf8SizeOf(std::uint16_t unit) { return 1 + (unit >= 0x80) + (unit >= 0x800); }
 
+bool IsAscii(const unsigned char* text, std::size_t count) {
+    std::size_t i = 0;
+    for (; count - i >= Simd::kBlock; i += Simd::kBlock)
+        if (Simd::Mask(Simd::Load(text + i))) return false;
+    unsigned char all = 0;
+    for (; i < count; ++i) all |= text[i];
+    return all < 0x80;
+}
+
 // Four ASCII bytes as four units.
 constexpr std::uint64_t Widen(std::uint32_t bytes) {
     std::uint64_t v = bytes;
@@ -84,8 +93,113 @@ constexpr std::uint64_t Widen(std::uint32_t bytes) {
     return (v | v << 8) & 0x00FF00FF00FF00FF;
 }
 
+// Texts shorter than this take the tables: folding has to be reduced at the end.
+constexpr std::size_t kFewUnits = 8;
+
+#if defined(TAVO_CRC_FOLDS)
+
+// Both checksums of a text of eight units or more, eight or sixteen at a step. The first step takes what is left over.
+class Folder {
+public:
+    // One block or two, and the same in lower case; `capitals` tells whether the two differ.
+    template <class... Blocks>
+    TAVO_MULTIPLIES void Add(bool capitals, Blocks... blocks) {
+        if (capitals && !m_folded) {
+            m_folded = true;
+            m_lower = m_exact;
+        }
+        m_exact.Add(blocks...);
+    }
+    template <class... Blocks>
+    TAVO_MULTIPLIES void AddLower(Blocks... blocks) {
+        if (m_folded) m_lower.Add(blocks...);
+    }
+    TAVO_MULTIPLIES void Store(Key& key) const {
+        key.hash = m_exact.Checksum();
+        key.hashi = m_folded ? m_lower.Checksum() : key.hash;
+    }
+
+private:
+    crc64::Fold m_exact, m_lower;
+    bool m_folded = false;
+};
+
+// Moves the first `bytes` bytes to the low end, the first one highest, and clears the rest.
+TAVO_MULTIPLIES inline Simd::Block Reverse(Simd::Block block, std::size_t bytes) {
+    alignas(16) static constexpr unsigned char kOrder[32] = {
+        15,   14,   13,   12,   11,   10,   9,    8,    7,    6,    5,    4,    3,    2,    1,    0,
+        0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80};
+    return Simd::Shuffle(block, Simd::Load(kOrder + (16 - bytes)));
+}
+
+TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key& key) {
+    using namespace Simd;
+    // Byte i becomes unit i: its place from the top, a zero byte behind it. Two halves of a block.
+    const Block low = Pair(0x0480058006800780, 0x0080018002800380);
+    const Block high = Pair(0x0C800D800E800F80, 0x088009800A800B80);
+    const auto letters = [](Block bytes) TAVO_MULTIPLIES {
+        return And(Below8(All8('A' - 1), bytes), Below8(bytes, All8('Z' + 1)));
+    };
+    Folder folder;
+    const auto one = [&](Block bytes) TAVO_MULTIPLIES {
+        const Block capitals = letters(bytes);
+        folder.Add(Mask(capitals) != 0, Shuffle(bytes, low));
+        folder.AddLower(Shuffle(Or(bytes, And(capitals, All8(0x20))), low));
+    };
+
+    std::size_t i = count % 8 ? count % 8 : 8;
+    std::uint64_t first;
+    std::memcpy(&first, text, 8);
+    one(Pair(first << 8 * (8 - i), 0));
+    if ((count - i) % kBlock) {
+        std::memcpy(&first, text + i, 8);
+        one(Pair(first, 0));
+        i += 8;
+    }
+    for (; i < count; i += kBlock) {
+        const Block bytes = Load(text + i), capitals = letters(bytes);
+        const Block lower = Or(bytes, And(capitals, All8(0x20)));
+        folder.Add(Mask(capitals) != 0, Shuffle(bytes, low), Shuffle(bytes, high));
+        folder.AddLower(Shuffle(lower, low), Shuffle(lower, high));
+    }
+    key.length = key.utf8Size = count;
+    folder.Store(key);
+}
+
+// False when the text holds a surrogate: it must be decoded.
+TAVO_MULTIPLIES bool FoldUnits(const wchar_t* text, std::size_t count, Key& key) {
+    using namespace Simd;
+    Folder folder;
+    key = Key{};
+    key.length = count;
+    std::size_t taken = count % 8 ? count % 8 : 8;
+    for (std::size_t i = 0; i < count; i += taken, taken = 8) {
+        const Block units = Load(text + i);
+        const Block high = And(units, All16(0xF800));
+        const std::uint32_t present = 0xFFFFu >> (16 - 2 * taken);
+        if (Mask(Equal16(high, All16(0xD800))) & present) return false;
+        // A unit has three bytes, or fewer by these two tests.
+        const std::uint32_t below800 = Mask(Equal16(high, All16(0))) & present;
+        const std::uint32_t below80 = Mask(Equal16(And(units, All16(0xFF80)), All16(0))) & present;
+        key.utf8Size += 3 * taken - static_cast<std::size_t>(std::popcount(below800) + std::popcount(below80)) / 2;
+        const Block letters = And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units));
+        folder.Add((Mask(letters) & present) != 0, Reverse(units, 2 * taken));
+        folder.AddLower(Reverse(Or(units, And(letters, All16(0x20))), 2 * taken));
+    }
+    folder.Store(key);
+    return true;
+}
+
+#endif
+
 // `units` counts what was hashed: all of `count`, but for a pair that the end cuts when `mayCut`.
 bool HashUnits(const wchar_t* text, std::size_t count, bool mayCut, Key& key, std::size_t& units) {
+#if defined(TAVO_CRC_FOLDS)
+    if (count >= kFewUnits && Simd::HasMultiply() && FoldUnits(text, count, key)) {
+        units = count;
+        return true;
+    }
+#endif
     Hasher hasher;
     key = Key{};
     std::size_t i = 0;
@@ -138,6 +252,10 @@ bool KeyOfUnits(const wchar_t* text, std::size_t count, Key& key) {
 
 bool KeyOfUtf8(const unsigned char* text, std::size_t limit, Key& key, std::size_t& bytes) {
     const std::size_t count = Simd::ZeroUnit(text, limit);
+    if (IsAscii(text, count)) {
+        KeyOfAscii(text, bytes = count, key);
+        return true;
+    }
     Hasher hasher;
     key = Key{};
     std::size_t i = 0;
@@ -191,6 +309,9 @@ Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined) {
 }
 
 void KeyOfAscii(const unsigned char* text, std::size_t count, Key& key) {
+#if defined(TAVO_CRC_FOLDS)
+    if (count >= kFewUnits && Simd::HasMultiply()) return FoldAscii(text, count, key);
+#endif
     Hasher hasher;
     std::size_t i = 0;
     for (; count - i >= 4; i += 4) {

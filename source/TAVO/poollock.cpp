@@ -8,30 +8,29 @@
 namespace TAVO::String::pool {
 
 void Lock::Wait() noexcept {
-    // Holds are short: look again a few times before sleeping.
+    // Holds are short: look again for a while before sleeping.
     for (int look = 0; look < 200; ++look) {
         Simd::Pause();
-        std::uint32_t free = kFree;
-        if (m_state.load(std::memory_order_relaxed) == kFree &&
-            m_state.compare_exchange_weak(free, kTaken, std::memory_order_acquire))
-            return;
+        if (!m_taken.load(std::memory_order_relaxed) && Take()) return;
     }
-    // Whoever sleeps has left "awaited" behind, so the holder's exchange tells it to wake somebody; that needs the
-    // mutex, which is held from the exchange here until the sleep has begun. Taking the lock as awaited may wake once
-    // in vain.
     try {
         boost::this_thread::disable_interruption waitingForTheLockIsNoInterruptionPoint;
-        boost::unique_lock<boost::mutex> sleepers(m_sleepers);
-        while (m_state.exchange(kAwaited, std::memory_order_acquire) != kFree) m_left.wait(sleepers);
+        boost::unique_lock<boost::mutex> mutex(m_mutex);
+        m_sleepers.fetch_add(1);
+        if (m_sleepersFlush) Platform::FlushProcessors();
+        // A holder that leaves from here on sees us and wakes under the mutex, which we hold until we sleep.
+        while (!Take()) m_left.wait(mutex);
+        m_sleepers.fetch_sub(1);
     } catch (...) {
-        // The system refused to let us sleep; the lock is needed all the same.
-        while (m_state.exchange(kAwaited, std::memory_order_acquire) != kFree) Platform::YieldThread();
+        // The system refused to let us sleep; the lock is needed all the same. The count stays raised: that only makes
+        // leaving slower.
+        while (!Take()) Platform::YieldThread();
     }
 }
 
 void Lock::WakeOne() noexcept {
     try {
-        boost::lock_guard<boost::mutex> sleepers(m_sleepers);
+        boost::lock_guard<boost::mutex> mutex(m_mutex);
         m_left.notify_one();
     } catch (...) {
     }

@@ -1,5 +1,11 @@
 #pragma once
-// The pool's lock: re-entrant, one exchange when it is free, a Boost mutex and condition for those who wait.
+// The pool's lock: re-entrant, one atomic exchange to take it and none to leave it, a Boost mutex and condition for those
+// who wait.
+//
+// Leaving is a plain store, then a look whether anybody sleeps. Between the two the processor may take the look first, and
+// a sleeper that arrives just then would be missed; so whoever is about to sleep says so and then makes all processors
+// pass a barrier. After that, either the holder sees the sleeper or the sleeper sees the lock free. Where the system
+// offers no such barrier, leaving pays for one.
 
 #include "platform/platform.h"
 #include "simd.h"
@@ -14,46 +20,52 @@ class Lock {
 public:
     void Enter() noexcept {
         const std::uint32_t self = Platform::GetThreadId();
-        // Only the owner itself can find its own number here.
-        if (m_owner.load(std::memory_order_relaxed) == self) {
-            ++m_depth;
-            return;
-        }
-        std::uint32_t free = kFree;
-        if (TAVO_UNLIKELY(!m_state.compare_exchange_strong(free, kTaken, std::memory_order_acquire))) Wait();
-        m_owner.store(self, std::memory_order_relaxed);
-        m_depth = 1;
+        if (IsReentry(self)) return;
+        if (TAVO_UNLIKELY(!Take())) Wait();
+        Own(self);
     }
 
     bool TryEnter() noexcept {
         const std::uint32_t self = Platform::GetThreadId();
-        if (m_owner.load(std::memory_order_relaxed) == self) {
-            ++m_depth;
-            return true;
-        }
-        std::uint32_t free = kFree;
-        if (!m_state.compare_exchange_strong(free, kTaken, std::memory_order_acquire)) return false;
-        m_owner.store(self, std::memory_order_relaxed);
-        m_depth = 1;
+        if (IsReentry(self)) return true;
+        if (!Take()) return false;
+        Own(self);
         return true;
     }
 
     void Leave() noexcept {
         if (--m_depth) return;
         m_owner.store(0, std::memory_order_relaxed);
-        if (TAVO_UNLIKELY(m_state.exchange(kFree, std::memory_order_release) == kAwaited)) WakeOne();
+        m_taken.store(false, std::memory_order_release);
+        if (m_sleepersFlush)
+            std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
+        else
+            std::atomic_thread_fence(std::memory_order_seq_cst);
+        if (TAVO_UNLIKELY(m_sleepers.load(std::memory_order_relaxed) != 0)) WakeOne();
     }
 
 private:
-    enum : std::uint32_t { kFree, kTaken, kAwaited };
+    // Only the owner itself can find its own number there.
+    bool IsReentry(std::uint32_t self) noexcept {
+        if (m_owner.load(std::memory_order_relaxed) != self) return false;
+        ++m_depth;
+        return true;
+    }
+    bool Take() noexcept { return !m_taken.exchange(true, std::memory_order_acquire); }
+    void Own(std::uint32_t self) noexcept {
+        m_owner.store(self, std::memory_order_relaxed);
+        m_depth = 1;
+    }
 
     TAVO_NOINLINE void Wait() noexcept;
     TAVO_NOINLINE void WakeOne() noexcept;
 
-    std::atomic<std::uint32_t> m_state{kFree}; // awaited: taken, and someone sleeps or is about to
-    std::atomic<std::uint32_t> m_owner{0};     // thread id; 0 when free
-    std::uint32_t m_depth = 0;                 // the owner's
-    boost::mutex m_sleepers;
+    std::atomic<bool> m_taken{false};
+    const bool m_sleepersFlush = Platform::CanFlushProcessors();
+    std::atomic<std::uint32_t> m_owner{0};    // thread id; 0 when free
+    std::uint32_t m_depth = 0;                // the owner's
+    std::atomic<std::uint32_t> m_sleepers{0}; // threads that sleep or are about to
+    boost::mutex m_mutex;
     boost::condition_variable m_left;
 };
 

@@ -3,7 +3,6 @@
 #include "pooltables.h"
 
 #include "platform/heap.h"
-#include "transcoding.h"
 
 #include <cstring>
 #include <new>
@@ -13,21 +12,19 @@ namespace TAVO::String {
 using Buffers::Block;
 using Buffers::CPObjectMemory;
 using Buffers::tagCPOMEMHEADER;
+using Lookup::TableAccess;
+using pool::StoredText;
 
 namespace {
 
 constexpr std::uint32_t kIndexLength = 12; // 4096 buckets
 
-// Intended: once length and both hashes agree, ten units of the actual texts decide, so two texts that agree so far are
-// one entry. A textbook pool would compare them whole; look-ups here never touch more than the first cache lines.
-constexpr std::size_t kComparedUnits = 10;
-
-// The case variants of one text.
+// The case variants of one text, at least one of them with a capital letter.
 struct Group {
     tagCPOMEMHEADER* representative; // the variant interned first of those present
     std::uint32_t variants;          // entries in the group
     std::uint32_t capacity;          // of `others`
-    tagCPOMEMHEADER** others;        // the other variants in the order of interning; null while there is one
+    tagCPOMEMHEADER** others;        // the other variants in the order of interning
 };
 
 void CreateNothing(void*, std::size_t) {}
@@ -36,12 +33,20 @@ void* NoInterface(void*, const _acfUID&) { return nullptr; }
 
 constexpr Buffers::tagCPOVTABL kGroupTable = {CreateNothing, nullptr, FinalizeGroup, NoInterface};
 
+// An item is a record or, uncounted, the only entry of its group.
+bool IsRecord(const CPObjectMemory& item) { return Block::Of(item)->pVTbl == &kGroupTable; }
 Group& GroupOf(const CPObjectMemory& record) { return *Block::PayloadOf<Group>(record); }
+
+// Lets go of an item that may be an uncounted entry.
+void LetGo(CPObjectMemory&& item) {
+    if (!IsRecord(item)) Block::RefOf(item) = nullptr;
+    item.free();
+}
 
 bool AddVariant(Group& group, tagCPOMEMHEADER* entry) {
     const std::uint32_t others = group.variants - 1;
     if (others == group.capacity) {
-        const std::uint32_t capacity = group.capacity ? group.capacity * 2 : 4;
+        const std::uint32_t capacity = group.capacity ? group.capacity * 2 : 2;
         const std::size_t size = capacity * sizeof(tagCPOMEMHEADER*);
         void* grown = group.others ? Platform::Reallocate(group.others, size) : Platform::Allocate(size);
         if (!grown) return false;
@@ -53,88 +58,103 @@ bool AddVariant(Group& group, tagCPOMEMHEADER* entry) {
     return true;
 }
 
-// When the representative goes, the earliest interned of the others takes its place.
-void RemoveVariant(Group& group, const tagCPOMEMHEADER* entry) {
-    std::uint32_t others = group.variants - 1, gone = 0;
+// When the representative goes, the earliest interned of the others takes its place. False when the entry is no
+// variant.
+bool RemoveVariant(Group& group, const tagCPOMEMHEADER* entry) {
+    const std::uint32_t others = group.variants - 1;
+    std::uint32_t gone = 0; // of `others`
     if (group.representative == entry) {
         group.representative = others ? group.others[0] : nullptr;
     } else {
         while (gone < others && group.others[gone] != entry) ++gone;
-        if (gone == others) return;
+        if (gone == others) return false;
     }
     --group.variants;
     if (others) std::memmove(group.others + gone, group.others + gone + 1, (others - 1 - gone) * sizeof(*group.others));
-}
-
-// A group of one entry that stands on the stack to be searched for. A count of 0 makes it static: never freed.
-class Wanted {
-public:
-    explicit Wanted(tagCPOMEMHEADER* entry)
-        : m_header{0, sizeof(Group), sizeof(Group), &kGroupTable}, m_group{entry, 1, 0, nullptr},
-          m_handle(Block::Adopt(&m_header)) {}
-    Wanted(const Wanted&) = delete;
-    Wanted& operator=(const Wanted&) = delete;
-    operator const CPObjectMemory&() const { return m_handle; }
-
-private:
-    tagCPOMEMHEADER m_header;
-    Group m_group; // directly behind its header, as in a block
-    CPObjectMemory m_handle;
-};
-
-} // namespace
-
-CCaseInsensitiveHash::CCaseInsensitiveHash() : CBaseHashTable(kIndexLength) {}
-
-tagCPOMEMHEADER* CCaseInsensitiveHash::Find(tagCPOMEMHEADER* probe) noexcept {
-    const Place place = Locate(EntryOf(probe).hashi, Wanted(probe));
-    if (!place.found) return nullptr;
-    tagCPOMEMHEADER* found = GroupOf(At(place).item).representative;
-    if (!found) complaint = "Case-insensitive match of case-sensitive cache MUST exist";
-    return found;
-}
-
-bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry) noexcept {
-    const unsigned long long hash = EntryOf(entry).hashi;
-    const Place place = Locate(hash, Wanted(entry));
-    if (place.found) return AddVariant(GroupOf(At(place).item), entry);
-    tagCPOMEMHEADER* block = Block::NewBlock(sizeof(Group), sizeof(Group), &kGroupTable);
-    if (!block) return false;
-    ::new (static_cast<void*>(block + 1)) Group{entry, 1, 0, nullptr};
-    return InsertAt(place, hash, Block::Adopt(block));
-}
-
-bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
-    const unsigned long long hash = EntryOf(entry).hashi;
-    const Place place = Locate(hash, Wanted(entry));
-    if (!place.found) return false;
-    const CPObjectMemory record(At(place).item);
-    if (GroupOf(record).variants == 1) return DeleteItem(hash, record);
-    RemoveVariant(GroupOf(record), entry);
     return true;
 }
 
-long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {
-    tagCPOMEMHEADER *a = GroupOf(first).representative, *b = GroupOf(second).representative;
-    if (a == b || !a || !b) return 0;
-    const PoolEntry &x = EntryOf(a), &y = EntryOf(b);
-    if (x.length != y.length) return x.length < y.length ? -1 : 1;
-    return wcsncmpi(x.text, y.text, kComparedUnits);
+} // namespace
+
+// --- groups ----------------------------------------------------------------------------------------------------------
+
+CCaseInsensitiveHash::CCaseInsensitiveHash() : CBaseHashTable(kIndexLength) {}
+
+tagCPOMEMHEADER* CCaseInsensitiveHash::RepresentativeOf(const CPObjectMemory& item) {
+    return IsRecord(item) ? GroupOf(item).representative : Block::Of(item);
 }
+
+bool CCaseInsensitiveHash::MakeRecord(CPObjectMemory& item, tagCPOMEMHEADER* first, tagCPOMEMHEADER* second) noexcept {
+    tagCPOMEMHEADER* block = Block::NewBlock(sizeof(Group), sizeof(Group), &kGroupTable);
+    if (!block) return false;
+    CPObjectMemory record(Block::Adopt(block));
+    Group& group = *::new (static_cast<void*>(block + 1)) Group{first, 1, 0, nullptr};
+    if (!AddVariant(group, second)) return false;
+    std::swap(Block::RefOf(item), Block::RefOf(record));
+    if (record.key()) LetGo(std::move(record));
+    return true;
+}
+
+bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash& entries) noexcept {
+    const StoredText text(EntryOf(entry));
+    const Place place = LocateGroup(text);
+    if (place.found) {
+        CPObjectMemory& item = TableAccess::Item(*this, place);
+        return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
+    }
+    if (IsCaseless(text.key)) return true; // alone, and found by its own hash
+    CPObjectMemory item;
+    if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
+        if (!MakeRecord(item, lower, entry)) return false;
+    } else {
+        item = Block::Adopt(entry);
+    }
+    if (InsertAt(place, text.key.hashi, std::move(item))) return true;
+    LetGo(std::move(item));
+    return false;
+}
+
+bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
+    const StoredText text(EntryOf(entry));
+    const Place place = LocateGroup(text);
+    if (!place.found) return IsCaseless(text.key);
+    CPObjectMemory& item = TableAccess::Item(*this, place);
+    if (!IsRecord(item)) {
+        if (Block::Of(item) != entry) return false;
+    } else if (GroupOf(item).variants > 1) {
+        return RemoveVariant(GroupOf(item), entry);
+    }
+    LetGo(RemoveAt(place));
+    return true;
+}
+
+void CCaseInsensitiveHash::Clear() noexcept {
+    TableAccess::Bucket* buckets = TableAccess::Buckets(*this);
+    for (std::size_t i = 0; buckets && i <= 0xFFF; ++i)
+        while (!buckets[i].isEmpty()) LetGo(buckets[i].Take(buckets[i].GetNItems() - 1));
+    ClearTable();
+}
+
+long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {
+    const PoolEntry &a = EntryOf(RepresentativeOf(first)), &b = EntryOf(RepresentativeOf(second));
+    if (a.length != b.length) return a.length < b.length ? -1 : 1;
+    return StoredText(a).CompareFolded(b.text);
+}
+
+// --- entries ---------------------------------------------------------------------------------------------------------
 
 CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : CBaseHashTable(kIndexLength), m_groups(groups) {}
 
-tagCPOMEMHEADER* CCaseSensitiveHash::Find(tagCPOMEMHEADER* probe, Place& place) noexcept {
-    place = Locate(EntryOf(probe).hash, Block::Adopt(probe)); // a static block: adopting and letting go count nothing
-    return place.found ? Block::Of(At(place).item) : nullptr;
-}
-
-bool CCaseSensitiveHash::Add(const Place& place, const CPObjectMemory& entry) noexcept {
+bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry) noexcept {
     tagCPOMEMHEADER* block = Block::Of(entry);
-    if (!InsertAt(place, EntryOf(block).hash, entry)) return false;
-    if (m_groups.Add(block)) return true;
-    DeleteItem(EntryOf(block).hash, entry);
-    return false;
+    // The group first: it looks for a lower-case variant, which must not be the entry itself.
+    if (!m_groups.Add(block, *this)) return false;
+    if (!InsertAt(place, EntryOf(block).hash, std::move(entry))) {
+        m_groups.Remove(block);
+        return false;
+    }
+    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].GetNItems();
+    return true;
 }
 
 long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) {
@@ -142,7 +162,7 @@ long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObj
     if (a.hash != b.hash) return a.hash < b.hash ? -1 : 1;
     if (a.hashi != b.hashi) return a.hashi < b.hashi ? -1 : 1;
     if (a.length != b.length) return a.length < b.length ? -1 : 1;
-    return detail::WideCompareN(a.text, b.text, kComparedUnits);
+    return StoredText(a).Compare(b.text);
 }
 
 // The argument, the walk and the table hold the entry: with a count of 3 nobody else does. Then no handle is left to

@@ -2,45 +2,50 @@
 // The pool's two tables: entries by their text, and groups of entries that differ only in case.
 // Threads: the pool's lock is held around every call.
 
-#include "poolentry.h"
-
-#include <TAVO/lookup.h>
+#include "hashtable.h"
+#include "pooltext.h"
 
 namespace TAVO::String {
 
-// Groups by case-insensitive hash. It counts no entry: otherwise no first variant could ever be swept. An entry that
-// goes leaves its group first.
-class CCaseInsensitiveHash final : public Lookup::CBaseHashTable {
-public:
-    CCaseInsensitiveHash();
+// A text whose key has no capital letter: it is its own lower case.
+inline bool IsCaseless(const pool::Key& key) { return key.hash == key.hashi; }
 
-    // The variant interned first of the group that `probe` belongs to; null when there is none.
-    Buffers::tagCPOMEMHEADER* Find(Buffers::tagCPOMEMHEADER* probe) noexcept;
-    // Puts an entry into its group. False without memory; nothing has changed then.
-    bool Add(Buffers::tagCPOMEMHEADER* entry) noexcept;
-    // Takes an entry out of its group, and the group out of the table with its last entry. False when it has no group.
-    bool Remove(Buffers::tagCPOMEMHEADER* entry) noexcept;
-
-    // Notes what is wrong, to be raised when the lock is left.
-    const char* complaint = nullptr;
-
-private:
-    long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
-};
-
-// Entries by case-sensitive hash; one reference each. Keeps the groups in step.
+// Entries by case-sensitive hash; one reference each.
 class CCaseSensitiveHash final : public Lookup::CBaseHashTable {
 public:
-    explicit CCaseSensitiveHash(CCaseInsensitiveHash& groups);
+    explicit CCaseSensitiveHash(class CCaseInsensitiveHash& groups);
 
     using CBaseHashTable::DisposeTable;
     using CBaseHashTable::EnumTableBy;
     using CBaseHashTable::Place;
 
-    // The entry that equals the probe; else null, and `place` tells where it would stand.
-    Buffers::tagCPOMEMHEADER* Find(Buffers::tagCPOMEMHEADER* probe, Place& place) noexcept;
-    // Enters both tables or none; false without memory.
-    bool Add(const Place& place, const Buffers::CPObjectMemory& entry) noexcept;
+    // The entry of that text; else null, and `place` tells where it would stand.
+    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place) const {
+        place = Lookup::TableAccess::Locate(
+            *this, text.key.hash,
+            [&](const Buffers::CPObjectMemory& item) {
+                const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
+                if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
+                if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+                return text.Compare(entry.text);
+            },
+            m_typicalCount);
+        return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
+    }
+
+    // The entry that is the lower case of the text.
+    template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) const {
+        const auto place = Lookup::TableAccess::Locate(*this, text.key.hashi, [&](const Buffers::CPObjectMemory& item) {
+            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
+            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
+            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+            return text.CompareFolded(entry.text);
+        });
+        return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
+    }
+
+    // Enters both tables or none, taking over the reference; false without memory.
+    bool Add(const Place& place, Buffers::CPObjectMemory&& entry) noexcept;
 
 private:
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
@@ -48,6 +53,54 @@ private:
     void OnDispose(const Buffers::CPObjectMemory& item) override;
 
     CCaseInsensitiveHash& m_groups;
+    std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
+};
+
+// Groups by case-insensitive hash.
+//
+// A text without capital letters that is alone in its group is found in the other table, by the same hash, and has
+// nothing here. A text with capitals that is alone stands here itself. Only two variants and more have a record.
+// Nothing here counts an entry: otherwise no first variant could ever be swept. An entry that goes leaves its group
+// first.
+class CCaseInsensitiveHash final : public Lookup::CBaseHashTable {
+public:
+    CCaseInsensitiveHash();
+
+    // The variant interned first of the group that the text belongs to; null when there is none.
+    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, const CCaseSensitiveHash& entries) noexcept {
+        const Place place = LocateGroup(text);
+        if (!place.found) return entries.FindLowerCase(text);
+        Buffers::tagCPOMEMHEADER* found = RepresentativeOf(Lookup::TableAccess::Item(*this, place));
+        if (!found) complaint = "Case-insensitive match of case-sensitive cache MUST exist";
+        return found;
+    }
+
+    // Puts an entry into its group. False without memory; nothing has changed then.
+    bool Add(Buffers::tagCPOMEMHEADER* entry, const CCaseSensitiveHash& entries) noexcept;
+    // Takes an entry out of its group. False when it should have one and has not.
+    bool Remove(Buffers::tagCPOMEMHEADER* entry) noexcept;
+    // Lets everything go.
+    void Clear() noexcept;
+
+    // Notes what is wrong, to be raised when the lock is left.
+    const char* complaint = nullptr;
+
+private:
+    template <class Text> Place LocateGroup(const Text& text) const {
+        return Lookup::TableAccess::Locate(*this, text.key.hashi, [&](const Buffers::CPObjectMemory& item) {
+            const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
+            if (!block) return 0;
+            const PoolEntry& entry = EntryOf(const_cast<Buffers::tagCPOMEMHEADER*>(block));
+            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+            return text.CompareFolded(entry.text);
+        });
+    }
+    static Buffers::tagCPOMEMHEADER* RepresentativeOf(const Buffers::CPObjectMemory& item);
+    // Replaces what stands at a place by a record of two variants.
+    bool MakeRecord(Buffers::CPObjectMemory& item, Buffers::tagCPOMEMHEADER* first,
+                    Buffers::tagCPOMEMHEADER* second) noexcept;
+
+    long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
 };
 
 } // namespace TAVO::String

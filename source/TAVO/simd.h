@@ -9,6 +9,7 @@
 
 #if (defined(__SSE2__) || defined(_M_X64)) && !defined(TAVO_NO_SIMD)
 #include <tmmintrin.h>
+#include <wmmintrin.h>
 #define TAVO_SSE2 1
 #endif
 
@@ -21,6 +22,11 @@ constexpr std::size_t kBlock = 16;
 using Block = __m128i;
 
 TAVO_INLINE Block Load(const void* p) { return _mm_loadu_si128(static_cast<const Block*>(p)); }
+// Eight bytes from each of two places.
+TAVO_INLINE Block LoadHalves(const void* low, const void* high) {
+    return _mm_unpacklo_epi64(_mm_loadl_epi64(static_cast<const Block*>(low)),
+                              _mm_loadl_epi64(static_cast<const Block*>(high)));
+}
 TAVO_INLINE Block LoadAligned(const void* p) { return _mm_load_si128(static_cast<const Block*>(p)); }
 TAVO_INLINE void Store(void* p, Block x) { _mm_storeu_si128(static_cast<Block*>(p), x); }
 TAVO_INLINE void StoreHalf(void* p, Block x) { _mm_storel_epi64(static_cast<Block*>(p), x); }
@@ -66,6 +72,8 @@ TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzer
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
 // Lanes of 16-bit numbers from -128 to 127 as bytes.
 TAVO_INLINE Block PackSigned(Block a, Block b) { return _mm_packs_epi16(a, b); }
+// The lower eight bytes as a number.
+TAVO_INLINE std::uint64_t LowHalf(Block a) { return static_cast<std::uint64_t>(_mm_cvtsi128_si64(a)); }
 // The sum of all unsigned bytes.
 TAVO_INLINE std::size_t Sum8(Block a) {
     const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
@@ -88,6 +96,30 @@ inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
 // Byte i of the result is byte index[i]; 0 for an index with the highest bit.
 TAVO_SHUFFLES inline Block Shuffle(Block a, Block index) { return _mm_shuffle_epi8(a, index); }
 
+// Multiplying without carry needs PCLMULQDQ, which comes with Shuffle: functions marked TAVO_MULTIPLIES may call Shuffle
+// and Multiply, and may be called when HasMultiply() is true. Blocks are pairs of 64-bit polynomials, the low one first.
+#if defined(_MSC_VER)
+#define TAVO_MULTIPLIES
+#else
+#define TAVO_MULTIPLIES __attribute__((target("ssse3,pclmul")))
+#endif
+#if defined(_MSC_VER) || defined(TAVO_NO_SHUFFLE)
+inline bool HasMultiply() { return false; }
+#else
+inline bool HasMultiply() { return __builtin_cpu_supports("pclmul") && __builtin_cpu_supports("ssse3"); }
+#endif
+TAVO_MULTIPLIES inline Block MultiplyLow(Block a, Block b) { return _mm_clmulepi64_si128(a, b, 0x00); }
+TAVO_MULTIPLIES inline Block MultiplyHigh(Block a, Block b) { return _mm_clmulepi64_si128(a, b, 0x11); }
+TAVO_INLINE Block Pair(std::uint64_t low, std::uint64_t high) {
+    return _mm_set_epi64x(static_cast<long long>(high), static_cast<long long>(low));
+}
+TAVO_INLINE std::uint64_t LowWord(Block a) { return static_cast<std::uint64_t>(_mm_cvtsi128_si64(a)); }
+TAVO_INLINE std::uint64_t HighWord(Block a) { return LowWord(_mm_srli_si128(a, 8)); }
+TAVO_INLINE Block LowToHigh(Block a) { return _mm_slli_si128(a, 8); }
+TAVO_INLINE Block Xor(Block a, Block b) { return _mm_xor_si128(a, b); }
+// Signed a > b.
+TAVO_INLINE Block Above16(Block a, Block b) { return _mm_cmpgt_epi16(a, b); }
+
 #else
 
 #define TAVO_SHUFFLES
@@ -108,6 +140,11 @@ template <class Lane, class Function> Block Map(Block a, Block b, Function funct
 inline Block Load(const void* p) {
     Block x;
     std::memcpy(&x, p, 16);
+    return x;
+}
+inline Block LoadHalves(const void* low, const void* high) {
+    Block x;
+    std::memcpy(x.b, low, 8), std::memcpy(x.b + 8, high, 8);
     return x;
 }
 inline Block LoadAligned(const void* p) { return Load(p); }
@@ -211,6 +248,11 @@ inline Block Narrow(Block a, Block b) {
     return x;
 }
 inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
+inline std::uint64_t LowHalf(Block a) {
+    std::uint64_t half;
+    std::memcpy(&half, &a, sizeof half);
+    return half;
+}
 inline std::size_t Sum8(Block a) {
     std::size_t sum = 0;
     for (std::uint8_t byte : a.b) sum += byte;
@@ -261,6 +303,15 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
     return i;
 }
 #endif
+
+// Asks for the cache line at `address`, which need not be readable: to be read, or to be written soon.
+TAVO_INLINE void Prefetch(const void* address) {
+#if defined(TAVO_SSE2)
+    _mm_prefetch(static_cast<const char*>(address), _MM_HINT_T0);
+#else
+    static_cast<void>(address);
+#endif
+}
 
 // Tells the processor that this thread spins.
 inline void Pause() {

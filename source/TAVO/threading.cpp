@@ -36,8 +36,7 @@ struct InterlockState {
     std::atomic<std::uint16_t> nestedWrites{0};
 };
 
-// --- blocks
-// --------------------------------------------------------------------------------------------------------------
+// --- blocks ---------------------------------------------------------------------------------------------------------
 
 template <class State> void Create(void* payload, std::size_t) {
     static_assert(alignof(State) <= 16, "blocks are aligned to 16");
@@ -64,8 +63,7 @@ tagCPOMEMHEADER* Built(tagCPOMEMHEADER* block) noexcept {
     }
 }
 
-// --- waiting
-// -------------------------------------------------------------------------------------------------------------
+// --- waiting --------------------------------------------------------------------------------------------------------
 
 // The system clock in units of 100 ns. Boost waits for a deadline of a clock it does not know by looking at it again
 // every 100 ms, which is what a clock that can be set needs.
@@ -74,7 +72,6 @@ struct SystemClock {
     using period = boost::ratio<1, 10000000>;
     using duration = boost::chrono::duration<rep, period>;
     using time_point = boost::chrono::time_point<SystemClock>;
-    static constexpr bool is_steady = false;
 
     // Rounded up, so that a wait is never shorter than asked for.
     static time_point now() {
@@ -129,8 +126,7 @@ bool TakeSharedWithin(boost::shared_mutex& mutex, ulong32 ms) noexcept {
     return TakeOrFail([&] { return mutex.try_lock_shared_until(DeadlineIn(ms)); });
 }
 
-// --- counting: by the holder only
-// ------------------------------------------------------------------------------------------
+// --- counting: by the holder only -----------------------------------------------------------------------------------
 
 template <class Count> void StepUp(std::atomic<Count>& count) {
     count.store(static_cast<Count>(count.load(std::memory_order_relaxed) + 1), std::memory_order_relaxed);
@@ -168,8 +164,7 @@ template <class State> State* StateOf(void* payload) { return static_cast<State*
 
 } // namespace
 
-// --- CPMutex
-// -------------------------------------------------------------------------------------------------------------
+// --- CPMutex --------------------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPMutex::_vtbl = kLockTable<MutexState>;
 
@@ -186,8 +181,7 @@ void CPMutex::Leave() const noexcept {
     if (auto* state = StateOf<MutexState>(Payload())) state->mutex.unlock();
 }
 
-// --- CPCriticalSection
-// ---------------------------------------------------------------------------------------------------
+// --- CPCriticalSection ----------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = kLockTable<CriticalSectionState>;
 
@@ -239,8 +233,7 @@ void CPCriticalSection::Leave() const noexcept {
     state->mutex.unlock();
 }
 
-// --- CPRWInterlock
-// -------------------------------------------------------------------------------------------------------
+// --- CPRWInterlock --------------------------------------------------------------------------------------------------
 
 const Buffers::tagCPOVTABL CPRWInterlock::_vtbl = kLockTable<InterlockState>;
 

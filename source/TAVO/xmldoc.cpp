@@ -145,18 +145,27 @@ wchar_t FirstUnit(const void* data) {
     return unit;
 }
 
-// Exchanges the bytes of every unit up to the first zero one.
-void SwapUnits(wchar_t* unit) {
-    for (; *unit; ++unit) *unit = static_cast<wchar_t>(*unit << 8 | *unit >> 8);
+// The units before the first zero one, at most n. The address may be odd.
+std::size_t CountUnits(const void* data, std::size_t n) {
+    if (reinterpret_cast<std::uintptr_t>(data) % alignof(wchar_t) == 0)
+        return String::detail::WideLengthN(static_cast<const wchar_t*>(data), n);
+    std::size_t count = 0;
+    for (const auto* bytes = static_cast<const unsigned char*>(data); count < n; ++count, bytes += sizeof(wchar_t))
+        if (FirstUnit(bytes) == 0) break;
+    return count;
 }
 
-// A copy with a terminator, its bytes exchanged when `swap`. Null without memory.
+// Exchanges the bytes of every unit.
+void SwapUnits(wchar_t* unit, std::size_t count) {
+    for (; count; --count, ++unit) *unit = static_cast<wchar_t>(*unit << 8 | *unit >> 8);
+}
+
+// A copy, its bytes exchanged when `swap`. Null without memory.
 Owned<wchar_t> CopyUnits(const void* data, std::size_t units, bool swap) {
     Owned<wchar_t> copy = NewRun<wchar_t>(units + 1);
     if (!copy) return nullptr;
     std::memcpy(copy.get(), data, units * sizeof(wchar_t));
-    copy[units] = 0;
-    if (swap) SwapUnits(copy.get());
+    if (swap) SwapUnits(copy.get(), units);
     return copy;
 }
 
@@ -206,7 +215,9 @@ template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t uni
     return false;
 }
 
-bool CXMLDoc::ParseUtf16(const void* data, std::size_t units, bool swap) noexcept {
+bool CXMLDoc::ParseUtf16(const void* data, std::size_t most, bool swap) noexcept {
+    // Nothing behind the text is read: the size may be any above it.
+    const std::size_t units = CountUnits(data, most);
     // The caller's bytes are never written: a second call would swap them back. Odd addresses are copied too.
     Owned<wchar_t> copy;
     const auto* text = static_cast<const wchar_t*>(data);
@@ -215,18 +226,21 @@ bool CXMLDoc::ParseUtf16(const void* data, std::size_t units, bool swap) noexcep
         if (!copy) return Refuse();
         text = copy.get();
     }
-    return ParseUnits(text, String::detail::WideLengthN(text, units));
+    return ParseUnits(text, units);
 }
 
 bool CXMLDoc::OpenDocText(void* data, unsigned long long size) noexcept {
     Refuse();
-    if (!data || size < 4) return false;
-    const auto* bytes = static_cast<const unsigned char*>(data);
-    const std::size_t units = size / sizeof(wchar_t);
-    if (bytes[0] == 0) return IsStart(bytes[1]) && ParseUtf16(data, units, true);
-    if (FirstUnit(bytes) == kMark) return FirstUnit(bytes + 2) != 0 && ParseUtf16(data, units, false);
-    if (FirstUnit(bytes) == kSwappedMark) return ParseUtf16(data, units, true);
-    if (bytes[1] == 0 && IsStart(bytes[0])) return ParseUtf16(data, units, false);
+    return data && ParseBytes(static_cast<const unsigned char*>(data), size, size / sizeof(wchar_t));
+}
+
+// `units` of the bytes are the text when it is UTF-16.
+bool CXMLDoc::ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t units) noexcept {
+    if (size < 4) return false;
+    if (bytes[0] == 0) return IsStart(bytes[1]) && ParseUtf16(bytes, units, true);
+    if (FirstUnit(bytes) == kMark) return FirstUnit(bytes + 2) != 0 && ParseUtf16(bytes, units, false);
+    if (FirstUnit(bytes) == kSwappedMark) return ParseUtf16(bytes, units, true);
+    if (bytes[1] == 0 && IsStart(bytes[0])) return ParseUtf16(bytes, units, false);
     return ParseUnits(bytes, Simd::ZeroUnit(bytes, size));
 }
 
@@ -251,20 +265,22 @@ bool CXMLDoc::OpenDocFile(const wchar_t* path, eXMLEncoding encoding) noexcept {
     const std::size_t size = file.GetSize();
     if (size > 0xFFFFFFFF) return false;
 
-    // Two zero bytes belong to the text; two more let a last odd byte lie in a whole unit.
+    // Zero bytes follow the data: two belong to the text, and every unit that begins in it is whole.
     Owned<unsigned char> data = NewRun<unsigned char>(size + 4);
     if (!data) return false;
     ulong32 done = 0;
     if (!file.Read(data.get(), static_cast<ulong32>(size), &done) || done != size) return false;
     std::memset(data.get() + size, 0, 4);
     file.Close();
+    const std::size_t units = size / sizeof(wchar_t); // a last odd byte of UTF-16 is no part of the text
 
     switch (encoding) {
     case XMLEncodingAutomatic:
     case XMLEncodingUTF8:
         break; // forces nothing
     case XMLEncodingUTF16:
-        if (FirstUnit(data.get()) == kSwappedMark) SwapUnits(reinterpret_cast<wchar_t*>(data.get()));
+        if (FirstUnit(data.get()) == kSwappedMark)
+            SwapUnits(reinterpret_cast<wchar_t*>(data.get()), CountUnits(data.get(), units));
         break;
     case XMLEncodingUTF16Raw:
         if (FirstUnit(data.get()) != kMark) return false;
@@ -272,7 +288,7 @@ bool CXMLDoc::OpenDocFile(const wchar_t* path, eXMLEncoding encoding) noexcept {
     default:
         return false;
     }
-    return OpenDocText(data.get(), size + 2);
+    return ParseBytes(data.get(), size + 2, units);
 }
 
 ulong32 CXMLDoc::GetErrorInfo(unsigned long long* offset, String::CACFWChar* text) const noexcept {

@@ -139,12 +139,17 @@ private:
         m_at += 2;
         const Unit* name = m_at;
         if (!Name()) return false;
-        const bool declaration = topLevel && m_at - name == 3 && Stands(name, "xml");
+        const bool declaration = topLevel && IsDeclarationName(name, static_cast<std::size_t>(m_at - name));
         TagEnd end;
         if (!AttributesOf(TagEnd::Instruction, end)) return false;
         const bool good = !declaration || Declaration(start);
         DropAttributes();
         return good;
+    }
+
+    bool IsDeclarationName(const Unit* name, std::size_t units) {
+        if (IsAscii(name, units)) return units == 3 && Stands(name, "xml");
+        return kUtf8 && InternName(name, units).cmp(L"xml") == 0; // overlong forms
     }
 
     bool Declaration(const Unit* start) {
@@ -479,7 +484,9 @@ private:
             m_at = name + element.nameUnits + 1;
             return FinishElement();
         }
-        if (!Name() || !SameName(name, static_cast<std::size_t>(m_at - name), element)) return Fail(wrong, tag);
+        bool same = Name();
+        if (same && !IsSameName(name, static_cast<std::size_t>(m_at - name), element, same)) return OutOfMemory();
+        if (!same) return Fail(wrong, tag);
         SkipBlanks();
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
         if (*m_at != '>') return Fail(kOpenEnclosure, m_at);
@@ -487,38 +494,51 @@ private:
         return FinishElement();
     }
 
-    // Names of other spelling may be the same: UTF-8 has overlong forms.
-    bool SameName(const Unit* name, std::size_t units, const OpenElement& element) {
-        if (units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0) return true;
-        return kUtf8 && !(IsAscii(name, units) && IsAscii(element.name, element.nameUnits)) &&
-               InternName(name, units) == NodeOf(element.node).name;
+    // Names of other spelling may be the same: UTF-8 has overlong forms. False without memory.
+    bool IsSameName(const Unit* name, std::size_t units, const OpenElement& element, bool& same) {
+        same = units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0;
+        if (same || !kUtf8 || (IsAscii(name, units) && IsAscii(element.name, element.nameUnits))) return true;
+        const CPPoolString interned = InternName(name, units);
+        same = interned == NodeOf(element.node).name;
+        return !interned.isnull();
     }
 
     // --- text
     // ----------------------------------------------------------------------------------------------------------
 
-    // The first unit from `at` on that text cannot simply run over: a blank, a control, a character above 7F, '&', or
-    // one of the two stops; the end when there is none.
-    const Unit* RunEnd(const Unit* at, Unit stop1, Unit stop2) const {
+    // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone between other
+    // units, a control, a character above 7F, '&', or one of the two stops; the end when there is none.
+    // Requires: `start` is not at a blank.
+    const Unit* RunEnd(const Unit* start, Unit stop1, Unit stop2) const {
+        const Unit* at = start;
         if constexpr (kUtf8) {
-            const auto printable = Simd::All8(0x21), reference = Simd::All8('&');
-            const auto first = Simd::All8(stop1), second = Simd::All8(stop2);
-            for (; m_end - at >= static_cast<std::ptrdiff_t>(Simd::kBlock); at += Simd::kBlock) {
-                const auto block = Simd::Load(at);
+            using namespace Simd;
+            const Block printable = All8(0x21), space = All8(' '), reference = All8('&');
+            const Block first = All8(stop1), second = All8(stop2);
+            std::uint32_t spaceBefore = 0; // whether the block before ended with a space that may stand alone
+            for (; m_end - at >= static_cast<std::ptrdiff_t>(kBlock); at += kBlock) {
+                const Block block = Load(at);
                 // Signed: bytes from 80 on are below too.
-                const auto special = Simd::Or(Simd::Or(Simd::Below8(block, printable), Simd::Equal8(block, reference)),
-                                              Simd::Or(Simd::Equal8(block, first), Simd::Equal8(block, second)));
-                if (const auto mask = Simd::Mask(special)) return at + std::countr_zero(mask);
+                const std::uint32_t special = Mask(Or(Or(Below8(block, printable), Equal8(block, reference)),
+                                                      Or(Equal8(block, first), Equal8(block, second))));
+                if (!(special | spaceBefore)) continue;
+                // A space is no obstacle unless something special follows.
+                const std::uint32_t spaces = Mask(Equal8(block, space));
+                const std::uint32_t obstacles = (special & ~spaces) | (spaces & special >> 1);
+                if (spaceBefore & special & 1) return at - 1;
+                if (obstacles) return at + std::countr_zero(obstacles);
+                spaceBefore = spaces >> 15;
             }
+            at -= spaceBefore;
         }
-        while (at != m_end && static_cast<unsigned>(*at) - 0x21u < 0x5Fu && *at != '&' && *at != stop1 && *at != stop2)
+        while (at != m_end && (IsPlain(*at, stop1, stop2) ||
+                               (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
             ++at;
         return at;
     }
 
-    // Whether text may run over the blank at `at`: a single space with something printable on both sides.
-    bool IsSingleSpace(const Unit* at, const Unit* start, Unit stop) const {
-        return *at == ' ' && at != start && at + 1 != m_end && static_cast<unsigned>(at[1]) > 0x20 && at[1] != stop;
+    static bool IsPlain(Unit c, Unit stop1, Unit stop2) {
+        return static_cast<unsigned>(c) - 0x21u < 0x5Fu && c != '&' && c != stop1 && c != stop2;
     }
 
     // The value at m_at, quotes included.
@@ -526,17 +546,22 @@ private:
         const Unit* opened = m_at;
         const Unit quote = *opened;
         const Unit* start = opened + 1;
-        const Unit* at = start;
-        for (;;) {
-            at = RunEnd(at, quote, quote);
-            if (at == m_end) return Fail(kOpenString, opened);
-            if (*at == quote) break;
-            if (!IsSingleSpace(at, start, quote)) return ValueInPieces(value);
-            ++at;
-        }
+        const Unit* at = start != m_end && *start == ' ' ? start : RunEnd(start, quote, quote);
+        if (at == m_end) return Fail(kOpenString, opened);
+        if (*at != quote) return ValueInPieces(value);
         m_at = at + 1;
-        value = at == start ? CPPoolString::pempty : m_values.Get(start, static_cast<std::size_t>(at - start));
+        value = PlainText(start, at);
         return !value.isnull() || OutOfMemory();
+    }
+
+    bool IsBlankAt(const Unit* at) const { return at != m_end && IsBlank(*at); }
+
+    // Interns what stands there as it is. Long texts do not repeat.
+    CPPoolString PlainText(const Unit* start, const Unit* end) {
+        constexpr std::size_t kLong = 100;
+        const auto units = static_cast<std::size_t>(end - start);
+        if (units == 0) return CPPoolString::pempty;
+        return units < kLong ? m_values.Get(start, units) : Intern(start, units);
     }
 
     // A value with references, runs of blanks or characters above 7F.
@@ -554,24 +579,12 @@ private:
     bool Data() {
         OpenElement& element = m_open.Last();
         const Unit* start = m_at;
-        for (const Unit* at = start;;) {
-            at = RunEnd(at, '<', ']');
-            if (at == m_end) break;
-            if (*at == '<') {
-                // Nearly always the whole data stands here as it is.
-                if (at == start || !Stands(at, "</")) break;
-                CPPoolString data = m_values.Get(start, static_cast<std::size_t>(at - start));
-                m_at = at;
-                return StoreData(element, std::move(data));
-            }
-            if (*at == ']') {
-                if (Stands(at, "]]>")) return Fail(kBadDataTerminator, at);
-            } else if (!IsSingleSpace(at, start, '<')) {
-                break;
-            }
-            ++at;
-        }
-        return DataInPieces(element);
+        const Unit* at = RunEnd(start, '<', ']');
+        while (at != m_end && *at == ']' && !Stands(at, "]]>") && !IsBlankAt(at + 1)) at = RunEnd(at + 1, '<', ']');
+        // Nearly always the whole data stands here as it is.
+        if (at == m_end || *at != '<' || at == start || !Stands(at, "</")) return DataInPieces(element);
+        m_at = at;
+        return StoreData(element, PlainText(start, at));
     }
 
     bool DataInPieces(OpenElement& element) {

@@ -57,6 +57,12 @@ private:
     bool m_static = false;
 };
 
+// Interns `count` units below 80, none of them 0.
+inline CPPoolString Intern(const unsigned char* text, std::size_t count) {
+    return String::pool::InternAscii(text, count);
+}
+inline CPPoolString Intern(const wchar_t* text, std::size_t count) { return String::pool::InternWide(text, count); }
+
 // A table of `Slots` strings, each in the one place that its text's mix selects. A text that is met for the second time
 // in a row at a place moves in: values that occur once leave the others alone.
 template <std::size_t Slots> class StringCache {
@@ -135,10 +141,6 @@ private:
         return (bytes | bytes << 8) & 0x00FF00FF00FF00FF;
     }
 
-    static CPPoolString Intern(const unsigned char* text, std::size_t count) {
-        return String::pool::InternAscii(text, count);
-    }
-    static CPPoolString Intern(const wchar_t* text, std::size_t count) { return String::pool::InternWide(text, count); }
 
     Slot m_slots[Slots];
 };

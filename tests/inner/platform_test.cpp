@@ -2,12 +2,85 @@
 
 #include "platform/platform.h"
 
+#include <cstdio>
+#include <fstream>
 #include <gtest/gtest.h>
 #include <string>
 #include <thread>
 #include <vector>
 
 using namespace TAVO;
+
+namespace {
+
+// What the reader finds for the key "Level" of section "Debug" in a file with this content.
+int ReadLevel(const std::string& content) {
+    wchar_t path[1024];
+    char narrow[1024];
+    bool truncated = false;
+    const std::size_t length = Platform::GetModulePath(Platform::Module::Executable, path, 1000, truncated);
+    for (std::size_t i = 0; i <= 4; ++i) path[length + i] = L".ini"[i]; // beside the program: the one folder known here
+    Platform::WideToAnsi(path, -1, narrow, sizeof narrow);
+    std::ofstream(narrow, std::ios::binary) << content;
+    const int value = Platform::ReadConfigurationInteger(path, L"Debug", L"Level");
+    std::remove(narrow);
+    return value;
+}
+
+std::string Utf16File(const char* text) {
+    std::string bytes = "\xFF\xFE";
+    for (; *text; ++text) (bytes += *text) += '\0';
+    return bytes;
+}
+
+} // namespace
+
+TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
+    const struct {
+        const char* content;
+        int value;
+    } rows[] = {
+        {"[Debug]\nLevel=5\n", 5},
+        {"[Debug]\r\nLevel=5", 5},
+        {"[DEBUG]\nLEVEL=5\n", 5},
+        {"  [ Debug ] ; ours\n\t Level \t=\t 5 \t\r\n", 5},
+        {"[Debug]\nLevel=-5\n", -5},
+        {"[Debug]\nLevel=+5\n", 5},
+        {"[Debug]\nLevel=0x1F\n", 31},
+        {"[Debug]\nLevel=0X1f\n", 0},
+        {"[Debug]\nLevel=12ab\n", 12},
+        {"[Debug]\nLevel=abc\n", 0},
+        {"[Debug]\nLevel=\n", 0},
+        {"[Debug]\nLevel=-\n", 0},
+        {"[Debug]\nLevel=\"7\"\n", 7},
+        {"[Debug]\nLevel=\"\n", 0},
+        {"[Debug]\nLevel=4294967297\n", 1},
+        {"[Debug]\nLevel 5\n", 0},
+        {"[Debug]\n;Level=5\nLevel=6\n", 6},
+        {"[Debug]\nLevel=5\nLevel=6\n", 5},
+        {"[Debug]\nLevels=5\nLeve=6\n", 0},
+        {"[Debu]\nLevel=5\n[Debugs]\nLevel=6\n", 0},
+        {"Level=5\n[Other]\nLevel=6\n", 0},
+        {"[Other]\nLevel=6\n[Debug]\nLevel=5\n", 5},
+        {"[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
+        {"\xEF\xBB\xBF[Debug]\nLevel=5\n", 5},
+        {"[Debug\nLevel=5\n", 0},
+        {"[", 0},
+        {"=", 0},
+        {"\n\n\r\n", 0},
+        {"", 0},
+    };
+    for (const auto& row : rows) EXPECT_EQ(ReadLevel(row.content), row.value) << row.content;
+    EXPECT_EQ(ReadLevel(Utf16File("[Debug]\r\nLevel=5\r\n")), 5);
+    EXPECT_EQ(ReadLevel(std::string("\xFF\xFE\x5B", 3)), 0);
+    EXPECT_EQ(Platform::ReadConfigurationInteger(L"/no/such file.ini", L"Debug", L"Level"), 0);
+}
+
+TEST(ConfigurationFile, ReadsNothingBehindACut) {
+    const std::string content = "[Debug]\nA=1\nLevel=\"0x15\"";
+    for (std::size_t length = 0; length < content.size() - 5; ++length)
+        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0);
+}
 
 TEST(CodePage, FollowsTheCallProtocol) {
     wchar_t wide[8];
@@ -77,4 +150,14 @@ TEST(Modules, TellATruncatedPath) {
         EXPECT_EQ(cut[kept], 0);
         EXPECT_EQ(cut[capacity], L'#');
     }
+}
+
+TEST(Modules, CanBeHeldAndDropped) {
+    void* first = Platform::HoldLibrary();
+    void* second = Platform::HoldLibrary();
+    EXPECT_NE(first, nullptr);
+    EXPECT_EQ(first, second);
+    Platform::DropLibrary(second);
+    Platform::DropLibrary(first);
+    Platform::DropLibrary(nullptr);
 }

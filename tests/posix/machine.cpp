@@ -39,6 +39,20 @@ LibraryCopy::~LibraryCopy() {
 
 void* LibraryCopy::FindSymbol(const char* name, const char*) const { return dlsym(m_module, name); }
 
+Plugin::Plugin(const char* name) {
+    char program[4096] = {};
+    if (readlink("/proc/self/exe", program, sizeof program - 1) < 0) program[0] = 0;
+    const std::string folder(program, std::string(program).rfind('/') + 1);
+    m_module = dlopen((folder + name + ".so").c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (!m_module) std::fprintf(stderr, "%s\n", dlerror());
+}
+
+Plugin::~Plugin() {
+    if (m_module) dlclose(m_module);
+}
+
+void* Plugin::FindSymbol(const char* name) const { return m_module ? dlsym(m_module, name) : nullptr; }
+
 namespace {
 
 // Lets the traced child run to its end, signals passed on.

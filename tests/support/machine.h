@@ -1,5 +1,6 @@
 #pragma once
-// What the tests need of the machine: copies of the library with a configuration of their own, and child processes.
+// What the tests need of the machine: copies of the library with a configuration of their own, plug-ins and
+// child processes.
 
 #include <string>
 
@@ -25,6 +26,25 @@ private:
 
     std::string m_folder, m_library, m_configuration;
     void* m_module = nullptr;
+};
+
+// A plug-in of the tests: the library `name` beside this program, loaded by its full path.
+class Plugin {
+public:
+    explicit Plugin(const char* name);
+    ~Plugin();
+    Plugin(const Plugin&) = delete;
+    Plugin& operator=(const Plugin&) = delete;
+
+    // Its C function of that name; null when there is none or the plug-in was not loaded.
+    template <class Function> Function Find(const char* name) const {
+        return reinterpret_cast<Function>(FindSymbol(name));
+    }
+
+private:
+    void* FindSymbol(const char* name) const;
+
+    void* m_module;
 };
 
 // Runs this program again, under a debugger that lets it run, with one (disabled) test only. Gives what reached the

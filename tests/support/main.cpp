@@ -59,7 +59,8 @@ bool FailingHeap::Refused() const { return g_refused; }
 int main(int argc, char** argv) {
     testing::InitGoogleTest(&argc, argv);
     TAVO::Platform::SetHeapObserver(&kObserver);
-    SweepPool(); // builds the pool's tables, which stay
+    TAVO::String::CPPoolString(L"Capital"); // builds the pool's tables, the one for capital letters too; they stay
+    SweepPool();
     testing::UnitTest::GetInstance()->listeners().Append(new LeakListener);
     return RUN_ALL_TESTS();
 }

@@ -33,6 +33,23 @@ void* LibraryCopy::FindSymbol(const char*, const char* windowsName) const {
     return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_module), windowsName));
 }
 
+Plugin::Plugin(const char* name) {
+    wchar_t path[MAX_PATH];
+    const DWORD length = GetModuleFileNameW(nullptr, path, MAX_PATH);
+    std::wstring file(path, length);
+    file.resize(file.rfind(L'\\') + 1);
+    for (; *name; ++name) file += static_cast<wchar_t>(*name);
+    m_module = LoadLibraryW((file + L".dll").c_str());
+}
+
+Plugin::~Plugin() {
+    if (m_module) FreeLibrary(static_cast<HMODULE>(m_module));
+}
+
+void* Plugin::FindSymbol(const char* name) const {
+    return m_module ? reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_module), name)) : nullptr;
+}
+
 namespace {
 
 std::string ReadText(HANDLE process, const OUTPUT_DEBUG_STRING_INFO& info) {

@@ -10,10 +10,12 @@
 #include <cstring>
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <link.h>
 #include <pthread.h>
 #include <sched.h>
 #include <sys/uio.h>
 #include <time.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace TAVO::Platform {
@@ -101,6 +103,19 @@ std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, 
     return length;
 }
 
+void* HoldLibrary() noexcept {
+    Dl_info info;
+    link_map* map = nullptr;
+    if (!dladdr1(reinterpret_cast<void*>(&HoldLibrary), &info, reinterpret_cast<void**>(&map), RTLD_DL_LINKMAP))
+        return nullptr;
+    const char* name = map->l_name && *map->l_name ? map->l_name : nullptr; // the program itself has none
+    return dlopen(name, RTLD_NOW | RTLD_NOLOAD);
+}
+
+void DropLibrary(void* hold) noexcept {
+    if (hold) dlclose(hold);
+}
+
 namespace {
 
 bool IsDigit(int unit) { return unit >= '0' && unit <= '9'; }
@@ -175,7 +190,7 @@ Span TakeLine(Span& text) {
 unsigned TakeBase(Span& digits) {
     if (digits.end - digits.begin < 2 || digits.begin[0] != '0') return 10;
     unsigned base = 10;
-    switch (ToLower(digits.begin[1])) {
+    switch (digits.begin[1]) { // capitals are no prefix on the other system either
     case 'x':
         base = 16;
         break;
@@ -218,8 +233,8 @@ int FindInteger(Span text, const wchar_t* section, const wchar_t* key) {
         if (line.First() == ';') continue;
         if (line.First() == '[') {
             if (inside) return 0; // only the first section of the name counts
-            const Span rest{line.begin + 1, line.end};
-            inside = EqualsIgnoringCase(Trim({rest.begin, FindIn(rest, ']')}), section);
+            const char* bracket = FindIn(line, ']');
+            inside = bracket != line.end && EqualsIgnoringCase(Trim({line.begin + 1, bracket}), section);
             continue;
         }
         const char* equals = FindIn(line, '=');
@@ -508,31 +523,38 @@ bool IsReadable(const void* address) noexcept {
 // One access by a fixed offset, without a call, from a library that is loaded late.
 #define TAVO_THREAD_FIELD constinit thread_local __attribute__((tls_model("initial-exec")))
 
+constinit thread_local std::uint32_t t_id = 0; // declared with its access model
+
 namespace {
 
-TAVO_THREAD_FIELD std::uint32_t t_id = 0;
 TAVO_THREAD_FIELD int t_priority = 0;
 TAVO_THREAD_FIELD void* t_releaseScope = nullptr;
 
+} // namespace
+
 // Kernel ids are reused; a new thread must not pass for a dead owner of something.
-TAVO_NOINLINE std::uint32_t TakeThreadId() {
+TAVO_NOINLINE std::uint32_t TakeThreadId() noexcept {
     static constinit std::atomic<std::uint32_t> g_lastId{0};
     do t_id = ++g_lastId;
     while (t_id == 0);
     return t_id;
 }
 
-} // namespace
-
 #undef TAVO_THREAD_FIELD
-
-std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
 
 int GetThreadPriority() noexcept { return t_priority; }
 void SetThreadPriority(int priority) noexcept { t_priority = priority; }
 
 void* GetReleaseScope() noexcept { return t_releaseScope; }
 void SetReleaseScope(void* scope) noexcept { t_releaseScope = scope; }
+
+namespace {
+// The numbers of <linux/membarrier.h>, which old systems lack.
+constexpr int kExpedited = 1 << 3, kRegisterExpedited = 1 << 4;
+} // namespace
+
+bool CanFlushProcessors() noexcept { return syscall(SYS_membarrier, kRegisterExpedited, 0) == 0; }
+void FlushProcessors() noexcept { syscall(SYS_membarrier, kExpedited, 0); }
 
 void YieldThread() noexcept { sched_yield(); }
 

@@ -61,6 +61,16 @@ std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, 
     return capacity - 1;
 }
 
+void* HoldLibrary() noexcept {
+    HMODULE module = nullptr;
+    GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS, reinterpret_cast<LPCWSTR>(&FindOwnModule), &module);
+    return module;
+}
+
+void DropLibrary(void* hold) noexcept {
+    if (hold) FreeLibrary(static_cast<HMODULE>(hold));
+}
+
 std::size_t FindConfigurationStem(const wchar_t* libraryPath, std::size_t length) noexcept {
     for (std::size_t at = length; at-- > 0;) {
         if (libraryPath[at] == L'.') return at;
@@ -175,16 +185,22 @@ DWORD GetScopeSlot() {
     return TAVO_LIKELY(slot != TLS_OUT_OF_INDEXES) ? slot : TakeScopeSlot();
 }
 
-// Runs behind the destructors of all static objects, which may still release memory.
-__attribute__((destructor)) void GiveBackScopeSlot() {
-    const DWORD slot = g_scopeSlot.exchange(TLS_OUT_OF_INDEXES);
-    if (slot != TLS_OUT_OF_INDEXES) TlsFree(slot);
-}
+// The first of the library's static objects, and so the last to be destroyed: the others may still release memory.
+struct ScopeSlotOwner {
+    ~ScopeSlotOwner() {
+        const DWORD slot = g_scopeSlot.exchange(TLS_OUT_OF_INDEXES);
+        if (slot != TLS_OUT_OF_INDEXES) TlsFree(slot);
+    }
+};
+__attribute__((init_priority(101))) ScopeSlotOwner g_scopeSlotOwner;
 
 } // namespace
 
 void* GetReleaseScope() noexcept { return TlsGetValue(GetScopeSlot()); }
 void SetReleaseScope(void* scope) noexcept { TlsSetValue(GetScopeSlot(), scope); }
+
+bool CanFlushProcessors() noexcept { return true; }
+void FlushProcessors() noexcept { FlushProcessWriteBuffers(); }
 
 void YieldThread() noexcept { SwitchToThread(); }
 void SleepMilliseconds(std::uint32_t milliseconds) noexcept { Sleep(milliseconds); }

@@ -10,7 +10,7 @@
 
 namespace TAVO::Platform {
 
-// --- files -----------------------------------------------------------------------------------------------------------
+// --- files ----------------------------------------------------------------------------------------------------------
 
 // The system's handle in the system's own form; all bits set where there is none.
 using FileHandle = std::intptr_t;
@@ -43,7 +43,7 @@ bool FlushFile(FileHandle file) noexcept;
 bool ReadFromFile(FileHandle file, void* buffer, std::uint32_t size, std::uint32_t& done) noexcept;
 bool WriteToFile(FileHandle file, const void* buffer, std::uint32_t size, std::uint32_t& done) noexcept;
 
-// --- paths -----------------------------------------------------------------------------------------------------------
+// --- paths ----------------------------------------------------------------------------------------------------------
 
 enum class PathKind { Missing, File, Directory }; // whatever exists and is no directory is a file
 
@@ -52,7 +52,7 @@ bool RemoveFile(const wchar_t* path) noexcept;                                //
 bool RenameWithoutReplacing(const wchar_t* from, const wchar_t* to) noexcept; // false when `to` exists
 bool MakeDirectory(const wchar_t* path) noexcept;                             // false when it exists
 
-// --- directories -----------------------------------------------------------------------------------------------------
+// --- directories ----------------------------------------------------------------------------------------------------
 
 constexpr std::size_t kNameCapacity = 260; // units of an entry's name, terminator included
 

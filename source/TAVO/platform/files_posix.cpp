@@ -81,8 +81,7 @@ private:
     int m_descriptor;
 };
 
-// --- sharing
-// -----------------------------------------------------------------------------------------------------------
+// --- sharing --------------------------------------------------------------------------------------------------------
 //
 // Every open file holds shared locks on those of four far bytes that say what it does and what it denies others. An
 // open is refused when another open file holds the opposite of what it is going to hold; locks of one open file never
@@ -148,8 +147,7 @@ bool Share(int descriptor, const FileRequest& request) {
     return answer != Answer::No;
 }
 
-// --- opening and closing
-// -------------------------------------------------------------------------------------------------
+// --- opening and closing --------------------------------------------------------------------------------------------
 
 bool Creates(Disposition disposition) {
     return disposition == Disposition::OpenAlways || disposition == Disposition::CreateAlways;
@@ -215,8 +213,7 @@ void CloseFile(FileHandle file) noexcept {
     close(DescriptorOf(file)); // also after EINTR the descriptor is gone
 }
 
-// --- transfer and position
-// -----------------------------------------------------------------------------------------------
+// --- transfer and position ------------------------------------------------------------------------------------------
 
 bool GetFileLength(FileHandle file, std::uint64_t& length) noexcept {
     struct stat facts;
@@ -270,7 +267,7 @@ bool WriteToFile(FileHandle file, const void* buffer, std::uint32_t size, std::u
     return true;
 }
 
-// --- paths -----------------------------------------------------------------------------------------------------------
+// --- paths ----------------------------------------------------------------------------------------------------------
 
 PathKind GetPathKind(const wchar_t* path) noexcept {
     struct stat facts;
@@ -293,7 +290,7 @@ bool RenameWithoutReplacing(const wchar_t* from, const wchar_t* to) noexcept {
 
 bool MakeDirectory(const wchar_t* path) noexcept { return mkdir(NativePath(path), 0777) == 0; }
 
-// --- directories -----------------------------------------------------------------------------------------------------
+// --- directories ----------------------------------------------------------------------------------------------------
 
 namespace {
 

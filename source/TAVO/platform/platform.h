@@ -26,6 +26,12 @@ enum class Module { Library, Executable };
 // The module's path, cut to `capacity` units terminator included. 0 when unknown; `truncated` tells a cut path.
 std::size_t GetModulePath(Module module, wchar_t* buffer, std::size_t capacity, bool& truncated) noexcept;
 
+// Takes a reference on the library's own module, so that it stays mapped while a thread of its own runs. Null when
+// refused.
+void* HoldLibrary() noexcept;
+// Gives the reference back; null is ignored. Not on a thread whose code it keeps mapped.
+void DropLibrary(void* hold) noexcept;
+
 // The length of the library's path without the extension, which the configuration file's ".ini" replaces; 0 when the
 // file name has none. POSIX: version digits behind ".so" go too, so that an upgrade keeps its settings.
 std::size_t FindConfigurationStem(const wchar_t* libraryPath, std::size_t length) noexcept;
@@ -71,8 +77,14 @@ constexpr std::size_t PageSize = 4096;
 
 // --- threads -------------------------------------------------------------------------------------------------------
 
-// Identifies the calling thread among all that live; never 0.
+// Identifies the calling thread among all that live; never 0. Locks ask on every call, so POSIX answers without one.
+#if defined(_WIN32)
 std::uint32_t GetThreadId() noexcept;
+#else
+extern constinit thread_local std::uint32_t t_id __attribute__((tls_model("initial-exec"))); // 0: none taken yet
+std::uint32_t TakeThreadId() noexcept;
+inline std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
+#endif
 
 // The calling thread's priority in the system's words (0 normal, -15 idle, 15 time critical). POSIX: the level that was
 // last set here, since an ordinary user's thread could not be raised again.
@@ -83,6 +95,11 @@ void SetThreadPriority(int priority) noexcept;
 // slot left, it stays null.
 void* GetReleaseScope() noexcept;
 void SetReleaseScope(void* scope) noexcept;
+
+// Makes every running thread of the process pass a full memory barrier, so that one side of a protocol can do without.
+// CanFlushProcessors prepares it, and tells whether the system offers it. Costs some microseconds.
+bool CanFlushProcessors() noexcept;
+void FlushProcessors() noexcept;
 
 // Gives up the processor, or sleeps.
 void YieldThread() noexcept;

@@ -1,85 +1,11 @@
-// Linux: the reader of configuration files, UTF-8 as the code page, and library names.
+// Linux: library names, UTF-8 as the code page, protected pages.
 
 #include "platform/platform.h"
 
-#include <cstring>
-#include <fstream>
 #include <gtest/gtest.h>
-#include <string>
 #include <sys/mman.h>
-#include <unistd.h>
-#include <vector>
 
 using namespace TAVO;
-
-namespace {
-
-// What the reader finds for the key "Level" of section "Debug" in a file with this content.
-int ReadLevel(const std::string& content) {
-    char path[] = "/tmp/tavo_ini_XXXXXX";
-    close(mkstemp(path));
-    std::ofstream(path, std::ios::binary) << content;
-    const std::vector<wchar_t> wide(path, path + sizeof path);
-    const int value = Platform::ReadConfigurationInteger(wide.data(), L"Debug", L"Level");
-    unlink(path);
-    return value;
-}
-
-std::string Utf16File(const char* text) {
-    std::string bytes = "\xFF\xFE";
-    for (; *text; ++text) (bytes += *text) += '\0';
-    return bytes;
-}
-
-} // namespace
-
-TEST(ConfigurationFile, ReadsWhatTheOtherSystemReads) {
-    const struct {
-        const char* content;
-        int value;
-    } rows[] = {
-        {"[Debug]\nLevel=5\n", 5},
-        {"[Debug]\r\nLevel=5", 5},
-        {"[DEBUG]\nLEVEL=5\n", 5},
-        {"  [ Debug ] ; ours\n\t Level \t=\t 5 \t\r\n", 5},
-        {"[Debug]\nLevel=-5\n", -5},
-        {"[Debug]\nLevel=+5\n", 5},
-        {"[Debug]\nLevel=0x1F\n", 31},
-        {"[Debug]\nLevel=0X1f\n", 31},
-        {"[Debug]\nLevel=12ab\n", 12},
-        {"[Debug]\nLevel=abc\n", 0},
-        {"[Debug]\nLevel=\n", 0},
-        {"[Debug]\nLevel=-\n", 0},
-        {"[Debug]\nLevel=\"7\"\n", 7},
-        {"[Debug]\nLevel=\"\n", 0},
-        {"[Debug]\nLevel=4294967297\n", 1},
-        {"[Debug]\nLevel 5\n", 0},
-        {"[Debug]\n;Level=5\nLevel=6\n", 6},
-        {"[Debug]\nLevel=5\nLevel=6\n", 5},
-        {"[Debug]\nLevels=5\nLeve=6\n", 0},
-        {"[Debu]\nLevel=5\n[Debugs]\nLevel=6\n", 0},
-        {"Level=5\n[Other]\nLevel=6\n", 0},
-        {"[Other]\nLevel=6\n[Debug]\nLevel=5\n", 5},
-        {"[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
-        {"\xEF\xBB\xBF[Debug]\nLevel=5\n", 5},
-        {"[Debug\nLevel=5\n", 5},
-        {"[", 0},
-        {"=", 0},
-        {"\n\n\r\n", 0},
-        {"", 0},
-    };
-    for (const auto& row : rows) EXPECT_EQ(ReadLevel(row.content), row.value) << row.content;
-    EXPECT_EQ(ReadLevel(Utf16File("[Debug]\r\nLevel=5\r\n")), 5);
-    EXPECT_EQ(ReadLevel(std::string("\xFF\xFE\x5B", 3)), 0);
-    EXPECT_EQ(ReadLevel(std::string(70000, '\n') + "[Debug]\nLevel=5\n"), 0) << "only the first 64 KiB are read";
-    EXPECT_EQ(Platform::ReadConfigurationInteger(L"/tmp/no such file.ini", L"Debug", L"Level"), 0);
-}
-
-TEST(ConfigurationFile, ReadsNothingBehindACut) {
-    const std::string content = "[Debug]\nA=1\nLevel=\"0x15\"";
-    for (std::size_t length = 0; length < content.size() - 5; ++length)
-        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0);
-}
 
 TEST(ConfigurationPath, DropsVersionDigits) {
     const struct {

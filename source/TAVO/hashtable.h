@@ -1,0 +1,124 @@
+#pragma once
+// The hash table's search, inline for the tables of the library that know their items.
+
+#include "blocks.h"
+#include "simd.h"
+
+#include <TAVO/lookup.h>
+
+namespace TAVO::Lookup {
+
+// A bucket's entries. It grows by half again instead of by 16: most buckets hold few entries or very many.
+class CBaseHashTable::Bucket : public Buffers::CPObjectVector<HASHENTRY> {
+public:
+    bool Put(unsigned long long hash, Buffers::CPObjectMemory&& item, std::size_t index) noexcept {
+        const std::size_t count = GetNItems();
+        HASHENTRY entry{hash, std::move(item)};
+        if (InsertMoved(std::move(entry), index, count < 4 ? 4 : count + count / 2)) return true;
+        item = std::move(entry.item);
+        return false;
+    }
+    // Closes the gap before anything is released; the block goes with the last entry.
+    Buffers::CPObjectMemory Take(std::size_t index, bool releaseWhenEmpty = true) noexcept {
+        return std::move(Extract(index, releaseWhenEmpty).item);
+    }
+};
+
+// The library's own road to the buckets.
+class TableAccess {
+public:
+    using Entry = CBaseHashTable::HASHENTRY;
+    using Place = CBaseHashTable::Place;
+    using Bucket = CBaseHashTable::Bucket;
+
+    // One bucket per value of the hash's low bits; null until the first insertion.
+    static Bucket* Buckets(const CBaseHashTable& table) {
+        Buffers::tagCPOMEMHEADER* index = Buffers::Block::Of(table.m_index);
+        return index ? reinterpret_cast<Bucket*>(index + 1) : nullptr;
+    }
+
+    // Where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would be inserted.
+    // `order` tells how what is sought compares with an item: below 0, 0, above 0. `typicalCount` is how many entries a
+    // bucket probably has: a large table's cache misses then run side by side instead of one after the other.
+    template <class Order>
+    static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order,
+                        std::size_t typicalCount = 0) {
+        Place place{static_cast<std::size_t>(hash & table.m_mask), 0, false};
+        const Bucket* buckets = Buckets(table);
+        if (!buckets) return place;
+        const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
+        if (!bucket) return place;
+        const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
+        Simd::Prefetch(entries + Guess(hash, typicalCount));
+        const std::size_t count = bucket->sUsed / sizeof(Entry);
+        place.index = LowerBound(entries, count, hash);
+        if (place.index < count) {
+            const auto* block = reinterpret_cast<const char*>(Buffers::Block::Of(entries[place.index].item));
+            Simd::Prefetch(block);
+            Simd::Prefetch(block + 64);
+        }
+        // Entries of equal hash stand in the order of their items; nearly always there is one. Bisect the run.
+        std::size_t end = place.index;
+        for (std::size_t step = 1; end < count && entries[end].hash == hash; step *= 2) end += step;
+        if (end > count) end = count;
+        while (place.index < end) {
+            const std::size_t middle = place.index + (end - place.index) / 2;
+            const int compared = entries[middle].hash == hash ? order(entries[middle].item) : -1;
+            if (compared > 0) {
+                place.index = middle + 1;
+            } else {
+                end = middle;
+                place.found = compared == 0;
+            }
+        }
+        return place;
+    }
+
+    static Buffers::CPObjectMemory& Item(const CBaseHashTable& table, const Place& place) {
+        return reinterpret_cast<Entry*>(Buffers::Block::Of(Buckets(table)[place.bucket]) + 1)[place.index].item;
+    }
+
+private:
+    // Hashes are spread over their whole range, so the value tells the place.
+    static std::size_t Guess(unsigned long long hash, std::size_t count) {
+        return static_cast<std::size_t>(((hash >> 32) * count) >> 32);
+    }
+
+    // First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed
+    // from the value and the search widens from there: one or two cache lines instead of a line per halving. Hashes
+    // that are not spread cost twice a bisection.
+    static std::size_t LowerBound(const Entry* entries, std::size_t count, unsigned long long hash) {
+        if (count == 0) return 0;
+        std::size_t low = 0, high = count; // entries before low are below, entries from high on are not
+        const std::size_t guess = Guess(hash, count);
+        if (entries[guess].hash < hash) {
+            low = guess + 1;
+            for (std::size_t step = 1; low + step <= high; step *= 2) {
+                if (entries[low + step - 1].hash >= hash) {
+                    high = low + step - 1;
+                    break;
+                }
+                low += step;
+            }
+        } else {
+            high = guess;
+            for (std::size_t step = 1; step <= high - low; step *= 2) {
+                if (entries[high - step].hash < hash) {
+                    low = high - step + 1;
+                    break;
+                }
+                high -= step;
+            }
+        }
+        while (low < high) {
+            const std::size_t middle = low + (high - low) / 2;
+            if (entries[middle].hash < hash)
+                low = middle + 1;
+            else
+                high = middle;
+        }
+        return low;
+    }
+};
+
+} // namespace TAVO::Lookup

@@ -1,0 +1,90 @@
+#pragma once
+// A text on its way into the pool, in the form in which the caller has it. Each form offers
+//   key                       what it is searched by
+//   Compare(stored)           the order of its first ten units against those of a stored text
+//   CompareFolded(stored)     the same regardless of case
+//   Units()                   units of the whole text
+//   Write(out)                the whole text; false when it has no wide form
+// so that a text becomes a stored string only when it is missing.
+
+#include "poolentry.h"
+#include "transcoding.h"
+
+namespace TAVO::String::pool {
+
+// Intended: once length and both hashes agree, ten units of the actual texts decide, so two texts that agree so far are
+// one entry. A textbook pool would compare them whole; look-ups here never touch more than the first cache lines.
+constexpr std::size_t kComparedUnits = 10;
+
+template <bool folded, class Unit> int CompareFirstUnits(const Unit* text, std::size_t units, const wchar_t* stored) {
+    for (std::size_t i = 0; i < kComparedUnits; ++i) {
+        wchar_t mine = i < units ? static_cast<wchar_t>(text[i]) : L'\0', theirs = stored[i];
+        if constexpr (folded) mine = detail::FoldUnit(mine), theirs = detail::FoldUnit(theirs);
+        if (mine != theirs) return mine < theirs ? -1 : 1;
+        if (!mine) return 0;
+    }
+    return 0;
+}
+
+// Wide text, or bytes below 80: what one unit of the form is, one unit of the entry is.
+template <class Unit> struct PlainText {
+    const Key& key;
+    const Unit* text;
+    std::size_t units;
+
+    int Compare(const wchar_t* stored) const { return CompareFirstUnits<false>(text, units, stored); }
+    int CompareFolded(const wchar_t* stored) const { return CompareFirstUnits<true>(text, units, stored); }
+    std::size_t Units() const { return units; }
+    bool Write(wchar_t* out) const {
+        if constexpr (sizeof(Unit) == sizeof(wchar_t)) {
+            detail::WideCopy(out, text, units);
+        } else {
+            std::size_t i = 0;
+            for (; units - i >= Simd::kBlock; i += Simd::kBlock) {
+                const auto block = Simd::Load(text + i);
+                Simd::Store(out + i, Simd::WidenLow(block));
+                Simd::Store(out + i + Simd::kBlock / 2, Simd::WidenHigh(block));
+            }
+            for (; i < units; ++i) out[i] = text[i];
+        }
+        return true;
+    }
+};
+using WideText = PlainText<wchar_t>;
+using AsciiText = PlainText<unsigned char>;
+
+// UTF-8 whose sequences are all good.
+struct Utf8Text {
+    const Key& key;
+    const unsigned char* text;
+    std::size_t bytes;
+
+    int Compare(const wchar_t* stored) const { return CompareAs<false>(stored); }
+    int CompareFolded(const wchar_t* stored) const { return CompareAs<true>(stored); }
+    std::size_t Units() const { return key.length; } // a character above FFFF counts 2
+    bool Write(wchar_t* out) const { return detail::ConvertUtf8(text, detail::MeasureUtf8(text, bytes), out); }
+
+private:
+    template <bool folded> int CompareAs(const wchar_t* stored) const {
+        wchar_t first[kComparedUnits + 1], *end = first; // one more: a pair may begin at the last place
+        for (const unsigned char* in = text; in < text + bytes && end < first + kComparedUnits;) {
+            ulong32 value;
+            detail::StepUtf8(value, in);
+            if (!detail::EncodeUtf16(end, value)) break;
+        }
+        return CompareFirstUnits<folded>(first, static_cast<std::size_t>(end - first), stored);
+    }
+};
+
+// An entry's own text.
+struct StoredText {
+    Key key;
+    const wchar_t* text;
+
+    explicit StoredText(const PoolEntry& entry)
+        : key{entry.length, entry.utf8Size, entry.hash, entry.hashi}, text(entry.text) {}
+    int Compare(const wchar_t* stored) const { return CompareFirstUnits<false>(text, kComparedUnits, stored); }
+    int CompareFolded(const wchar_t* stored) const { return CompareFirstUnits<true>(text, kComparedUnits, stored); }
+};
+
+} // namespace TAVO::String::pool

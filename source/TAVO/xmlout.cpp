@@ -1,0 +1,548 @@
+// Output of element trees: encoding, targets, and the element writer.
+
+#include "xmlout.h"
+
+#include "platform/heap.h"
+#include "poolentry.h"
+#include "simd.h"
+#include "xmlnames.h"
+#include "xmlnode.h"
+
+#include <algorithm>
+
+namespace TAVO::XML {
+
+using Buffers::Block;
+using Buffers::tagCPOMEMHEADER;
+
+// --- Encoding ------------------------------------------------------------------------------------------------------
+
+namespace {
+
+constexpr std::size_t kLongest = 4; // bytes of a character
+constexpr std::size_t kUnitsPerBlock = Simd::kBlock / sizeof(wchar_t);
+
+bool IsAscii(Simd::Block units) {
+    return Simd::Mask(Simd::Equal16(Simd::And(units, Simd::All16(0xFF80)), Simd::All16(0))) == 0xFFFF;
+}
+
+bool HasEscape(Simd::Block units) {
+    using namespace Simd;
+    // & and ' differ in bit 0, < and > in bit 1.
+    const Simd::Block references = Equal16(And(units, All16(0xFFFE)), All16('&'));
+    const Simd::Block brackets = Equal16(And(units, All16(0xFFFD)), All16('<'));
+    return Mask(Or(Or(references, brackets), Equal16(units, All16('"')))) != 0;
+}
+
+template <bool escapes> bool IsPlain(Simd::Block units) { return IsAscii(units) && !(escapes && HasEscape(units)); }
+
+template <bool escapes> bool IsPlain(wchar_t unit) {
+    return unit < 0x80 && !(escapes && (detail::kAsciiClasses[unit] & detail::kEscapeBit));
+}
+
+// Stores all units as bytes if they are ASCII and, with `escapes`, none of & < > " '; else false. Most names and values
+// are shorter than two blocks, so there is no loop over single units: the last block overlaps the one before it.
+template <bool escapes> TAVO_INLINE bool NarrowWhole(unsigned char* out, const wchar_t* text, std::size_t count) {
+    constexpr std::size_t kHalf = kUnitsPerBlock / 2;
+    if (count >= kUnitsPerBlock) {
+        for (std::size_t i = 0;; i = i + 2 * kUnitsPerBlock <= count ? i + kUnitsPerBlock : count - kUnitsPerBlock) {
+            const Simd::Block units = Simd::Load(text + i);
+            if (!IsPlain<escapes>(units)) return false;
+            Simd::StoreHalf(out + i, Simd::Narrow(units, units));
+            if (i + kUnitsPerBlock == count) return true;
+        }
+    }
+    if (count >= kHalf) {
+        const Simd::Block units = Simd::LoadHalves(text, text + count - kHalf);
+        if (!IsPlain<escapes>(units)) return false;
+        const std::uint64_t bytes = Simd::LowHalf(Simd::Narrow(units, units));
+        std::memcpy(out, &bytes, kHalf);
+        const std::uint64_t last = bytes >> 32;
+        std::memcpy(out + count - kHalf, &last, kHalf);
+        return true;
+    }
+    for (std::size_t i = 0; i < count; ++i) {
+        if (!IsPlain<escapes>(text[i])) return false;
+        out[i] = static_cast<unsigned char>(text[i]);
+    }
+    return true;
+}
+
+// Stores the leading ASCII units as bytes; how many. Nothing is read or written at or behind `count`.
+std::size_t NarrowAscii(unsigned char* out, const wchar_t* text, std::size_t count) {
+    std::size_t i = 0;
+    for (; count - i >= kUnitsPerBlock; i += kUnitsPerBlock) {
+        const Simd::Block units = Simd::Load(text + i);
+        if (!IsAscii(units)) break;
+        Simd::StoreHalf(out + i, Simd::Narrow(units, units));
+    }
+    for (; i < count && text[i] < 0x80; ++i) out[i] = static_cast<unsigned char>(text[i]);
+    return i;
+}
+
+// The first surrogate.
+const wchar_t* FindSurrogate(const wchar_t* text, const wchar_t* end) {
+    for (; end - text >= static_cast<std::ptrdiff_t>(kUnitsPerBlock); text += kUnitsPerBlock) {
+        const Simd::Block tops = Simd::And(Simd::Load(text), Simd::All16(0xF800));
+        if (Simd::Mask(Simd::Equal16(tops, Simd::All16(0xD800)))) break;
+    }
+    while (text != end && !String::detail::IsSurrogate(*text)) ++text;
+    return text;
+}
+
+// Takes one character off the text; false at a surrogate that has no other half.
+// Intended: a pair is taken as 0 or 1 and not as its character, which a textbook would write. Readers of these files
+// know them that way.
+bool TakeCharacter(ulong32& character, const wchar_t*& text, const wchar_t* end) {
+    const std::size_t units = String::detail::Utf16Sequence(text, static_cast<std::size_t>(end - text));
+    if (units == 0) return false;
+    character = units == 1 ? *text : String::detail::PairValue(text[0], text[1]);
+    text += units;
+    return true;
+}
+
+} // namespace
+
+_CXMLOut::_CXMLOut() noexcept : m_buffer(static_cast<unsigned char*>(Platform::Allocate(kBufferSize))) {}
+_CXMLOut::~_CXMLOut() { Platform::Release(m_buffer); }
+
+bool _CXMLOut::Begin(eXMLEncoding encoding, bool pretty) {
+    m_failed = true;
+    if (!m_buffer || encoding < XMLEncodingUTF8 || encoding > XMLEncodingUTF16Raw) return false;
+    m_pretty = m_atLineStart = pretty;
+    m_level = 0;
+    m_free = kBufferSize;
+    m_encoding = encoding;
+    const bool written = encoding == XMLEncodingUTF8 ? Put("<?xml version=\"1.0\" encoding=\"UTF-8\"?>")
+                                                     : Put("<?xml version=\"1.0\" encoding=\"UTF-16\"?>");
+    if (!written) return false;
+    m_failed = false;
+    EndLine();
+    return !m_failed;
+}
+
+template <bool escapes, std::size_t before, std::size_t behind>
+TAVO_INLINE bool _CXMLOut::Compose(const char (&prefix)[before], const wchar_t* text, std::size_t count,
+                                   const char (&suffix)[behind]) {
+    constexpr std::size_t kMarkup = before + behind - 2;
+    if (m_encoding != XMLEncodingUTF8 || m_free < count + kMarkup) return false;
+    unsigned char* target = Target() + (before - 1);
+    if (!NarrowWhole<escapes>(target, text, count)) return false;
+    std::memcpy(target - (before - 1), prefix, before - 1);
+    std::memcpy(target + count, suffix, behind - 1);
+    m_free -= count + kMarkup;
+    return true;
+}
+
+template <std::size_t before, std::size_t behind>
+TAVO_INLINE bool _CXMLOut::Put(const char (&prefix)[before], const wchar_t* text, std::size_t count,
+                               const char (&suffix)[behind]) {
+    if (TAVO_UNLIKELY(m_atLineStart) && !PutIndentation()) return false;
+    return Compose<false>(prefix, text, count, suffix) ||
+           (EncodeMarkup(prefix, before - 1) && Encode(text, count) && EncodeMarkup(suffix, behind - 1));
+}
+
+template <std::size_t behind>
+TAVO_INLINE bool _CXMLOut::PutIfPlain(const wchar_t* text, std::size_t count, const char (&suffix)[behind]) {
+    return !m_atLineStart && Compose<true>("", text, count, suffix);
+}
+
+TAVO_NOINLINE bool _CXMLOut::EncodeMarkup(const char* markup, std::size_t count) {
+    wchar_t text[64];
+    for (std::size_t i = 0; i < count; ++i) text[i] = static_cast<wchar_t>(markup[i]);
+    return Encode(text, count);
+}
+
+bool _CXMLOut::Write(const wchar_t* text, std::size_t count) { return Put(text, count); }
+
+bool _CXMLOut::EndLine() {
+    if (!m_pretty) return true;
+    if (!Put("\r\n")) SetFailed(); // Intended: not told here, where a textbook would; the mark voids the result
+    m_atLineStart = true;
+    return true;
+}
+
+bool _CXMLOut::PutIndentation() {
+    static constexpr wchar_t kBlanks[] = L"                                                                ";
+    constexpr std::size_t kMost = std::size(kBlanks) - 1;
+    static_assert(kMost == 64);
+    m_atLineStart = false;
+    std::size_t levels = m_level;
+    for (; levels > kMost / 2; levels -= kMost / 2)
+        if (!Encode(kBlanks, kMost)) return false;
+    return Encode(kBlanks, levels * 2);
+}
+
+bool _CXMLOut::Encode(const wchar_t* text, std::size_t count) {
+    switch (m_encoding) {
+    case XMLEncodingUTF8:
+        return EncodeUtf8(text, text + count);
+    case XMLEncodingUTF16:
+        return EncodeUtf16(text, text + count);
+    case XMLEncodingUTF16Raw:
+        return CopyUnits(text, text + count);
+    default:
+        return false;
+    }
+}
+
+// Encodes in the room that is left, which a character may cross: it then goes out byte by byte.
+// Intended: on that path FFFF takes four bytes, where a textbook encodes it in three as everywhere else. Files compared
+// byte by byte would differ.
+bool _CXMLOut::PutCharacter(ulong32 character) {
+    if (m_free == 0 && !Flush()) return false;
+    unsigned char bytes[kLongest];
+    unsigned char* end = bytes;
+    if (m_free < kLongest && character == 0xFFFF) {
+        for (unsigned char byte : {0xF0, 0x8F, 0xBF, 0xBF}) *end++ = byte;
+    } else {
+        String::detail::EncodeUtf8(end, character);
+    }
+    for (const unsigned char* byte = bytes; byte != end; ++byte) {
+        if (m_free == 0 && !Flush()) return false;
+        *Target() = *byte;
+        --m_free;
+    }
+    return true;
+}
+
+bool _CXMLOut::EncodeUtf8(const wchar_t* text, const wchar_t* end) {
+    ulong32 character;
+    while (text != end) {
+        const std::size_t ascii = NarrowAscii(Target(), text, std::min(static_cast<std::size_t>(end - text), m_free));
+        text += ascii;
+        m_free -= ascii;
+        unsigned char* target = Target();
+        while (text != end && *text >= 0x80 && target <= m_buffer + kBufferSize - kLongest) {
+            if (!TakeCharacter(character, text, end)) return false;
+            String::detail::EncodeUtf8(target, character);
+        }
+        m_free = static_cast<std::size_t>(m_buffer + kBufferSize - target);
+        if (text != end && m_free < kLongest && (!TakeCharacter(character, text, end) || !PutCharacter(character)))
+            return false;
+    }
+    return true;
+}
+
+bool _CXMLOut::EncodeUtf16(const wchar_t* text, const wchar_t* end) {
+    while (text != end) {
+        const wchar_t* surrogate = FindSurrogate(text, end);
+        if (!CopyUnits(text, surrogate)) return false;
+        text = surrogate;
+        ulong32 character;
+        if (text == end) break;
+        if (!TakeCharacter(character, text, end)) return false;
+        const wchar_t unit = static_cast<wchar_t>(character);
+        if (!CopyUnits(&unit, &unit + 1)) return false;
+    }
+    return true;
+}
+
+bool _CXMLOut::CopyUnits(const wchar_t* text, const wchar_t* end) {
+    while (text != end) {
+        if (m_free == 0 && !Flush()) return false;
+        const std::size_t count = std::min(static_cast<std::size_t>(end - text), m_free / sizeof(wchar_t));
+        std::memcpy(Target(), text, count * sizeof(wchar_t));
+        m_free -= count * sizeof(wchar_t);
+        text += count;
+    }
+    return true;
+}
+
+// --- Targets -------------------------------------------------------------------------------------------------------
+
+_CFileOut::_CFileOut(const wchar_t* path) noexcept : m_path(path) {
+    using namespace Files::OS;
+    m_isOpen = m_file.Open(path, FileAccessWrite, OpenFileCreate | OpenFileTruncate);
+}
+
+_CFileOut::~_CFileOut() {
+    if (m_isOpen) Discard();
+}
+
+void _CFileOut::Discard() {
+    m_isOpen = false;
+    m_file.Close();
+    Files::OS::CFile::DeleteFileW(m_path);
+}
+
+bool _CFileOut::Flush() {
+    const auto size = static_cast<ulong32>(BufferedSize());
+    ulong32 written = 0;
+    if (size && (!m_file.Write(Buffered(), size, &written) || written != size)) return false;
+    EmptyBuffer();
+    return true;
+}
+
+bool _CFileOut::Finish() {
+    if (!m_isOpen) return false;
+    if (HasFailed() || !Flush()) {
+        Discard();
+        return false;
+    }
+    m_isOpen = false;
+    return m_file.Close();
+}
+
+bool _CMemOut::Flush() {
+    const std::size_t size = BufferedSize();
+    tagCPOMEMHEADER*& block = Block::RefOf(m_collected);
+    const std::size_t used = block ? block->sUsed : 0;
+    if (!block || block->sAllocated - used < size) {
+        // The first block takes just what there is: most texts end with it. The next ones double.
+        const std::size_t capacity = std::max(used + size, used * 2);
+        auto* grown = block ? static_cast<tagCPOMEMHEADER*>(Platform::Reallocate(block, sizeof(*block) + capacity))
+                            : Block::NewBlock(capacity, 0, &Buffers::CPPlainMemory::_vtbl);
+        if (!grown) return false;
+        block = grown;
+        block->sAllocated = capacity;
+    }
+    std::memcpy(reinterpret_cast<unsigned char*>(block + 1) + used, Buffered(), size);
+    block->sUsed = used + size;
+    EmptyBuffer();
+    return true;
+}
+
+bool _CMemOut::Finish(Buffers::CPPlainMemory& out) {
+    if (HasFailed() || !Put(L"", 1) || !Flush()) {
+        m_collected.free();
+        out.free();
+        return false;
+    }
+    tagCPOMEMHEADER*& block = Block::RefOf(m_collected);
+    if (block->sAllocated != block->sUsed) {
+        void* trimmed = Platform::Reallocate(block, sizeof(*block) + block->sUsed);
+        if (trimmed) block = static_cast<tagCPOMEMHEADER*>(trimmed); // else it stays as large as it is
+        if (trimmed) block->sAllocated = block->sUsed;
+    }
+    out = m_collected;
+    m_collected.free();
+    return true;
+}
+
+// --- The element writer --------------------------------------------------------------------------------------------
+
+namespace {
+
+using namespace detail;
+
+bool MustEscape(wchar_t unit) { return IsAsciiClass(unit, kEscapeBit); }
+
+// The first of & < > " '.
+const wchar_t* FindEscape(const wchar_t* text, const wchar_t* end) {
+    for (; end - text >= static_cast<std::ptrdiff_t>(kUnitsPerBlock); text += kUnitsPerBlock)
+        if (HasEscape(Simd::Load(text))) break;
+    while (text != end && !MustEscape(*text)) ++text;
+    return text;
+}
+
+// The '>' of the next "]]>".
+const wchar_t* FindSectionEnd(const wchar_t* text, const wchar_t* end) {
+    for (std::ptrdiff_t brackets = 0; text != end; ++text) {
+        if (*text == L'>' && brackets >= 2) return text;
+        brackets = *text == L']' ? brackets + 1 : 0;
+    }
+    return end;
+}
+
+struct TextRange {
+    explicit TextRange(const CPPoolString& text) : first(text), end(first + String::UnitsOf(text)) {}
+    std::size_t Count() const { return static_cast<std::size_t>(end - first); }
+    const wchar_t* first;
+    const wchar_t* end;
+};
+
+// An element whose children are being written.
+struct Frame {
+    const Node* node;
+    const CPXMLObject* next;
+    const CPXMLObject* end;
+};
+
+// The way down to the current element; on the heap, since trees are deeper than stacks.
+class Path {
+public:
+    Path() = default;
+    Path(const Path&) = delete;
+    Path& operator=(const Path&) = delete;
+    ~Path() { Platform::Release(m_frames); }
+
+    bool IsEmpty() const { return m_count == 0; }
+    Frame& Last() { return m_frames[m_count - 1]; }
+    void Pop() { --m_count; }
+    bool Push(const Frame& frame) {
+        if (m_count == m_capacity && !Grow()) return false;
+        m_frames[m_count++] = frame;
+        return true;
+    }
+
+private:
+    bool Grow() {
+        const std::size_t capacity = m_capacity ? m_capacity * 2 : 64;
+        void* grown = m_frames ? Platform::Reallocate(m_frames, capacity * sizeof(Frame))
+                               : Platform::Allocate(capacity * sizeof(Frame));
+        if (!grown) return false;
+        m_frames = static_cast<Frame*>(grown);
+        m_capacity = capacity;
+        return true;
+    }
+
+    Frame* m_frames = nullptr;
+    std::size_t m_count = 0;
+    std::size_t m_capacity = 0;
+};
+
+class ElementWriter {
+public:
+    explicit ElementWriter(_CXMLOut& out) : m_out(out) {}
+
+    bool Run(const CPXMLObject& element) {
+        if (!Open(element)) return false;
+        // Every element above the current one is on the path, its tag open.
+        while (!m_path.IsEmpty()) {
+            Frame& last = m_path.Last();
+            if (last.next != last.end) {
+                const CPXMLObject& child = *last.next++;
+                
+                if (!Open(child)) return false;
+                continue;
+            }
+            const Node& node = *last.node;
+            m_path.Pop();
+            if (!Close(node)) return false;
+        }
+        return true;
+    }
+
+private:
+    static bool IsContainer(const Node& node) { return *static_cast<const wchar_t*>(node.name) == L'<'; }
+
+    // Writes an element up to its first child, or all of it when it has none.
+    bool Open(const CPXMLObject& element) {
+        if (!IsLive(element) || !NodeOf(element).name.isdef()) return false;
+        const Node& node = NodeOf(element);
+        if (node.contentKind == kInstruction) return PutInstruction(node);
+        if (IsContainer(node)) return Descend(node);
+        if (!Put("<", node.name, "") || !PutAttributes(node)) return false;
+        switch (node.contentKind) {
+        case kNothing:
+            return m_out.Put("/>") && m_out.EndLine();
+        case kElements:
+            if (!m_out.Put(">") || !m_out.EndLine()) return false;
+            m_out.Indent();
+            return Descend(node);
+        case kData:
+            return m_out.Put(">") && PutData(node) && PutEndTag(node);
+        default:
+            return false; // Intended: children and data together, which a textbook writes, would not read back.
+        }
+    }
+
+    bool Close(const Node& node) {
+        if (IsContainer(node)) return true;
+        m_out.Outdent();
+        return PutEndTag(node);
+    }
+
+    bool Descend(const Node& node) {
+        const CPXMLObject* first = Elements::First(node.elements);
+        return m_path.Push({&node, first, first + Elements::Count(node.elements)});
+    }
+
+    template <std::size_t before, std::size_t behind>
+    bool Put(const char (&prefix)[before], const CPPoolString& text, const char (&suffix)[behind]) {
+        return m_out.Put(prefix, text, String::UnitsOf(text), suffix);
+    }
+
+    bool PutEndTag(const Node& node) { return Put("</", node.name, ">") && m_out.EndLine(); }
+
+    bool PutInstruction(const Node& node) {
+        return node.data.isdef() && Put("<?", node.name, " ") && Put("", node.data, "?>");
+    }
+
+    bool PutAttributes(const Node& node) {
+        const Attribute* attribute = Attributes::First(node.attributes);
+        for (std::size_t left = Attributes::Count(node.attributes); left; --left, ++attribute) {
+            if (!Put(" ", attribute->name, "=\"")) return false;
+            const TextRange value(attribute->value);
+            if (!m_out.PutIfPlain(value.first, value.Count(), "\"") && !PutEscaped(value)) return false;
+        }
+        return true;
+    }
+
+    TAVO_NOINLINE bool PutEscaped(const TextRange& value) {
+        for (const wchar_t* text = value.first;;) {
+            const wchar_t* escape = FindEscape(text, value.end);
+            if (!PutRange(text, escape)) return false;
+            if (escape == value.end) return m_out.Put("\"");
+            if (!PutReference(*escape)) return false;
+            text = escape + 1;
+        }
+    }
+
+    bool PutReference(wchar_t unit) {
+        switch (unit) {
+        case L'&':
+            return m_out.Put("&amp;");
+        case L'<':
+            return m_out.Put("&lt;");
+        case L'>':
+            return m_out.Put("&gt;");
+        case L'"':
+            return m_out.Put("&quot;");
+        default:
+            return m_out.Put("&apos;");
+        }
+    }
+
+    bool PutData(const Node& node) {
+        const TextRange range(node.data);
+        return m_out.PutIfPlain(range.first, range.Count(), "") || PutSections(range);
+    }
+
+    // Data with a character that needs escaping goes out literally, in as many CDATA sections as it takes.
+    TAVO_NOINLINE bool PutSections(const TextRange& range) {
+        if (FindEscape(range.first, range.end) == range.end) return PutRange(range.first, range.end);
+        for (const wchar_t* text = range.first; text != range.end;) {
+            const wchar_t* sectionEnd = FindSectionEnd(text, range.end);
+            if (!m_out.Put("<![CDATA[", text, static_cast<std::size_t>(sectionEnd - text), "]]>")) return false;
+            text = sectionEnd;
+        }
+        return true;
+    }
+
+    bool PutRange(const wchar_t* first, const wchar_t* end) {
+        return m_out.Put(first, static_cast<std::size_t>(end - first));
+    }
+
+    _CXMLOut& m_out;
+    Path m_path;
+};
+
+} // namespace
+
+bool WriteElement(const CPXMLObject& element, _CXMLOut& out) noexcept { return ElementWriter(out).Run(element); }
+
+namespace {
+
+void WriteDocument(const CPXMLObject& element, _CXMLOut& out, eXMLEncoding encoding, bool pretty) {
+    if (encoding == XMLEncodingAutomatic) encoding = XMLEncodingUTF8;
+    if (!out.Begin(encoding, pretty) || !WriteElement(element, out)) out.SetFailed();
+}
+
+} // namespace
+
+bool CPXMLObject::Write(const wchar_t* path, eXMLEncoding encoding, bool pretty) const noexcept {
+    _CFileOut out(path);
+    if (!out.IsOpen()) return false;
+    WriteDocument(*this, out, encoding, pretty);
+    return out.Finish();
+}
+
+bool CPXMLObject::Write(Buffers::CPPlainMemory& out, eXMLEncoding encoding, bool pretty) const noexcept {
+    _CMemOut target;
+    WriteDocument(*this, target, encoding, pretty);
+    return target.Finish(out);
+}
+
+} // namespace TAVO::XML

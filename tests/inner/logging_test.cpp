@@ -1,0 +1,41 @@
+// The assertion lock and the prefix of a line.
+
+#include "logging.h"
+
+#include <gtest/gtest.h>
+#include <mutex>
+#include <thread>
+
+using namespace TAVO::Develop;
+
+TEST(AssertionLock, IsRecursiveAndExcludesOthers) {
+    AssertionLock lock;
+    std::atomic<bool> entered{false};
+    lock.lock();
+    lock.lock();
+    std::thread other([&] {
+        const std::lock_guard guard(lock);
+        entered = true;
+    });
+    lock.unlock();
+    std::this_thread::sleep_for(std::chrono::milliseconds(30));
+    EXPECT_FALSE(entered) << "one level is still held";
+    lock.unlock();
+    other.join();
+    EXPECT_TRUE(entered);
+}
+
+TEST(Prefix, HasTheFixedForm) {
+    wchar_t out[kPrefixUnits + 1];
+    out[kPrefixUnits] = L'#';
+    FormatPrefix(out, 1.2346, FindLevelLabel(acfDebugFull), L"host", "a/b", -7);
+    EXPECT_STREQ(out, L"   1.235 [FULL   ] [host] [] {[file:a/b] [line:-7]} ");
+    FormatPrefix(out, 123456.0, L"unknown", L"TAVO.default", nullptr, 9);
+    EXPECT_STREQ(out, L"123456.000 [unknown] [TAVO.default] [] ");
+    const std::string source(1000, 'x');
+    FormatPrefix(out, 0, L"INFO   ", L"c", source.c_str(), 1);
+    EXPECT_EQ(out[kPrefixUnits - 2], L'x') << "511 units are kept";
+    EXPECT_EQ(out[kPrefixUnits - 1], 0);
+    EXPECT_EQ(out[kPrefixUnits], L'#');
+    for (int level : {0, 3, 32, -2}) EXPECT_EQ(FindLevelLabel(static_cast<_acfDebugLevel>(level)), nullptr);
+}

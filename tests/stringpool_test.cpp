@@ -1,0 +1,562 @@
+// Interning against a slow reading of its rules: keys, identity, cut texts, case groups, sweeps, submitters.
+
+#include "support/assertions.h"
+#include "support/guardpage.h"
+#include "support/heapwatch.h"
+#include "support/texts.h"
+
+#include <atomic>
+#include <gtest/gtest.h>
+#include <optional>
+#include <string>
+#include <TAVO/string.h>
+#include <thread>
+#include <vector>
+
+using namespace TAVO::String;
+using support::Bytes;
+using support::Texts;
+using support::Units;
+
+namespace {
+
+constexpr std::size_t kAll = SIZE_MAX;
+using Wide = std::vector<wchar_t>;
+
+const wchar_t* Terminated(Wide& text) {
+    text.push_back(0);
+    return text.data();
+}
+const unsigned char* Utf8(const char* text) { return reinterpret_cast<const unsigned char*>(text); }
+void Sweep(int times = 1) {
+    for (int i = 0; i < times; ++i) EXPECT_TRUE(CStringPool::Collect(60000));
+}
+
+// What stands in an entry, its terminator left out.
+Wide UnitsOf(const CPPoolString& text, std::size_t count) {
+    const wchar_t* units = text;
+    EXPECT_EQ(units[count], 0);
+    return Wide(units, units + count);
+}
+const wchar_t* Entry(const CPPoolString& text) { return text; }
+
+// --- keys, computed slowly -------------------------------------------------------------------------------------------
+
+unsigned long long Checksum(const std::vector<unsigned>& values, bool folded) {
+    unsigned long long crc = 0;
+    for (unsigned value : values) {
+        if (folded && value >= 'A' && value <= 'Z') value += 'a' - 'A';
+        for (const unsigned byte : {value & 0xFF, value >> 8 & 0xFF})
+            for (int bit = 7; bit >= 0; --bit)
+                crc = crc << 1 ^ ((crc >> 63 ^ (byte >> bit & 1)) ? 0x42F0E1EBA9EA3693 : 0);
+    }
+    return crc;
+}
+
+struct Expected {
+    std::size_t length = 0, utf8Size = 0;
+    std::vector<unsigned> values;
+    Wide units;
+};
+
+// What interning the first n units gives; nothing for the null string.
+std::optional<Expected> Read(const Units& text, std::size_t n) {
+    Expected e;
+    for (std::size_t i = 0; i < text.size() && i < n;) {
+        unsigned value = text[i];
+        std::size_t taken = 1;
+        if (value >= 0xD800 && value < 0xE000) {
+            if (value < 0xDC00 && i + 1 == n) break; // cut
+            if (value >= 0xDC00 || i + 1 == text.size() || text[i + 1] < 0xDBFF) return {};
+            value = value % 0x400 || text[i + 1] % 0x400;
+            taken = 2;
+        }
+        for (std::size_t k = 0; k < taken; ++k) e.units.push_back(static_cast<wchar_t>(text[i + k]));
+        e.values.push_back(value);
+        e.utf8Size += value < 0x80 ? 1 : value < 0x800 ? 2 : 3;
+        ++e.length;
+        i += taken;
+    }
+    return e;
+}
+
+std::optional<Expected> Read(const Bytes& text, std::size_t n) {
+    Expected e;
+    bool beyond = false;
+    std::size_t i = 0;
+    while (i < text.size() && i < n) {
+        const unsigned lead = text[i];
+        const std::size_t size = lead < 0x80   ? 1
+                                 : lead < 0xC0 ? 0
+                                 : lead < 0xE0 ? 2
+                                 : lead < 0xF0 ? 3
+                                 : lead < 0xF5 ? 4
+                                               : 0;
+        if (size == 0) return {};
+        unsigned value = size == 1 ? lead : lead & (0x7Fu >> size);
+        for (std::size_t k = 1; k < size; ++k) {
+            if (i + k == n && n <= text.size()) goto end; // cut, and nothing wrong with what is there
+            if (i + k >= text.size() || text[i + k] / 0x40 != 2) return {};
+            value = value << 6 | (text[i + k] & 0x3F);
+        }
+        beyond |= value > 0x10FFFF;
+        if (value > 0xFFFF) e.units.push_back(static_cast<wchar_t>(0xD800 | value >> 10));
+        e.units.push_back(static_cast<wchar_t>(value > 0xFFFF ? 0xDC00 | (value & 0x3FF) : value));
+        e.values.push_back(value);
+        e.length += value > 0xFFFF ? 2 : 1;
+        i += size;
+    }
+end:
+    e.utf8Size = i;
+    if (beyond) return {};
+    return e;
+}
+
+::testing::AssertionResult Matches(const CPPoolString& text, const std::optional<Expected>& expected) {
+    const auto wrong = [&](const char* what) {
+        std::string values;
+        for (const unsigned value : expected ? expected->values : std::vector<unsigned>())
+            values += std::to_string(value) + " ";
+        return ::testing::AssertionFailure() << what << ": " << values;
+    };
+    if (!expected) return text.isnull() ? ::testing::AssertionSuccess() : wrong("not null");
+    if (expected->values.empty()) return text.isempty() ? ::testing::AssertionSuccess() : wrong("not empty");
+    if (text.len() != expected->length) return wrong("length");
+    if (text.UTF8Size() != expected->utf8Size) return wrong("UTF-8 size");
+    if (text.sHash() != Checksum(expected->values, false)) return wrong("hash");
+    if (text.sHashi() != Checksum(expected->values, true)) return wrong("hash regardless of case");
+    if (UnitsOf(text, expected->units.size()) != expected->units) return wrong("units");
+    return text.Verify() ? ::testing::AssertionSuccess() : wrong("verify");
+}
+
+// A text under way in every spelling: whole, at most n units, looked up, with memory that ends where it may be read.
+template <class Unit, class Text> void CheckText(const support::GuardedMemory& memory, const Text& text, bool cutAll) {
+    Text terminated(text);
+    terminated.push_back(0);
+    const auto* whole = reinterpret_cast<const Unit*>(memory.Place(terminated.data(), terminated.size()));
+    const auto expected = Read(text, kAll);
+    EXPECT_TRUE(CStringPool::QueryStringRef(whole).isdef() <= (expected && !expected->values.empty()));
+    {
+        const CPPoolString first = CStringPool::GetStringRef(whole);
+        ASSERT_TRUE(Matches(first, expected));
+        ASSERT_EQ(Entry(CStringPool::GetStringRef(whole)), Entry(first));
+        ASSERT_EQ(Entry(CStringPool::QueryStringRef(whole)), Entry(first));
+        ASSERT_EQ(Entry(CStringPool::GetStringRefn(whole, kAll)), Entry(first));
+        ASSERT_EQ(Entry(CStringPool::QueryStringRefn(whole, text.size() + 1)), Entry(first));
+        ASSERT_EQ(Entry(CStringPool::GetStringRefi(whole)), Entry(first));
+        ASSERT_EQ(Entry(CStringPool::QueryStringRefni(whole, kAll)), Entry(first));
+    }
+    Sweep(2);
+    for (std::size_t n = cutAll ? 0 : text.size(); n <= text.size(); ++n) {
+        const auto* cut = reinterpret_cast<const Unit*>(memory.Place(text.data(), n));
+        const auto part = Read(text, n);
+        const bool def = part && !part->values.empty();
+        ASSERT_EQ(CStringPool::QueryStringRefn(cut, n).isdef(), false);
+        ASSERT_TRUE(Matches(CStringPool::GetStringRefn(cut, n), part)) << n << " of " << text.size();
+        ASSERT_EQ(CStringPool::QueryStringRefn(cut, n).isdef(), def);
+        ASSERT_EQ(CStringPool::QueryStringRefni(cut, n).isdef(), def);
+        Sweep(2);
+    }
+}
+
+TEST(PoolKeys, FollowTheRulesForEveryText) {
+    const support::Assertions assertions;
+    const support::GuardedMemory memory;
+    support::TextSource source(1);
+    for (int i = 0; i < 400; ++i) {
+        const std::size_t length = source.Below(i % 8 ? 40 : 300);
+        ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, source.Utf8(length), i % 16 == 0));
+        ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, source.Utf16(length), i % 16 == 0));
+    }
+    EXPECT_EQ(assertions.Take(), Texts());
+}
+
+TEST(PoolKeys, FollowTheRulesForChosenTexts) {
+    const support::GuardedMemory memory;
+    for (const Units& text : std::initializer_list<Units>{
+             {'a'},
+             {'A', 'b', 'C', 'd', 'E', 'f', 'G', 'h', 'Z', '[', '@', 'z', '{', '`'},
+             {0x41, 0xD83D, 0xDE00, 0x42},
+             {0xD800, 0xDC00},
+             {0xD83D, 0xDBFF},
+             {0xD83D, 0xE000, 0xD83D, 0xFFFF},
+             {'a', 'b', 'c', 'd', 'e', 'f', 'g', 'h', 'i', 'j', 0xD83D, 0xDE00},
+             {'a', 0xDC00, 'b'},
+             {'a', 0xD83D},
+             {0xD7FF, 0xE000, 0xFFFF, 0x7F, 0x80, 0x7FF, 0x800, 0x141, 0x4100},
+             {0xC1, 0xC0, 0x41C0, 0x410},
+         })
+        ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, text, true));
+    for (const char* text :
+         {"a", "Abc", "\xC1\x81", "\xC0\x80", "x\xC0\x80y", "\xED\xA0\x80", "\xED\xA0\x80\xED\xB0\x80",
+          "\xF0\x9F\x98\x80", "\xF4\x8F\xBF\xBF", "\xF4\x90\x80\x80", "\xF0\x80\x81\x81", "\x80", "ab\xE4\xB8",
+          "ab\xE4\xB8\xAD", "abcd\xFF", "ABCDEFGH\xC3\x84IJKLMNOP",
+          "\xF0\x9F\x98\x80"
+          "ABC"}) {
+        const std::string bytes(text);
+        ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(bytes.begin(), bytes.end()), true)) << text;
+    }
+}
+
+TEST(PoolKeys, WideAndUtf8SpellingsMeet) {
+    const CPPoolString wide(L"Gr\u00FC\u00DFe \u4E2D"), utf8(Utf8("Gr\xC3\xBC\xC3\x9F"
+                                                                  "e \xE4\xB8\xAD"));
+    EXPECT_EQ(Entry(wide), Entry(utf8));
+    const wchar_t pair[] = {0xD83D, 0xDE00, 0};
+    EXPECT_NE(Entry(CPPoolString(pair)), Entry(CPPoolString(Utf8("\xF0\x9F\x98\x80"))));
+    EXPECT_EQ(CStringPool::GetStringRefn(reinterpret_cast<const unsigned short*>(pair), 1).isempty(), true);
+    EXPECT_EQ(Entry(CStringPool::GetStringRefn(reinterpret_cast<const unsigned short*>(pair), 2)),
+              Entry(CPPoolString(pair)));
+    EXPECT_TRUE(CStringPool::GetStringRefn(static_cast<const unsigned short*>(nullptr), 2).isnull());
+}
+
+TEST(PoolKeys, OverlongFormMeetsItsShortForm_Intended) {
+    {
+        const CPPoolString shortForm(L"A"), overlong(Utf8("\xC1\x81"));
+        EXPECT_EQ(Entry(shortForm), Entry(overlong));
+        EXPECT_EQ(overlong.UTF8Size(), 1u);
+        EXPECT_STREQ(reinterpret_cast<const char*>(static_cast<const unsigned char*>(shortForm)), "A");
+    }
+    Sweep(2);
+    const CPPoolString overlong(Utf8("\xC1\x81")), shortForm(L"A");
+    EXPECT_EQ(Entry(shortForm), Entry(overlong));
+    EXPECT_EQ(shortForm.UTF8Size(), 2u) << "who came first decides";
+    EXPECT_EQ(*static_cast<const unsigned char*>(shortForm), 0);
+}
+
+// --- ten units -------------------------------------------------------------------------------------------------------
+
+// Adds the checksum's generator to five units from `at` on: the checksum stays.
+Wide WithGenerator(Wide text, std::size_t at) {
+    const unsigned generator[] = {0x0100, 0xF042, 0xEBE1, 0xEAA9, 0x9336};
+    for (std::size_t i = 0; i < 5; ++i) text[at + i] = static_cast<wchar_t>(text[at + i] ^ generator[i]);
+    return text;
+}
+
+TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
+    for (std::size_t at = 0; at < 20; ++at) {
+        Wide text(30, L'\u4000'), twin = WithGenerator(text, at);
+        const CPPoolString first(Terminated(text)), second(Terminated(twin));
+        ASSERT_EQ(first.sHash(), second.sHash());
+        ASSERT_EQ(first.sHashi(), second.sHashi());
+        EXPECT_EQ(Entry(first) == Entry(second), at >= 10) << at;
+        EXPECT_EQ(UnitsOf(second, 30)[at] == text[at], at >= 10);
+        EXPECT_EQ(Entry(CStringPool::GetStringRefi(twin.data())), Entry(second));
+        EXPECT_TRUE(CStringPool::Verify());
+    }
+    Sweep(2);
+    const wchar_t faces[][3] = {{0xD83D, 0xDE00, 0}, {0xD83D, 0xDE01, 0}};
+    const wchar_t after[][13] = {{'t', 'e', 'n', ' ', 'u', 'n', 'i', 't', 's', ':', 0xD83D, 0xDE00, 0},
+                                 {'t', 'e', 'n', ' ', 'u', 'n', 'i', 't', 's', ':', 0xD83D, 0xDE01, 0}};
+    const CPPoolString one(faces[0]), two(faces[1]), ten(after[0]), same(after[1]);
+    EXPECT_EQ(one.sHash(), two.sHash());
+    EXPECT_NE(Entry(one), Entry(two));
+    EXPECT_EQ(Entry(ten), Entry(same));
+}
+
+TEST(PoolTenUnits, ManyTwinsInOneBucketStayApart) {
+    std::vector<CPPoolString> twins;
+    Wide base(40, L'\u4000');
+    for (unsigned mask = 0; mask < 32; ++mask) {
+        Wide text = base;
+        for (std::size_t bit = 0; bit < 5; ++bit)
+            if (mask >> bit & 1) text = WithGenerator(text, bit);
+        const CPPoolString twin(Terminated(text));
+        ASSERT_EQ(twin.sHash(), twins.empty() ? twin.sHash() : twins[0].sHash());
+        for (const auto& other : twins) ASSERT_NE(Entry(other), Entry(twin));
+        twins.push_back(twin);
+    }
+    twins.erase(twins.begin(), twins.begin() + 20);
+    Sweep(2);
+    for (const auto& twin : twins) EXPECT_EQ(Entry(CStringPool::QueryStringRef(Entry(twin))), Entry(twin));
+    EXPECT_TRUE(CStringPool::Verify());
+}
+
+// --- the public names ------------------------------------------------------------------------------------------------
+
+TEST(Pool, NullAndEmptyTextsHaveTheirOwnEntries) {
+    const wchar_t* const noWide = nullptr;
+    const unsigned char* const noUtf8 = nullptr;
+    for (const std::size_t n : {std::size_t{0}, std::size_t{5}, kAll}) {
+        EXPECT_TRUE(CStringPool::GetStringRefn(noWide, n).isnull() && CStringPool::GetStringRefn(noUtf8, n).isnull());
+        EXPECT_TRUE(CStringPool::QueryStringRefni(noWide, n).isnull() &&
+                    CStringPool::GetStringRefni(noUtf8, n).isnull());
+        EXPECT_TRUE(CStringPool::GetStringRefn(L"", n).isempty() && CStringPool::QueryStringRefn(L"", n).isempty());
+        EXPECT_TRUE(CStringPool::GetStringRefni(Utf8(""), n).isempty());
+    }
+    EXPECT_TRUE(CStringPool::GetStringRef(noWide).isnull() && CStringPool::QueryStringRefi(noUtf8).isnull());
+    EXPECT_TRUE(CStringPool::GetStringRefn(L"text", 0).isempty());
+    EXPECT_TRUE(CStringPool::GetStringRef(static_cast<IStringSubmitter*>(nullptr)).isnull());
+    const support::FailingHeap heap(0);
+    EXPECT_TRUE(CStringPool::GetStringRef(L"").isempty());
+    EXPECT_TRUE(CPPoolString(L"true") == CPPoolString::ptrue && CPPoolString(Utf8("false")) == CPPoolString::pfalse);
+}
+
+TEST(Pool, CaseGroupsAnswerTheFirstVariant) {
+    CPPoolString first(L"Case Group One!"), second(L"CASE GROUP ONE!"), third(L"case group one!");
+    EXPECT_NE(Entry(first), Entry(second));
+    for (const wchar_t* text : {L"case group one!", L"CASE GROUP ONE!", L"cASE gROUP oNE!"}) {
+        EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(first));
+        EXPECT_EQ(Entry(CStringPool::QueryStringRefi(text)), Entry(first));
+    }
+    EXPECT_EQ(Entry(CStringPool::GetStringRefi(Utf8("case GROUP one!"))), Entry(first));
+    EXPECT_EQ(Entry(CStringPool::GetStringRef(L"case group one!")), Entry(third));
+    EXPECT_TRUE(first.iequals(second));
+
+    const auto inherits = [](CPPoolString& gone, const CPPoolString& heir) {
+        gone.free();
+        Sweep(2);
+        EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"CASE group ONE!")), Entry(heir));
+    };
+    inherits(first, second); // the earliest interned of the others
+    CPPoolString again(L"Case Group One!");
+    inherits(second, third);
+    inherits(third, again);
+    again.free();
+    Sweep(2);
+    EXPECT_TRUE(CStringPool::QueryStringRefi(L"CASE GROUP ONE!").isnull());
+    const CPPoolString made = CStringPool::GetStringRefi(L"Case GROUP One!");
+    EXPECT_STREQ(Entry(made), L"Case GROUP One!") << "the first of a new group";
+}
+
+TEST(Pool, CaseGroupsOfManyVariantsKeepTheirOrder) {
+    std::vector<CPPoolString> variants;
+    for (unsigned mask = 0; mask < 64; ++mask) {
+        wchar_t text[] = L"abcdef group";
+        for (unsigned bit = 0; bit < 6; ++bit)
+            if (mask * 29 % 64 >> bit & 1) text[bit] = static_cast<wchar_t>(text[bit] - 32);
+        variants.emplace_back(text);
+    }
+    for (const std::size_t gone : {5, 0, 60, 30, 1}) variants.erase(variants.begin() + static_cast<long>(gone));
+    while (!variants.empty()) {
+        Sweep(2);
+        EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"ABCDEF GROUP")), Entry(variants.front()));
+        variants.erase(variants.begin(), variants.begin() + std::min<long>(7, static_cast<long>(variants.size())));
+    }
+}
+
+// --- sweeps ----------------------------------------------------------------------------------------------------------
+
+bool IsKept(const wchar_t* text) { return !CStringPool::QueryStringRef(text).isnull(); }
+
+TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweep) {
+    Sweep(2);
+    const auto items = CStringPool::GetNItems();
+    const auto size = CStringPool::GetSize();
+    CPPoolString text(L"swept at the second sweep");
+    const auto without = support::LiveBlocks();
+    EXPECT_EQ(*static_cast<const unsigned char*>(text), 's');
+    EXPECT_EQ(support::LiveBlocks(), without + 1);
+    EXPECT_EQ(CStringPool::GetNItems(), items + 1);
+    EXPECT_GT(CStringPool::GetSize(), size);
+    Sweep(3); // held
+    EXPECT_EQ(support::LiveBlocks(), without + 1);
+    text.free();
+    Sweep();
+    EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
+    EXPECT_TRUE(IsKept(L"swept at the second sweep")) << "a look-up does not prolong its life";
+    Sweep();
+    EXPECT_FALSE(IsKept(L"swept at the second sweep"));
+    EXPECT_EQ(CStringPool::GetNItems(), items);
+    EXPECT_EQ(CStringPool::GetSize(), size);
+}
+
+TEST(PoolSweep, StartsAnewWhenAnEntryWasHeldMeanwhile) {
+    CPPoolString text(L"held meanwhile");
+    const wchar_t* const entry = text;
+    text.free();
+    Sweep();
+    text = L"held meanwhile";
+    EXPECT_EQ(Entry(text), entry);
+    Sweep();
+    text.free();
+    Sweep();
+    EXPECT_TRUE(IsKept(L"held meanwhile"));
+    Sweep();
+    EXPECT_FALSE(IsKept(L"held meanwhile"));
+}
+
+TEST(PoolSweep, NeverTakesTrueAndFalse) {
+    Sweep(3);
+    EXPECT_EQ(Entry(CStringPool::QueryStringRef(L"true")), Entry(CPPoolString::ptrue));
+    EXPECT_EQ(Entry(CStringPool::GetStringRefi(L"FALSE")), Entry(CPPoolString::pfalse));
+    EXPECT_EQ(CPPoolString::ptrue.sHash(), Checksum({'t', 'r', 'u', 'e'}, false));
+    EXPECT_EQ(CPPoolString::pfalse.sHashi(), Checksum({'f', 'a', 'l', 's', 'e'}, true));
+    EXPECT_EQ(CPPoolString::pfalse.UTF8Size(), 5u);
+}
+
+TEST(PoolSweep, InInstalmentsReachesEveryBucket) {
+    std::vector<CPPoolString> texts;
+    for (int i = 0; i < 5000; ++i) texts.emplace_back(i + 7000000);
+    Sweep();
+    const auto items = CStringPool::GetNItems();
+    texts.clear();
+    for (int call = 0; call < 200000 && CStringPool::GetNItems() > items - 5000; ++call) CStringPool::Collect(0);
+    EXPECT_LE(CStringPool::GetNItems(), items - 5000);
+}
+
+// --- submitters ------------------------------------------------------------------------------------------------------
+
+class Submitter : public IStringSubmitter {
+public:
+    Submitter(std::size_t announced, Wide text, bool result = true, bool throws = false)
+        : m_announced(announced), m_text(std::move(text)), m_result(result), m_throws(throws) {}
+    std::size_t GetStringLen() override { return m_announced; }
+    bool GetString(wchar_t* out) override {
+        for (std::size_t i = 0; i <= m_announced; ++i) EXPECT_EQ(out[i], 0) << "room that is zeroed";
+        std::copy(m_text.begin(), m_text.end(), out);
+        // Called without the lock: another thread gets in meanwhile.
+        std::thread([] { EXPECT_STREQ(Entry(CPPoolString(L"meanwhile")), L"meanwhile"); }).join();
+        if (m_throws) throw 1;
+        return m_result;
+    }
+
+private:
+    std::size_t m_announced;
+    Wide m_text;
+    bool m_result, m_throws;
+};
+
+TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
+    const support::Assertions assertions;
+    struct Row {
+        const char* name;
+        Submitter submitter;
+        const wchar_t* expected; // null: the null string
+    };
+    Row rows[] = {
+        {"whole", {4, {'a', 'b', 'c', 'd'}}, L"abcd"},
+        {"short", {400, {'a', 'b', 'c'}}, L"abc"},
+        {"ends within", {5, {'a', 0, 'c', 'd', 'e'}}, L"a"},
+        {"nothing written", {5, {}}, L""},
+        {"refused", {3, {'a', 'b', 'c'}, false}, nullptr},
+        {"throwing", {3, {'a', 'b', 'c'}, true, true}, nullptr},
+        {"half a pair inside", {3, {'a', 0xD83D, 'c'}}, nullptr},
+        {"half a pair at the end", {2, {'a', 0xD83D}}, nullptr},
+        {"half a pair before the end", {9, {'a', 0xD83D}}, nullptr},
+        {"already there", {4, {'t', 'r', 'u', 'e'}}, L"true"},
+    };
+    for (Row& row : rows) {
+        const CPPoolString text = CStringPool::GetStringRef(&row.submitter);
+        EXPECT_EQ(text.isnull(), row.expected == nullptr) << row.name;
+        EXPECT_EQ(Entry(text), Entry(CPPoolString(row.expected))) << row.name;
+        EXPECT_TRUE(text.Verify()) << row.name;
+    }
+    EXPECT_EQ(assertions.Take(), Texts());
+    Submitter none(0, {}), endless(kAll, {}), vast(kAll / 4, {});
+    EXPECT_TRUE(CStringPool::GetStringRef(&none).isnull());
+    EXPECT_EQ(assertions.Take(), Texts{"_cppoolstring::create [submitter]: String length cannot be 0"});
+    EXPECT_TRUE(CStringPool::GetStringRef(&endless).isnull());
+    EXPECT_TRUE(CStringPool::GetStringRef(&vast).isnull());
+    EXPECT_TRUE(CStringPool::Verify());
+}
+
+TEST(PoolSubmitters, GiveBackWhatTheyDidNotUse) {
+    const CPPoolString meanwhile(L"meanwhile");
+    const auto before = CStringPool::GetSize();
+    const CPPoolString normal(L"abcy");
+    const auto each = CStringPool::GetSize() - before;
+    Submitter shortText(100000, {'a', 'b', 'c', 'z'});
+    const CPPoolString text = CStringPool::GetStringRef(&shortText);
+    EXPECT_EQ(CStringPool::GetSize(), before + 2 * each);
+}
+
+// --- integrity and memory --------------------------------------------------------------------------------------------
+
+TEST(Pool, VerifyFindsADamagedEntry) {
+    const support::Assertions assertions;
+    const CPPoolString text(L"to be damaged"), other(L"sound");
+    EXPECT_TRUE(CStringPool::Verify());
+    auto* units = const_cast<wchar_t*>(Entry(text));
+    for (const std::size_t at : {0u, 6u, 12u}) {
+        const wchar_t old = std::exchange(units[at], L'#');
+        EXPECT_FALSE(text.Verify());
+        EXPECT_FALSE(CStringPool::Verify());
+        EXPECT_EQ(assertions.Take(), (Texts{"String pool integrity violation", "String pool integrity violation"}));
+        units[at] = old;
+    }
+    EXPECT_TRUE(text.Verify() && other.Verify() && CPPoolString().Verify() && CStringPool::Verify());
+    EXPECT_EQ(assertions.Take(), Texts());
+}
+
+TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
+    const support::Assertions assertions;
+    const CPPoolString variant(L"a text that may not fit"), second(L"a text that MAY not fit");
+    int number = 0;
+    support::ForEachFailingAllocation([&] {
+        Sweep(2);
+        const auto items = CStringPool::GetNItems();
+        ++number;
+        {
+            const CPPoolString texts[] = {CStringPool::GetStringRef(L"A text that may not fit"),
+                                          CStringPool::GetStringRef(Utf8("a TEXT that may not fit")),
+                                          CStringPool::GetStringRefi(L"another text"), CPPoolString(number)};
+            Submitter submitter(40, {'s', 'u', 'b'});
+            const CPPoolString submitted = CStringPool::GetStringRef(&submitter);
+            std::size_t made = !submitted.isnull();
+            for (const auto& text : texts) made += !text.isnull();
+            const bool meanwhile = IsKept(L"meanwhile");
+            EXPECT_EQ(CStringPool::GetNItems(), items + made + meanwhile);
+            EXPECT_STREQ(Entry(CStringPool::QueryStringRefi(L"A TEXT THAT MAY NOT FIT")), Entry(variant));
+            if (!texts[0].isnull()) {
+                const unsigned char* utf8 = texts[0];
+                EXPECT_TRUE(*utf8 == 0 || *utf8 == 'A');
+            }
+        }
+        EXPECT_TRUE(CStringPool::Verify());
+        Sweep(2);
+        EXPECT_EQ(CStringPool::GetNItems(), items);
+    });
+    EXPECT_EQ(assertions.Take(), Texts());
+}
+
+TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
+    constexpr int kThreads = 4, kTexts = 64, kRounds = 3000;
+    std::atomic<bool> stop{false};
+    std::thread sweeper([&] {
+        while (!stop) {
+            CStringPool::Collect(1);
+            CStringPool::GetSize();
+        }
+    });
+    std::vector<std::thread> threads;
+    std::atomic<int> wrong{0};
+    for (int t = 0; t < kThreads; ++t)
+        threads.emplace_back([&, t] {
+            std::vector<CPPoolString> held(8);
+            for (int i = 0; i < kRounds; ++i) {
+                const int number = (i * 7 + t * 13) % kTexts;
+                char name[] = "Thread text 00";
+                name[12] = static_cast<char>('0' + number / 10);
+                name[13] = static_cast<char>('0' + number % 10);
+                if (i % 3 == 0) name[0] = 't';
+                const CPPoolString text(Utf8(name)), again(name);
+                wrong += Entry(text) != Entry(again);
+                wrong += !CStringPool::GetStringRefi(Utf8(name)).iequals(text);
+                wrong += *static_cast<const unsigned char*>(text) != static_cast<unsigned char>(name[0]);
+                held[static_cast<std::size_t>(i % 8)] = text;
+            }
+        });
+    for (auto& thread : threads) thread.join();
+    stop = true;
+    sweeper.join();
+    EXPECT_EQ(wrong, 0);
+    EXPECT_TRUE(CStringPool::Verify());
+}
+
+// A host's static objects: made before main and ended after it, both times with the pool at hand.
+struct HostStatic {
+    CPPoolString text{L"made by a static constructor"};
+    const wchar_t* entry = text;
+    ~HostStatic() {
+        const CPPoolString late(L"made by a static destructor");
+        if (!late.isdef() || Entry(text) != entry || Entry(CPPoolString(entry)) != entry) std::abort();
+    }
+} g_static;
+
+TEST(Pool, ServesStaticConstructors) {
+    EXPECT_STREQ(g_static.entry, L"made by a static constructor");
+    EXPECT_EQ(Entry(CPPoolString(L"made by a static constructor")), g_static.entry);
+}
+
+} // namespace
