@@ -40,7 +40,8 @@ fail() { printf 'demo.sh: %s\n' "$1" >&2; exit 1; }
 indent() { sed 's/^/   | /'; }
 # Cuts long lines, and not inside a character.
 shorten() { awk 'length($0) > 110 { $0 = substr($0, 1, 107); sub(/[\300-\377][\200-\277]*$/, ""); $0 = $0 "..." } { print }'; }
-tavo() { $run "$here/build/$preset/bin/tavo$exe" "$@"; }
+# Wine takes names and texts in the locale's encoding.
+tavo() { LC_ALL=C.UTF-8 $run "$here/build/$preset/bin/tavo$exe" "$@"; }
 
 mkdir -p "$here/build"
 work=$(mktemp -d "$here/build/demo.XXXXXX")

@@ -112,7 +112,7 @@ build() { # <preset> [target ...]
 
 suite() { # <preset>
   build "$1"
-  step "$1" test ctest --preset "$1" -V
+  step "$1" test ctest --preset "$1" -V --timeout 300
 }
 
 fuzz() {

@@ -223,6 +223,27 @@ TEST(Configuration, SwitchesReportsOfFailedResultCodes) {
     EXPECT_EQ(both[1].line, 28);
 }
 
+TEST(Configuration, TellsItsSwitches) {
+    const struct {
+        const char* configuration;
+        bool box, log, stop;
+    } rows[] = {{nullptr, false, false, false},
+                {"[Debug]\nAssertBox=1\n", true, false, false},
+                {"[Debug]\nLogFailedHRESULT=2\nAssertBox=0\n", false, true, false},
+                {"[Debug]\nBreakOnHRESULT=1\n", false, false, true},
+                {"[Debug]\nAssertBox=1\nLogFailedHRESULT=1\nBreakOnHRESULT=1\n", true, true, true}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.configuration ? row.configuration : "no file");
+        const support::LibraryCopy copy("Renamed", row.configuration);
+        const auto get = copy.Find<tagSWITCHES (*)()>("_ZN4TAVO7Develop11GetSwitchesEv");
+        ASSERT_TRUE(get);
+        const tagSWITCHES switches = get();
+        EXPECT_EQ(switches.AssertBox, row.box);
+        EXPECT_EQ(switches.LogFailedHRESULT, row.log);
+        EXPECT_EQ(switches.BreakOnHRESULT, row.stop);
+    }
+}
+
 TEST(ResultCode, ComparesAndConverts) {
     const hr good(1), bad(kFailure), alsoBad(bad);
     EXPECT_TRUE(good);

@@ -231,7 +231,6 @@ TEST(ToolSet, ChangesTextsAndAttributes) {
         {"elements", {"c", "text"}, kBadInput, nullptr, "holds elements"},
         {"no such place", {"q", "text"}, kBadInput, nullptr, "there is no q"},
         {"bad path", {"b//c", "text"}, kUsage, nullptr, "no path"},
-        {"bad text", {"b", "\xFF"}, kBadInput, nullptr, "cannot be kept"},
         {"beyond reach", {"b", "\xF4\x80\x80\x80"}, kBadInput, nullptr, "cannot be kept"},
         {"blanks that collapse",
          {"b", "x  y"},

@@ -18,7 +18,6 @@ namespace {
 constinit ProcessFacts g_facts;
 constinit std::atomic<bool> g_loaded{false};
 constinit std::atomic<bool> g_processEnding{false};
-constinit std::atomic<std::uint32_t> g_initCount{0};
 
 bool IsSeparator(wchar_t unit) { return unit == L'/' || unit == L'\\'; }
 

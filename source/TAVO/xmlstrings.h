@@ -141,7 +141,6 @@ private:
         return (bytes | bytes << 8) & 0x00FF00FF00FF00FF;
     }
 
-
     Slot m_slots[Slots];
 };
 

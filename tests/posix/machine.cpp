@@ -4,6 +4,7 @@
 #include <cstdlib>
 #include <dlfcn.h>
 #include <fstream>
+#include <pthread.h>
 #include <sys/ptrace.h>
 #include <sys/wait.h>
 #include <TAVO/core.h>
@@ -96,6 +97,21 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
     const std::string text = ReadToEnd(ends[0]);
     close(ends[0]);
     return text;
+}
+
+void RunOnStack(std::size_t bytes, const std::function<void()>& body) {
+    const auto run = [](void* work) -> void* {
+        (*static_cast<const std::function<void()>*>(work))();
+        return nullptr;
+    };
+    pthread_attr_t attributes;
+    pthread_attr_init(&attributes);
+    pthread_t thread;
+    if (pthread_attr_setstacksize(&attributes, bytes) != 0 ||
+        pthread_create(&thread, &attributes, run, const_cast<std::function<void()>*>(&body)) != 0)
+        std::abort();
+    pthread_join(thread, nullptr);
+    pthread_attr_destroy(&attributes);
 }
 
 } // namespace support

@@ -15,7 +15,7 @@ TEST(TimecodePeer, LibavutilShowsTheSameDropFrameLabels) {
     for (int framesPerSecond : {30, 60}) {
         const TAVO::ulong32 sys = framesPerSecond == 30 ? eSystemNTSCDF : eSystemHDNTSCDF;
         const long long frame = timecode::GetFrameBU(sys);
-        for (int n = 0; n < 2589408 / 30 * framesPerSecond; ++n) {
+        for (int n = 0; n < 2589408 * (framesPerSecond / 30); ++n) {
             const int shown = av_timecode_adjust_ntsc_framenum2(n, framesPerSecond);
             const TCINFO label(n * frame, sys);
             const auto seconds = (label.hh() * 60 + label.mm()) * 60 + label.ss();

@@ -2,6 +2,8 @@
 // What the tests need of the machine: copies of the library with a configuration of their own, plug-ins and
 // child processes.
 
+#include <cstddef>
+#include <functional>
 #include <string>
 
 namespace support {
@@ -50,5 +52,8 @@ private:
 // Runs this program again, under a debugger that lets it run, with one (disabled) test only. Gives what reached the
 // debugger: its output channel on Windows, standard error elsewhere. `exitCode` is the child's.
 std::string RunUnderDebugger(const char* test, int& exitCode);
+
+// Runs `body` on a thread with a stack of that many bytes, and waits for its end.
+void RunOnStack(std::size_t bytes, const std::function<void()>& body);
 
 } // namespace support

@@ -1,5 +1,6 @@
 #include "support/machine.h"
 
+#include <cstdlib>
 #include <fstream>
 #include <windows.h>
 
@@ -108,6 +109,18 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
     CloseHandle(child.hThread);
     CloseHandle(child.hProcess);
     return text;
+}
+
+void RunOnStack(std::size_t bytes, const std::function<void()>& body) {
+    const auto run = [](void* work) -> DWORD {
+        (*static_cast<const std::function<void()>*>(work))();
+        return 0;
+    };
+    const HANDLE thread = CreateThread(nullptr, bytes, run, const_cast<std::function<void()>*>(&body),
+                                       STACK_SIZE_PARAM_IS_A_RESERVATION, nullptr);
+    if (!thread) std::abort();
+    WaitForSingleObject(thread, INFINITE);
+    CloseHandle(thread);
 }
 
 } // namespace support

@@ -30,7 +30,9 @@ int About() {
     Print(
         "Platform and startup path are texts that hosts compare, the same on every system; no folder can be told from "
         "them.\n");
-    Print("The switches stand in section [Debug] of the .ini file beside the library, and were read when it loaded.\n");
+    Print("The switches stand in section [Debug] of the file TAVO.ini (libTAVO.ini on Linux) beside the library, and "
+          "were "
+          "read when it was loaded.\n");
     return kFine;
 }
 
