@@ -55,6 +55,53 @@ struct PoolStatOptions {
 };
 int PoolStat(const PoolStatOptions& options);
 
+struct TcSystemsOptions {
+    bool json = false;
+};
+int TcSystems(const TcSystemsOptions& options);
+
+// A system is a name, a code or a rate; an empty one is not given.
+struct TcConvertOptions {
+    std::string text, from, to;
+    bool align = false, retime = false; // neither: the count stays
+    bool json = false;
+};
+int TcConvert(const TcConvertOptions& options);
+
+struct TcSumOptions {
+    std::string left, right, system;
+    bool json = false;
+};
+int TcAdd(const TcSumOptions& options);
+int TcSub(const TcSumOptions& options);
+
+struct TcShowOptions {
+    std::string text, system;
+    bool json = false;
+};
+int TcShow(const TcShowOptions& options);
+
+struct TcTableOptions {
+    std::string text, system; // without text around the first minute of the system
+    unsigned frames = 4;      // on each side
+    bool json = false;
+};
+int TcTable(const TcTableOptions& options);
+
+struct TcCheckOptions {
+    std::vector<std::string> texts;
+    std::string system;
+    bool json = false;
+};
+int TcCheck(const TcCheckOptions& options);
+
+struct RationalApproxOptions {
+    std::string number;
+    unsigned maxDenominator = 0;
+    bool json = false;
+};
+int RationalApprox(const RationalApproxOptions& options);
+
 int About();
 
 } // namespace tool

@@ -85,8 +85,80 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
         ->capture_default_str();
 }
 
+constexpr const char* kPositionHelp =
+    "a text such as 10:00:00:00, whose separators tell the system, the universal form, or a count: 1200 base units, "
+    "25frames, 50fields, 1.5s; write -- before one that begins with -";
+constexpr const char* kSystemHelp =
+    "a name, a code, or a rate such as 25/1 or, where drop frame exists, 30000/1001/D and 30000/1001/ND";
+
+CLI::Option* AddSystem(CLI::App& command, const char* option, std::string& system) {
+    return command.add_option(option, system, kSystemHelp)->type_name("SYSTEM");
+}
+
+void AddJson(CLI::App& command, bool& json) { command.add_flag("--json", json, "as JSON"); }
+
+void AddSum(CLI::App& command, Action& action, int (*run)(const TcSumOptions&)) {
+    auto& sum = Add<TcSumOptions>(command, action, run);
+    command.add_option("A", sum.left, kPositionHelp)->required()->type_name("");
+    command.add_option("B", sum.right, "the same; a count is one of A's system")->required()->type_name("");
+    AddSystem(command, "--system", sum.system);
+    AddJson(command, sum.json);
+}
+
+void AddTimecodeCommands(CLI::App& tc, Action& action) {
+    tc.require_subcommand(1);
+
+    auto* command = tc.add_subcommand("systems", "Lists the timecode systems");
+    AddJson(*command, Add<TcSystemsOptions>(*command, action, TcSystems).json);
+
+    command =
+        tc.add_subcommand("convert", "Shows a position in another system: the same base units, aligned, or retimed");
+    auto& convert = Add<TcConvertOptions>(*command, action, TcConvert);
+    command->add_option("POSITION", convert.text, kPositionHelp)->required()->type_name("");
+    AddSystem(*command, "--from", convert.from);
+    AddSystem(*command, "--to", convert.to)->required();
+    auto* align = command->add_flag("--align", convert.align, "the nearest frame of the other system");
+    command->add_flag("--retime", convert.retime, "the same real time")->excludes(align);
+    AddJson(*command, convert.json);
+
+    AddSum(*tc.add_subcommand("add", "Adds positions; the result is in the first one's system"), action, TcAdd);
+    AddSum(*tc.add_subcommand("sub", "Subtracts positions"), action, TcSub);
+
+    command = tc.add_subcommand("show", "Shows a position in every form");
+    auto& show = Add<TcShowOptions>(*command, action, TcShow);
+    command->add_option("POSITION", show.text, kPositionHelp)->required()->type_name("");
+    AddSystem(*command, "--system", show.system);
+    AddJson(*command, show.json);
+
+    command = tc.add_subcommand("table", "Lists the frames around a position, or around the end of minute 0");
+    auto& table = Add<TcTableOptions>(*command, action, TcTable);
+    command->add_option("POSITION", table.text, kPositionHelp)->type_name("");
+    AddSystem(*command, "--system", table.system);
+    command->add_option("--frames", table.frames, "how many on each side")
+        ->check(CLI::Range(0, 100000))
+        ->capture_default_str();
+    AddJson(*command, table.json);
+
+    command = tc.add_subcommand("check", "Tells whether texts are valid, invalid or unassigned, and why");
+    auto& check = Add<TcCheckOptions>(*command, action, TcCheck);
+    command->add_option("TEXT", check.texts, kPositionHelp)->required()->type_name("");
+    AddSystem(*command, "--system", check.system);
+    AddJson(*command, check.json);
+}
+
+void AddRationalCommands(CLI::App& rational, Action& action) {
+    rational.require_subcommand(1);
+    auto* command = rational.add_subcommand("approx", "Finds the best fraction for a number");
+    auto& approx = Add<RationalApproxOptions>(*command, action, RationalApprox);
+    command->add_option("X", approx.number, "a decimal number")->required()->type_name("");
+    command->add_option("--max-den", approx.maxDenominator, "the largest denominator allowed")
+        ->required()
+        ->check(CLI::Range(1, 1073741823));
+    AddJson(*command, approx.json);
+}
+
 int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML with the library TAVO.\n"
+    CLI::App app("Reads, shows, changes, checks and measures XML, and computes timecode, with the library TAVO.\n"
                  "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
                  "tavo");
     app.allow_windows_style_options(false); // a name may begin with '/'
@@ -99,6 +171,8 @@ int Run(std::vector<std::string> arguments) {
     auto* command = pool->add_subcommand("stat", "Tells what the pool holds before, with and after documents");
     auto& poolStat = Add<PoolStatOptions>(*command, action, PoolStat);
     command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
+    AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
+    AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
 
     std::reverse(arguments.begin(), arguments.end()); // the order that the parser wants
