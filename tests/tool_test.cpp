@@ -392,6 +392,312 @@ TEST(ToolAbout, TellsTheProcessAndTheSwitches) {
         EXPECT_TRUE(Contains(run.output, line)) << line << "in\n" << run.output;
 }
 
+TEST(ToolTimecode, ListsTheSystems) {
+    const Finished run = RunTool({"tc", "systems"});
+    EXPECT_EQ(run.code, kFine);
+    EXPECT_EQ(run.errors, "");
+    for (const char* line :
+         {"   0  PAL               25/1     48     24  :::         none\n",
+          "   2  NTSC(DF)    30000/1001     40     20  .:.         00 to 01, not each 10th minute\n",
+          "   5  HDFILM(DF)  24000/1001     50     25  ..,         00 to 01, not each 4th minute\n",
+          "   8  HDNTSC(DF)  60000/1001     20     10  ...         00 to 03, not each 10th minute\n",
+          "  13  HD60              60/1     20     10  :.;         none\n", "No standard knows HDFILM(DF).\n"})
+        EXPECT_TRUE(Contains(run.output, line)) << line << "in\n" << run.output;
+    const Finished json = RunTool({"tc", "systems", "--json"});
+    EXPECT_TRUE(Contains(json.output, "{\"code\":9,\"name\":\"PAL(PX)\",\"rate\":\"25/2\",\"frameUnits\":96,"
+                                      "\"fieldUnits\":48,\"unitSeconds\":0.0008333333333333334,\"drop\":null,"
+                                      "\"separators\":\".,:\"},\n"))
+        << json.output;
+    EXPECT_TRUE(Contains(json.output, "\"drop\":{\"frames\":4,\"period\":10}"));
+}
+
+TEST(ToolTimecode, TakesSystemsByNameCodeAndRate) {
+    const struct {
+        const char* system;
+        const char* name;  // null for what is refused
+        const char* error; // part of the complaint
+    } rows[] = {
+        {"NTSC(DF)", "2 NTSC(DF)", ""},
+        {"ntsc(df)", "2 NTSC(DF)", ""},
+        {"0", "0 PAL", ""},
+        {"13", "13 HD60", ""},
+        {"30000/1001/D", "2 NTSC(DF)", ""},
+        {"30000/1001/ND", "1 NTSC", ""},
+        {"24000/1001/ND", "4 HDFILM", ""},
+        {"60000/1001/D", "8 HDNTSC(DF)", ""},
+        {"25/1", "0 PAL", ""},
+        {"25/1/ND", "0 PAL", ""},
+        {"50/2", "0 PAL", ""},
+        {"25/2", "9 PAL(PX)", ""},
+        {"60/1", "13 HD60", ""},
+        {"5", "5 HDFILM(DF)", "warning: no standard knows HDFILM(DF)"},
+        {"24000/1001/D", "5 HDFILM(DF)", "warning: no standard knows HDFILM(DF)"},
+        {"30000/1001", nullptr, "that of NTSC and of NTSC(DF), so write 30000/1001/ND or 30000/1001/D"},
+        {"24000/1001", nullptr, "that of HDFILM and of HDFILM(DF)"},
+        {"60000/1001", nullptr, "that of HDNTSC and of HDNTSC(DF)"},
+        {"25/1/D", nullptr, "no drop frame at this rate"},
+        {"25/2/D", nullptr, "no drop frame at this rate"},
+        {"30000/1001/X", nullptr, "behind the rate stands /D"},
+        {"29/1", nullptr, "no system has this rate"},
+        {"0/0", nullptr, "no system has this rate"},
+        {"/", nullptr, "no system has this rate"},
+        {"-25/-1", nullptr, "no system has this rate"},
+        {"99999999999/1", nullptr, "no system has this rate"},
+        {"14", nullptr, "codes go from 0 to 13"},
+        {"25", nullptr, "codes go from 0 to 13"},
+        {"29.97", nullptr, "give a name, a code, or a rate"},
+        {"NTSCDF", nullptr, "give a name, a code, or a rate"},
+        {"\xFF", nullptr, "\"\xEF\xBF\xBD\" is no system"},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.system);
+        const Finished run = RunTool({"tc", "show", "0", "--system", row.system});
+        EXPECT_EQ(run.code, row.name ? kFine : kUsage);
+        EXPECT_EQ(run.output.find(std::string("system            ") + (row.name ? row.name : "") + '\n'),
+                  row.name ? 0u : run.output.npos);
+        EXPECT_TRUE(*row.error ? Contains(run.errors, row.error) : run.errors.empty()) << run.errors;
+    }
+}
+
+TEST(ToolTimecode, ShowsAPositionInEveryForm) {
+    ExpectRun(RunTool({"tc", "show", "10.00:00.00"}), kFine,
+              "system            2 NTSC(DF)\ncount             43156800\nfields            2157840\n"
+              "frames            1078920\nwhole frames      yes\nseconds           35999.96399999999\n"
+              "sign              1\ndays              0\nhh                10\nmm                0\n"
+              "ss                0\nff                0\nfixed text         10.00:00.00\n"
+              "universal text    10:00:00:00 {30000/1001}Hz/D\n",
+              "");
+    ExpectRun(RunTool({"tc", "show", "--json", "--system", "PAL", "--", "-48"}), kFine,
+              "{\"system\":{\"code\":0,\"name\":\"PAL\"},\"count\":-48,\"fields\":-2,\"frames\":-1,"
+              "\"wholeFrames\":true,\"seconds\":-0.04,\"sign\":-1,\"days\":0,\"hh\":0,\"mm\":0,\"ss\":0,\"ff\":1,"
+              "\"fixedText\":\"-00:00:00:01\",\"universalText\":\"23:59:59:24-{25/1}Hz\"}\n",
+              "");
+    // Counts beyond 32 bits of fields are not cut.
+    const Finished end = RunTool({"tc", "show", "9223372036854775807", "--system", "PAL"});
+    EXPECT_TRUE(Contains(end.output, "fields            384307168202282325\n")) << end.output;
+    EXPECT_TRUE(Contains(end.output, "days              88959992639\n")) << end.output;
+    EXPECT_TRUE(Contains(end.output, "fixed text        >##:##:##:##\n")) << end.output;
+}
+
+TEST(ToolTimecode, ReadsCountsWithUnits) {
+    const struct {
+        const char* text;
+        const char* count; // null for what is refused
+        const char* error;
+    } rows[] = {
+        {"1200", "1200", ""},
+        {"+1200", "1200", ""},
+        {"1200bu", "1200", ""},
+        {"25frames", "1200", ""},
+        {"50fields", "1200", ""},
+        {"1.5s", "1800", ""},
+        {"89478485fields", "2147483640", ""},
+        {"89478486fields", nullptr, "89478485 at most"},
+        {"99999999999999999999fields", nullptr, "64 bits"},
+        {"9223372036854775808", nullptr, "64 bits"},
+        {"192153584101141162frames", "9223372036854775776", ""},
+        {"192153584101141163frames", nullptr, "64 bits"},
+        {"1e400s", nullptr, "character 2 is \\\"e\\\""},
+        {"99999999999999999999999s", nullptr, "64 bits"},
+        {"1.5frames", nullptr, "only seconds may have a point"},
+        {"25bits", nullptr, "character 3 is \\\"b\\\", where a separator behind the hours belongs"},
+        {"25 frames", nullptr, "character 3 is \\\" \\\""},
+        {"+", nullptr, "it ends after character 1, where a digit of the hours belongs"},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.text);
+        const Finished run = RunTool({"tc", "check", "--system", "0", "--json", row.text});
+        EXPECT_EQ(run.code, row.count ? kFine : kBadInput);
+        const std::string wanted = row.count ? std::string("\"count\":") + row.count + ',' : row.error;
+        EXPECT_TRUE(Contains(run.output, wanted)) << run.output;
+    }
+}
+
+TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
+    const std::string longest(300, '1');
+    const struct {
+        std::string text;
+        const char* verdict;
+        const char* words;
+        const char* system = nullptr; // asked for
+    } rows[] = {
+        {"10:00:00:00", "valid", "PAL, 43200000 base units"},
+        {" 10:00:00:00", "valid", "PAL, 43200000 base units"},
+        {"-10:00:00:00", "valid", "PAL, -43200000 base units"},
+        {"00.01:00.02", "valid", "NTSC(DF), 72000 base units"},
+        {"10:00:00:00 {30000/1001}Hz/D", "valid", "NTSC(DF), 43156800 base units"},
+        {"10:00:00:00 {25/2}Hz", "valid", "PAL(PX), 43200000 base units"},
+        {"10:00:00:24", "valid", "PAL"},
+        {"10:00:00:25", "invalid", "the frames are 25: PAL counts 00 to 24"},
+        {"10:00:60:00", "invalid", "the seconds are 60: they go from 00 to 59"},
+        {"10:60:60:99", "invalid", "the minutes are 60"},
+        {"10.00,01:12", "invalid", "the frames are 12: in an odd second PAL(PX) counts 00 to 11"},
+        {"10.00,00:12", "valid", "PAL(PX)"},
+        {"00.01:00.01", "invalid", "NTSC(DF) skips this label, the minute begins with frame 02"},
+        {"00.01.00.03", "invalid", "HDNTSC(DF) skips this label, the minute begins with frame 04"},
+        {"00:01:00:00 {24000/1001}Hz/D", "invalid", "HDFILM(DF) skips this label"},
+        {"744:00:00:00 {25/1}Hz", "invalid", "the hours are 744: they go to 743"},
+        {"00:00:00:30 {30/1}Hz", "invalid", "the frames are 30: HD30 counts 00 to 29"},
+        {"10:00:00:00+{25/1}Hz", "invalid", "the mark \"+\" moves by a span that is too large in PAL"},
+        {">##:##:##:##", "invalid", "a position of a day or more"},
+        {"*##:##:##:##", "invalid", "an invalid position"},
+        {"--:--:--:--", "unassigned", "dashes stand for a position that is not given"},
+        {" --:--:--:--", "unassigned", "dashes"},
+        {"--:--:--:-- {25/1}Hz", "unassigned", "dashes"},
+        {"", "unassigned", "it is empty"},
+        {"x", "unassigned", "character 1 is \"x\", where a digit of the hours belongs"},
+        {"10:00-00:00", "unassigned", "character 6 is \"-\", where a separator behind the minutes belongs"},
+        {"10:00:0x:00", "unassigned", "character 8 is \"x\", where a digit of the seconds belongs"},
+        {"10:00:00:\xC3\xA9\x30", "unassigned", "character 10 is \"\xC3\xA9\", where a digit of the frames"},
+        {"10:00:00", "unassigned", "it ends after character 8, where a separator behind the seconds belongs"},
+        {"10:00:00:000", "unassigned", "character 12 is \"0\", where the end belongs"},
+        {"-10:00:00:00 ", "unassigned", "character 13 is \" \", where the end belongs"},
+        {"10.00,00.00", "unassigned", "no system has the separators \".\", \",\" and \".\""},
+        {"10,00:00:00", "unassigned", "no system has the separators \",\", \":\" and \":\""},
+        {"1200", "unassigned", "it is a count without fields, and does not tell its system"},
+        {"\xFF", "unassigned", "it is no UTF-8"},
+        {longest, "unassigned", "it is a count"},
+        {longest + ':', "unassigned", "character 3 is \"1\", where a separator behind the hours belongs"},
+        {"10:00:00:00 {25/3}Hz", "unassigned", "the rate 25/3 is that of no system"},
+        {"10:00:00:00 {25/2}Hz/D", "unassigned", "there is no drop frame at the rate 25/2"},
+        {"10:00:00 {25/1}Hz", "unassigned", "character 9 is \" \", where \":\" behind the seconds belongs"},
+        {"10:00:00:00{25/1}Hz", "unassigned", "character 13 is \"2\", where \"{\" before the rate belongs"},
+        {"10:00:00:00 {25-1}Hz", "unassigned", "character 16 is \"-\", where \"/\" within the rate belongs"},
+        {"{", "unassigned", "character 1 is \"{\", where a number, the hours, belongs"},
+        {"99999999999:0:0:0 {25/1}Hz", "invalid", "the number of the hours does not fit 32 bits"},
+        {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "unassigned", "47 characters at most, and this one 120"},
+        // With a system: its separators or colons, for drop frame also ';' before the frames.
+        {"00:01:00:02", "valid", "NTSC(DF), 72000 base units", "NTSC(DF)"},
+        {"00:01:00;02", "valid", "NTSC(DF), 72000 base units", "NTSC(DF)"},
+        {"00.01:00.02", "valid", "NTSC(DF), 72000 base units", "NTSC(DF)"},
+        {"00:01:00:00", "invalid", "skips this label", "NTSC(DF)"},
+        {"00:01:00;02", "invalid", "its separators are those of HD30 and not of NTSC", "NTSC"},
+        {"00.01:00.02", "invalid", "its separators are those of NTSC(DF) and not of PAL", "PAL"},
+        {"00,01:00.02", "invalid", "its separators are those of no system and not of PAL", "PAL"},
+        {"10:00:00:00 {25/1}Hz", "invalid", "its rate is that of PAL and not of NTSC", "NTSC"},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.text);
+        std::vector<std::string> arguments = {"tc", "check"};
+        if (row.system) arguments.insert(arguments.end(), {"--system", row.system});
+        arguments.insert(arguments.end(), {"--", row.text});
+        const Finished run = RunTool(arguments);
+        const bool valid = row.verdict == std::string("valid");
+        EXPECT_EQ(run.code, valid ? kFine : kBadInput);
+        EXPECT_TRUE(Contains(run.output, std::string(": ") + row.verdict + (valid ? ", " : ": "))) << run.output;
+        EXPECT_TRUE(Contains(run.output, row.words)) << run.output;
+        // The other commands answer with the same sentence.
+        arguments[1] = "show";
+        const Finished show = RunTool(arguments);
+        EXPECT_EQ(show.code, run.code);
+        EXPECT_EQ(show.output.empty(), !valid);
+        EXPECT_TRUE(valid || Contains(show.errors, row.words)) << show.errors;
+    }
+    EXPECT_EQ(RunTool({"tc", "check", "x", "10:00:00:00"}).code, kBadInput) << "the worst of all";
+    ExpectRun(RunTool({"tc", "check", "--json", "10:00:00:25"}), kBadInput,
+              "[\n{\"text\":\"10:00:00:25\",\"verdict\":\"invalid\",\"reason\":\"the frames are 25: PAL counts 00 to "
+              "24\"}\n]\n",
+              "");
+}
+
+TEST(ToolTimecode, Computes) {
+    const struct {
+        std::vector<std::string> arguments;
+        int code;
+        const char* output; // a line of it
+        const char* errors;
+    } rows[] = {
+        {{"convert", "10:00:00:00", "--to", "NTSC(DF)"}, kFine, "count             43200000\n", ""},
+        {{"convert", "10:00:00:00", "--to", "2", "--align"}, kFine, "fixed text         10.00:36.00\n", ""},
+        {{"convert", "10:00:00:00", "--to", "2", "--retime"}, kFine, "count             43156843\n", ""},
+        {{"convert", "24", "--from", "PAL", "--to", "FILM", "--align"}, kFine, "count             0\n", ""},
+        {{"convert", "25", "--from", "PAL", "--to", "FILM", "--align"}, kFine, "count             50\n", ""},
+        {{"convert", "00:00:01:00", "--to", "HDFILM(DF)"},
+         kFine,
+         "system            5 HDFILM(DF)\n",
+         "warning: no standard knows HDFILM(DF)"},
+        {{"convert", "00.00.01,00", "--to", "PAL"},
+         kFine,
+         "system            0 PAL\n",
+         "warning: no standard knows HDFILM(DF)"},
+        {{"convert", "1200", "--to", "PAL"}, kBadInput, "", "does not tell its system"},
+        {{"convert", "10:00:00:00", "--to", "30000/1001"}, kUsage, "", "30000/1001/D"},
+        {{"convert", "10:00:00:00", "--to", "2", "--align", "--retime"}, kUsage, "", "--retime"},
+        {{"convert", "10:00:00:00"}, kUsage, "", "--to"},
+        {{"convert", "9223372036854775807", "--from", "NTSC", "--to", "PAL", "--retime"}, kBadInput, "", "64 bits"},
+        {{"add", "10:00:00:00", "25frames"}, kFine, "fixed text         10:00:01:00\n", ""},
+        {{"add", "00.00:59.29", "1frames"}, kFine, "fixed text         00.01:00.02\n", ""},
+        {{"sub", "00.01:00.02", "1frames"}, kFine, "fixed text         00.00:59.29\n", ""},
+        {{"sub", "00:00:00:00", "00:00:01:00"}, kFine, "fixed text        -00:00:01:00\n", ""},
+        {{"add", "1.5s", "30frames", "--system", "HD30"}, kFine, "seconds           2.5\n", ""},
+        {{"add", "10:00:00:00", "00.00:01.00"}, kFine, "count             43201200\n", "last differently"},
+        {{"add", "10:00:00:00", "x"}, kBadInput, "", "\"x\" is unassigned: character 1"},
+        {{"add", "1", "1"}, kBadInput, "", "does not tell its system"},
+        {{"add", "9223372036854775807", "1", "--system", "0"}, kBadInput, "", "64 bits"},
+        {{"add", "10:00:00:00"}, kUsage, "", "B"},
+        {{"table", "00.00:59.29", "--frames", "1"},
+         kFine,
+         "    +0           71960   00.00:59.29  00:00:59:29 {30000/1001}Hz/D\n"
+         "    +1           72000   00.01:00.02  00:01:00:02 {30000/1001}Hz/D\n",
+         ""},
+        {{"table", "--system", "HDNTSC(DF)", "--frames", "1"},
+         kFine,
+         "    -1           71980   00.00.59.59  00:00:59:59 {60000/1001}Hz/D\n"
+         "    +0           72000   00.01.00.04  00:01:00:04 {60000/1001}Hz/D\n",
+         ""},
+        {{"table", "--system", "PAL", "--frames", "0", "--json"}, kFine, "\"count\":72000,", ""},
+        {{"table"}, kUsage, "", "--system"},
+        {{"table", "--system", "PAL", "--frames", "-1"}, kUsage, "", "--frames"},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(testing::PrintToString(row.arguments));
+        std::vector<std::string> arguments = {"tc"};
+        arguments.insert(arguments.end(), row.arguments.begin(), row.arguments.end());
+        const Finished run = RunTool(arguments);
+        EXPECT_EQ(run.code, row.code);
+        EXPECT_TRUE(row.code == kFine ? Contains(run.output, row.output) : run.output.empty()) << run.output;
+        EXPECT_TRUE(*row.errors ? Contains(run.errors, row.errors) : run.errors.empty()) << run.errors;
+    }
+}
+
+TEST(ToolRational, Approximates) {
+    const struct {
+        const char* number;
+        const char* largest;
+        int code;
+        const char* words; // the fraction, or part of the complaint
+    } rows[] = {
+        {"29.97002997", "2000", kFine, "30000/1001"},
+        {"29.97", "2000", kFine, "2997/100"},
+        {"3.141592653589793", "113", kFine, "355/113"},
+        {"3.141592653589793", "112", kFine, "333/106"},
+        {"-0.3333", "3", kFine, "-1/3"},
+        {"+2", "1", kFine, "2/1"},
+        {"1e3", "1", kFine, "1000/1"},
+        {"1073741823", "1", kFine, "1073741823/1"},
+        {"1073741825", "1", kBadInput, "magnitude goes to 1073741823"},
+        {"1e999", "1", kBadInput, "out of the range"},
+        {"nan", "1", kBadInput, "no finite number"},
+        {"inf", "1", kBadInput, "no finite number"},
+        {"1x", "1", kBadInput, "character 2"},
+        {"", "1", kBadInput, "character 1"},
+        {"1", "0", kUsage, "--max-den"},
+        {"1", "1073741824", kUsage, "--max-den"},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.number);
+        const Finished run = RunTool({"rational", "approx", "--max-den", row.largest, "--", row.number});
+        EXPECT_EQ(run.code, row.code);
+        if (row.code == kFine)
+            EXPECT_EQ(run.output.find(std::string("fraction          ") + row.words + '\n'), 0u) << run.output;
+        else
+            EXPECT_TRUE(run.output.empty() && Contains(run.errors, row.words)) << run.output << run.errors;
+    }
+    ExpectRun(RunTool({"rational", "approx", "0.5", "--max-den", "9", "--json"}), kFine,
+              "{\"fraction\":\"1/2\",\"numerator\":1,\"denominator\":2,\"value\":0.5,\"offBy\":0}\n", "");
+    EXPECT_EQ(RunTool({"rational", "approx", "1"}).code, kUsage);
+}
+
 TEST(ToolUsage, HasCodesOfItsOwn) {
     const struct {
         std::vector<std::string> arguments;

@@ -7,17 +7,29 @@
 
 namespace tool {
 
-void Facts::AddText(const char* key, const std::string& text) { m_facts.push_back({key, Quoted(text), text}); }
+namespace {
 
-void Facts::Add(const char* key, const std::string& json, const std::string& shown) {
-    m_facts.push_back({key, json, shown.empty() ? json : shown});
+// "fixed text" as "fixedText".
+std::string JsonKey(const std::string& label) {
+    std::string key;
+    for (std::size_t i = 0; i < label.size(); ++i)
+        if (label[i] != ' ') key += i > 0 && label[i - 1] == ' ' ? static_cast<char>(label[i] - ('a' - 'A')) : label[i];
+    return key;
+}
+
+} // namespace
+
+void Facts::AddText(const char* label, const std::string& text) { m_facts.push_back({label, Quoted(text), text}); }
+
+void Facts::Add(const char* label, const std::string& json, const std::string& shown) {
+    m_facts.push_back({label, json, shown.empty() ? json : shown});
 }
 
 std::string Facts::Lines() const {
     constexpr std::size_t kColumn = 18;
     std::string lines;
     for (const Fact& fact : m_facts) {
-        std::string label = fact.key;
+        std::string label = fact.label;
         label.resize(kColumn, ' ');
         lines += label + fact.shown + '\n';
     }
@@ -28,7 +40,7 @@ std::string Facts::Json() const {
     std::string text = "{";
     for (const Fact& fact : m_facts) {
         if (text.size() > 1) text += ',';
-        text += Quoted(fact.key) + ':' + fact.json;
+        text += Quoted(JsonKey(fact.label)) + ':' + fact.json;
     }
     return text + '}';
 }

@@ -7,20 +7,21 @@
 
 namespace tool {
 
+// Labels are words in lower case; their JSON keys are written "likeThis".
 class Facts {
 public:
-    void AddText(const char* key, const std::string& text);
+    void AddText(const char* label, const std::string& text);
     // A number, true, false, null or JSON text of its own; @p shown instead of it where people read, when not empty.
-    void Add(const char* key, const std::string& json, const std::string& shown = std::string());
-    void Add(const char* key, bool value) { Add(key, value ? "true" : "false", value ? "yes" : "no"); }
+    void Add(const char* label, const std::string& json, const std::string& shown = std::string());
+    void Add(const char* label, bool value) { Add(label, value ? "true" : "false", value ? "yes" : "no"); }
 
-    // One fact on each line, the keys in a column.
+    // One fact on each line, the labels in a column.
     std::string Lines() const;
     std::string Json() const;
 
 private:
     struct Fact {
-        const char* key;
+        const char* label;
         std::string json, shown;
     };
     std::vector<Fact> m_facts;

@@ -6,6 +6,7 @@
 #include "streams.h"
 
 #include <charconv>
+#include <cmath>
 #include <TAVO/math.h>
 
 namespace tool {
@@ -23,6 +24,10 @@ int RationalApprox(const RationalApproxOptions& options) {
     if (result.ec != std::errc() || result.ptr != end) {
         const auto good = result.ec == std::errc() ? result.ptr - text.data() : begin - text.data();
         Complain(Named(text) + " is no decimal number: it ends being one at character " + std::to_string(good + 1));
+        return kBadInput;
+    }
+    if (!std::isfinite(number)) {
+        Complain(Named(text) + " is no finite number");
         return kBadInput;
     }
     TAVO::Math::CRational fraction;

@@ -82,9 +82,9 @@ std::string SystemJsonRow(ulong32 system) {
     facts.Add("code", std::to_string(system));
     facts.AddText("name", NameOf(system));
     facts.AddText("rate", RateOf(system));
-    facts.Add("frame", std::to_string(timecode::GetFrameBU(system)));
-    facts.Add("field", std::to_string(timecode::GetFieldBU(system)));
-    facts.Add("second", Decimal(1200 * timecode::BULen(system)));
+    facts.Add("frame units", std::to_string(timecode::GetFrameBU(system)));
+    facts.Add("field units", std::to_string(timecode::GetFieldBU(system)));
+    facts.Add("unit seconds", Decimal(timecode::BULen(system)));
     facts.Add("drop", rule.frames == 0 ? "null"
                                        : "{\"frames\":" + std::to_string(rule.frames) +
                                              ",\"period\":" + std::to_string(rule.period) + '}');
