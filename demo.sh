@@ -1,5 +1,6 @@
 #!/bin/sh
-# Builds the tool and takes documents along the whole road: read, look, change, write, read back, measure.
+# Builds the tool and takes documents along the whole road: read, look, change, write, read back, measure. Then an edit
+# list of the sample, and timecode.
 set -eu
 LC_ALL=C
 export LC_ALL
@@ -10,7 +11,8 @@ usage() {
 Usage: ./demo.sh [--windows] [FILE...]
 
 Builds the command-line tool tavo (installing first what that takes) and shows what
-the library does with the sample timeline, or with the documents given.
+the library does with the sample timeline, or with the documents given, and with
+timecode.
 
   --windows   the same with TAVO.dll and tavo.exe, under Wine
   --help      this text
@@ -58,7 +60,7 @@ build() {
   quietly "$here/tools/setup" $setup
   cd "$here"
   [ -e "build/$preset/build.ninja" ] || quietly cmake --preset "$preset"
-  quietly cmake --build --preset "$preset" --target tavo
+  quietly cmake --build --preset "$preset" --target tavo --target example_edit_list
   cd "$from"
   say "build/$preset/bin/tavo$exe, linked with the shared library beside it"
   tavo about | indent
@@ -144,9 +146,25 @@ road() { # document
   tavo pool stat "$source" | indent
 }
 
+timecode() {
+  title "An edit list of the sample timeline's clips, and how long they last in each system"
+  say "event, source in and out, record in and out, clip; the separators tell the system"
+  LC_ALL=C.UTF-8 $run "$here/build/$preset/bin/example_edit_list$exe" "$here/examples/data/timeline.xml" > "$work/edits.txt" ||
+    { cat "$work/edits.txt" >&2; fail "the edit list does not add up"; }
+  head -n 5 "$work/edits.txt" | tr -d '\r' | indent
+  say "..."
+  tail -n 8 "$work/edits.txt" | tr -d '\r' | indent
+
+  title "Timecode: drop frame skips two labels where minute 1 begins"
+  tavo tc table --system 'NTSC(DF)' --frames 2 | indent
+  say "and one hour of that label is this in PAL, in real time:"
+  tavo tc convert 01.00:00.00 --to PAL --retime | indent
+}
+
 from=$(pwd)
 build
 [ $# -gt 0 ] || set -- "$here/examples/data/timeline.xml"
 count=$#
 for document in "$@"; do road "$document"; done
+timecode
 title "Done: $count $([ "$count" = 1 ] && echo document || echo documents), all as expected"

@@ -563,6 +563,8 @@ TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
         {"10:00:00 {25/1}Hz", "unassigned", "character 9 is \" \", where \":\" behind the seconds belongs"},
         {"10:00:00:00{25/1}Hz", "unassigned", "character 13 is \"2\", where \"{\" before the rate belongs"},
         {"10:00:00:00 {25-1}Hz", "unassigned", "character 16 is \"-\", where \"/\" within the rate belongs"},
+        {"10:00:00:00\xC3\xA9{25/1}Hz", "valid", "PAL, 43200000 base units"}, // any mark does
+        {"10:00:00:00\xC3\xA9{25\xC3\xA9", "unassigned", "character 16 is \"\xC3\xA9\", where \"/\" within"},
         {"{", "unassigned", "character 1 is \"{\", where a number, the hours, belongs"},
         {"99999999999:0:0:0 {25/1}Hz", "invalid", "the number of the hours does not fit 32 bits"},
         {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "unassigned", "47 characters at most, and this one 120"},

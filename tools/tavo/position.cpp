@@ -159,17 +159,24 @@ Reading ReadCount(std::string_view number, Unit unit, ulong32 system) {
 
 // --- texts -----------------------------------------------------------------------------------------------------------
 
-// The character at a place with nothing but ASCII before it, in quotes.
-std::string CharacterAt(std::string_view text, std::size_t at) {
-    std::size_t end = at + 1;
-    while (end < text.size() && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) ++end;
-    return Quoted(text.substr(at, end - at));
+bool IsContinuation(char c) { return (static_cast<unsigned char>(c) & 0xC0) == 0x80; }
+
+// Where the character at a place ends.
+std::size_t EndOfCharacter(std::string_view text, std::size_t at) {
+    do ++at;
+    while (at < text.size() && IsContinuation(text[at]));
+    return at;
 }
 
+// Places are told in characters, from 1.
 std::string WrongCharacter(std::string_view text, std::size_t at, const std::string& wanted) {
-    if (at >= text.size())
-        return "it ends after character " + std::to_string(text.size()) + ", where " + wanted + " belongs";
-    return "character " + std::to_string(at + 1) + " is " + CharacterAt(text, at) + ", where " + wanted + " belongs";
+    const auto before = text.substr(0, at);
+    const auto place =
+        before.size() - static_cast<std::size_t>(std::count_if(before.begin(), before.end(), IsContinuation));
+    const std::string where = ", where " + wanted + " belongs";
+    if (at >= text.size()) return "it ends after character " + std::to_string(place) + where;
+    return "character " + std::to_string(place + 1) + " is " + Quoted(text.substr(at, EndOfCharacter(text, at) - at)) +
+           where;
 }
 
 bool IsDashes(std::string_view text) {
@@ -253,7 +260,8 @@ public:
     }
     bool Any(char& c) {
         if (m_at >= m_text.size()) return Stop("a mark behind the frames");
-        c = m_text[m_at++];
+        c = m_text[m_at];
+        m_at = EndOfCharacter(m_text, m_at);
         return true;
     }
     bool Number(ulong32& value, const std::string& what) {
@@ -279,11 +287,12 @@ private:
     std::string m_reason;
 };
 
-// Why the library does not take a universal text; a last word for what its scanner does beyond the form.
-std::string WhyNoUniversalForm(const std::string& text, char& mark) {
+// Why the library did not take a universal text. It scans a little more than the form, so this is asked afterwards.
+std::string WhyNoUniversalForm(const std::string& text) {
     if (text.compare(0, 11, "--:--:--:--") == 0) return "dashes stand for a position that is not given";
     UniversalWalk walk(text);
     ulong32 field[4], n = 0, d = 0;
+    char mark = 0;
     for (std::size_t i = 0; i < 4; ++i) {
         if (!walk.Number(field[i], kFieldNames[i])) return walk.Reason();
         if (i < 3 && !walk.Literal(':', (std::string("behind the ") + kFieldNames[i]).c_str())) return walk.Reason();
@@ -305,19 +314,16 @@ std::string WhyNoUniversalForm(const std::string& text, char& mark) {
     return "the library does not read it";
 }
 
-Reading ReadUniversal(const std::string& text, ulong32 system) {
+Reading ReadUniversal(const std::string& text, const wchar_t* wide, ulong32 system) {
     SZUTC form;
-    char mark = 0;
-    std::string reason = WhyNoUniversalForm(text, mark);
-    if (text.size() >= std::size(form.text))
+    std::size_t length = 0;
+    while (wide[length]) ++length;
+    if (length >= std::size(form.text))
         return Flagged(kUnassigned, "a universal text has " + std::to_string(std::size(form.text) - 1) +
-                                        " characters at most, and this one " + Grouped(text.size()));
-    const bool isAscii =
-        std::all_of(text.begin(), text.end(), [](char c) { return static_cast<unsigned char>(c) < 0x80; });
-    if (!isAscii) return Flagged(kUnassigned, reason);
-    std::copy(text.begin(), text.end(), form.text);
+                                        " characters at most, and this one " + Grouped(length));
+    std::copy_n(wide, length + 1, form.text);
     const timecode value = form;
-    if (value.sys() >= kSystems) return Flagged(value.sys() & ~15u, reason);
+    if (value.sys() >= kSystems) return Flagged(value.GetFlags(), WhyNoUniversalForm(text));
     if (system != kAnySystem && value.sys() != system)
         return Flagged(kInvalid, "its rate is that of " + NameOf(value.sys()) + " and not of " + NameOf(system));
     return Position(value);
@@ -389,7 +395,7 @@ Reading ReadPosition(const std::string& text, ulong32 system) {
     if (text.empty()) return Flagged(kUnassigned, "it is empty");
     WideText wide;
     if (!ToWide(text, Pairs::Standard, wide)) return Flagged(kUnassigned, "it is no UTF-8");
-    if (text.find('{') != text.npos) return ReadUniversal(text, system);
+    if (text.find('{') != text.npos) return ReadUniversal(text, wide, system);
     std::string_view number;
     if (const Unit unit = SplitCount(text, number); unit != Unit::None) {
         if (system == kAnySystem)
