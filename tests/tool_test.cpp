@@ -565,6 +565,9 @@ TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
         {"10:00:00:00 {25-1}Hz", "unassigned", "character 16 is \"-\", where \"/\" within the rate belongs"},
         {"10:00:00:00\xC3\xA9{25/1}Hz", "valid", "PAL, 43200000 base units"}, // any mark does
         {"10:00:00:00\xC3\xA9{25\xC3\xA9", "unassigned", "character 16 is \"\xC3\xA9\", where \"/\" within"},
+        {" +10:\t00:00:00 {25/3}Hz", "unassigned", "the rate 25/3 is that of no system"}, // as the library scans
+        {" -10:00:00:30 {25/1}Hz", "invalid", "the frames are 30"},
+        {"10:-1:00:00 {25/1}Hz", "invalid", "the minutes are 4294967295"},
         {"{", "unassigned", "character 1 is \"{\", where a number, the hours, belongs"},
         {"99999999999:0:0:0 {25/1}Hz", "invalid", "the number of the hours does not fit 32 bits"},
         {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "unassigned", "47 characters at most, and this one 120"},

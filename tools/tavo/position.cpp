@@ -265,13 +265,19 @@ public:
         return true;
     }
     bool Number(ulong32& value, const std::string& what) {
+        constexpr std::string_view kBlanks = " \t\n\v\f\r";
+        while (m_at < m_text.size() && kBlanks.find(m_text[m_at]) != kBlanks.npos) ++m_at;
+        const bool negative = m_at < m_text.size() && m_text[m_at] == '-';
+        if (negative || (m_at < m_text.size() && m_text[m_at] == '+')) ++m_at;
         const std::size_t first = m_at;
         value = 0;
         for (; m_at < m_text.size() && IsDigit(m_text[m_at]); ++m_at) {
             if (value > (0xFFFFFFFFu - 9) / 10) return Fail("the number of the " + what + " does not fit 32 bits");
             value = value * 10 + static_cast<ulong32>(m_text[m_at] - '0');
         }
-        return m_at > first || Stop("a number, the " + what + ",");
+        if (m_at == first) return Stop("a number, the " + what + ",");
+        if (negative) value = 0 - value;
+        return true;
     }
     const std::string& Reason() const { return m_reason; }
 
@@ -287,7 +293,7 @@ private:
     std::string m_reason;
 };
 
-// Why the library did not take a universal text. It scans a little more than the form, so this is asked afterwards.
+// Why the library did not take a universal text. It scans more than the form, so this is asked afterwards.
 std::string WhyNoUniversalForm(const std::string& text) {
     if (text.compare(0, 11, "--:--:--:--") == 0) return "dashes stand for a position that is not given";
     UniversalWalk walk(text);
