@@ -1,10 +1,13 @@
 // Interning against a slow reading of its rules: keys, identity, cut texts, case groups, sweeps, submitters.
 
+#include "plugin/pool.h"
 #include "support/assertions.h"
 #include "support/guardpage.h"
 #include "support/heapwatch.h"
+#include "support/machine.h"
 #include "support/texts.h"
 
+#include <algorithm>
 #include <atomic>
 #include <gtest/gtest.h>
 #include <optional>
@@ -270,6 +273,57 @@ TEST(PoolTenUnits, ManyTwinsInOneBucketStayApart) {
     Sweep(2);
     for (const auto& twin : twins) EXPECT_EQ(Entry(CStringPool::QueryStringRef(Entry(twin))), Entry(twin));
     EXPECT_TRUE(CStringPool::Verify());
+}
+
+// Letters that can be capitals without a trace in the checksum: among 74 there are always such.
+Wide CapitalsThatCancelOut() {
+    Wide text(74, L'q');
+    const auto crc = [](const Wide& units) {
+        return Checksum(std::vector<unsigned>(units.begin(), units.end()), false);
+    };
+    const auto lower = crc(text);
+    struct Row {
+        unsigned long long change;
+        std::vector<std::size_t> letters;
+    };
+    std::vector<Row> rows; // reduced: each row's highest bit is in no later row
+    for (std::size_t i = text.size(); i-- > 0;) {
+        text[i] = L'Q';
+        Row row{crc(text) ^ lower, {i}};
+        text[i] = L'q';
+        for (const Row& other : rows) {
+            if ((row.change ^ other.change) >= row.change) continue;
+            row.change ^= other.change;
+            row.letters.insert(row.letters.end(), other.letters.begin(), other.letters.end());
+        }
+        if (row.change) {
+            rows.push_back(row);
+            std::sort(rows.begin(), rows.end(), [](const Row& a, const Row& b) { return a.change > b.change; });
+        } else if (i < 10) {
+            for (const std::size_t letter : row.letters) text[letter] ^= 0x20; // twice is not at all
+            return text;
+        }
+    }
+    return {};
+}
+
+TEST(PoolTenUnits, CapitalsThatCancelOutKeepTheirGroup) {
+    Wide crafted = CapitalsThatCancelOut(), lowerCase(74, L'q');
+    const wchar_t* const variants[] = {Terminated(lowerCase), Terminated(crafted)};
+    for (const int first : {0, 1}) {
+        CPPoolString one(variants[first]);
+        EXPECT_EQ(Entry(CStringPool::QueryStringRefi(variants[!first])), Entry(one));
+        CPPoolString two(variants[!first]);
+        ASSERT_EQ(one.sHash(), two.sHash());
+        ASSERT_NE(Entry(one), Entry(two));
+        for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(one));
+        one.free();
+        Sweep(2);
+        for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(two));
+        two.free();
+        Sweep(2);
+        EXPECT_TRUE(CStringPool::QueryStringRefi(variants[0]).isnull());
+    }
 }
 
 // --- the public names ------------------------------------------------------------------------------------------------
@@ -557,6 +611,25 @@ struct HostStatic {
 TEST(Pool, ServesStaticConstructors) {
     EXPECT_STREQ(g_static.entry, L"made by a static constructor");
     EXPECT_EQ(Entry(CPPoolString(L"made by a static constructor")), g_static.entry);
+}
+
+TEST(Pool, ServesStaticObjectsOfAPlugin) {
+    CPPoolString mine;
+    const wchar_t* late = nullptr;
+    {
+        const support::Plugin plugin("TAVOTestPlugin");
+        const auto held = plugin.Find<plugin::HeldEntry>(plugin::kHeldEntry);
+        ASSERT_NE(held, nullptr);
+        mine = plugin::kHeldText;
+        EXPECT_EQ(held(&late), Entry(mine));
+        Sweep(2);
+        EXPECT_EQ(held(&late), Entry(CPPoolString(plugin::kHeldText)));
+    }
+    EXPECT_EQ(Entry(CStringPool::QueryStringRef(plugin::kLateText)), late) << "its destructor ran, and interned";
+    EXPECT_STREQ(Entry(mine), plugin::kHeldText);
+    mine.free();
+    Sweep(2);
+    EXPECT_TRUE(CStringPool::QueryStringRef(plugin::kHeldText).isnull()) << "nobody holds it any more";
 }
 
 } // namespace

@@ -425,7 +425,7 @@ TEST(ToolUsage, HasCodesOfItsOwn) {
 
 // Long enough for a progress line on a terminal; but this is none.
 TEST(ToolProgress, StaysOutOfFiles) {
-    const Finished run = RunTool({"xml", "stat", "--repeat", "4000", kTimeline});
+    const Finished run = RunTool({"xml", "stat", "--repeat", support::RepeatsFor(1000, kTimeline), kTimeline});
     EXPECT_EQ(run.code, kFine);
     EXPECT_EQ(run.errors, "");
     EXPECT_FALSE(Contains(run.output, "\x1b"));

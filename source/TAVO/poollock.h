@@ -1,11 +1,11 @@
 #pragma once
-// The pool's lock: re-entrant, one atomic exchange to take it and none to leave it, a Boost mutex and condition for those
-// who wait.
+// The pool's lock: re-entrant, one atomic exchange to take it and none to leave it, a Boost mutex and condition for
+// those who wait.
 //
-// Leaving is a plain store, then a look whether anybody sleeps. Between the two the processor may take the look first, and
-// a sleeper that arrives just then would be missed; so whoever is about to sleep says so and then makes all processors
-// pass a barrier. After that, either the holder sees the sleeper or the sleeper sees the lock free. Where the system
-// offers no such barrier, leaving pays for one.
+// Leaving is a plain store, then a look whether anybody sleeps. Between the two the processor may take the look first,
+// and a sleeper that arrives just then would be missed; so whoever is about to sleep says so and then makes all
+// processors pass a barrier. After that, either the holder sees the sleeper or the sleeper sees the lock free. Where
+// the system offers no such barrier, leaving pays for one.
 
 #include "platform/platform.h"
 #include "simd.h"
@@ -37,11 +37,7 @@ public:
         if (--m_depth) return;
         m_owner.store(0, std::memory_order_relaxed);
         m_taken.store(false, std::memory_order_release);
-        if (m_sleepersFlush)
-            std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
-        else
-            std::atomic_thread_fence(std::memory_order_seq_cst);
-        if (TAVO_UNLIKELY(m_sleepers.load(std::memory_order_relaxed) != 0)) WakeOne();
+        if (TAVO_UNLIKELY(HasSleepers())) WakeOne();
     }
 
 private:
@@ -55,6 +51,13 @@ private:
     void Own(std::uint32_t self) noexcept {
         m_owner.store(self, std::memory_order_relaxed);
         m_depth = 1;
+    }
+
+    // Whether somebody sleeps who may not have seen the lock free; looks after the store that freed it.
+    bool HasSleepers() noexcept {
+        if (!m_sleepersFlush) return m_sleepers.fetch_add(0) != 0; // a barrier, and one that thread checkers understand
+        std::atomic_signal_fence(std::memory_order_seq_cst);       // the compiler keeps the order
+        return m_sleepers.load(std::memory_order_relaxed) != 0;
     }
 
     TAVO_NOINLINE void Wait() noexcept;

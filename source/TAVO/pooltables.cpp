@@ -37,6 +37,15 @@ constexpr Buffers::tagCPOVTABL kGroupTable = {CreateNothing, nullptr, FinalizeGr
 bool IsRecord(const CPObjectMemory& item) { return Block::Of(item)->pVTbl == &kGroupTable; }
 Group& GroupOf(const CPObjectMemory& record) { return *Block::PayloadOf<Group>(record); }
 
+// Whether a text is its own lower case, as far as tables look. Texts can be made whose capitals cancel out in the hash,
+// so the units that are compared are asked too.
+bool IsCaseless(const StoredText& text) {
+    if (text.key.hash != text.key.hashi) return false;
+    for (std::size_t i = 0; i < pool::kComparedUnits && text.text[i]; ++i)
+        if (detail::FoldUnit(text.text[i]) != text.text[i]) return false;
+    return true;
+}
+
 // Lets go of an item that may be an uncounted entry.
 void LetGo(CPObjectMemory&& item) {
     if (!IsRecord(item)) Block::RefOf(item) = nullptr;
@@ -102,7 +111,7 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
         CPObjectMemory& item = TableAccess::Item(*this, place);
         return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
     }
-    if (IsCaseless(text.key)) return true; // alone, and found by its own hash
+    if (IsCaseless(text)) return true; // alone, and found by its own hash
     CPObjectMemory item;
     if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
         if (!MakeRecord(item, lower, entry)) return false;
@@ -117,7 +126,7 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
 bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
     const StoredText text(EntryOf(entry));
     const Place place = LocateGroup(text);
-    if (!place.found) return IsCaseless(text.key);
+    if (!place.found) return IsCaseless(text);
     CPObjectMemory& item = TableAccess::Item(*this, place);
     if (!IsRecord(item)) {
         if (Block::Of(item) != entry) return false;

@@ -7,9 +7,6 @@
 
 namespace TAVO::String {
 
-// A text whose key has no capital letter: it is its own lower case.
-inline bool IsCaseless(const pool::Key& key) { return key.hash == key.hashi; }
-
 // Entries by case-sensitive hash; one reference each.
 class CCaseSensitiveHash final : public Lookup::CBaseHashTable {
 public:

@@ -32,7 +32,11 @@ template <class Unit> struct PlainText {
     const Unit* text;
     std::size_t units;
 
-    int Compare(const wchar_t* stored) const { return CompareFirstUnits<false>(text, units, stored); }
+    int Compare(const wchar_t* stored) const {
+        // Nearly every entry that is asked for is the one.
+        if (units >= kComparedUnits && SameFirstUnits(stored)) return 0;
+        return CompareFirstUnits<false>(text, units, stored);
+    }
     int CompareFolded(const wchar_t* stored) const { return CompareFirstUnits<true>(text, units, stored); }
     std::size_t Units() const { return units; }
     bool Write(wchar_t* out) const {
@@ -49,7 +53,22 @@ template <class Unit> struct PlainText {
         }
         return true;
     }
+
+private:
+    bool SameFirstUnits(const wchar_t* stored) const;
 };
+template <class Unit> bool PlainText<Unit>::SameFirstUnits(const wchar_t* stored) const {
+    // Two runs of eight that overlap. An entry of the same length has as many units.
+    static_assert(kComparedUnits == 10);
+    using namespace Simd;
+    const auto eight = [this](std::size_t from) {
+        if constexpr (sizeof(Unit) == sizeof(wchar_t)) return Load(text + from);
+        std::uint64_t bytes;
+        std::memcpy(&bytes, text + from, 8);
+        return WidenLow(Pair(bytes, 0));
+    };
+    return Mask(And(Equal16(eight(0), Load(stored)), Equal16(eight(2), Load(stored + 2)))) == 0xFFFF;
+}
 using WideText = PlainText<wchar_t>;
 using AsciiText = PlainText<unsigned char>;
 

@@ -209,6 +209,12 @@ inline Block Widen32Low(Block a) {
     for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 4, a.b + i * 2, 2);
     return x;
 }
+inline Block Pair(std::uint64_t low, std::uint64_t high) {
+    Block x;
+    std::memcpy(x.b, &low, 8);
+    std::memcpy(x.b + 8, &high, 8);
+    return x;
+}
 inline bool HasShuffle() { return true; }
 inline Block Shuffle(Block a, Block index) {
     Block x;

@@ -19,7 +19,7 @@ std::string ToolPath() {
 }
 
 // What a run shows on a terminal that is its standard error.
-std::string ErrorsOnTerminal(const std::string& document, const char* repeat) {
+std::string ErrorsOnTerminal(const std::string& document, const std::string& repeat) {
     const int terminal = posix_openpt(O_RDWR | O_NOCTTY);
     if (terminal < 0 || grantpt(terminal) != 0 || unlockpt(terminal) != 0) return "(no terminal)";
     const int side = open(ptsname(terminal), O_RDWR | O_NOCTTY);
@@ -28,7 +28,7 @@ std::string ErrorsOnTerminal(const std::string& document, const char* repeat) {
     if (child == 0) {
         dup2(side, STDERR_FILENO);
         dup2(open("/dev/null", O_WRONLY), STDOUT_FILENO);
-        execl(tool.c_str(), "tavo", "xml", "stat", "--repeat", repeat, document.c_str(), nullptr);
+        execl(tool.c_str(), "tavo", "xml", "stat", "--repeat", repeat.c_str(), document.c_str(), nullptr);
         _exit(127);
     }
     std::string text;
@@ -54,9 +54,10 @@ std::string ErrorsOnTerminal(const std::string& document, const char* repeat) {
 
 TEST(ToolProgress, ShowsOnATerminalAndGoesAway) {
     const std::string document = TAVO_TEST_DATA "/timeline.xml";
-    const std::string text = ErrorsOnTerminal(document, "4000");
+    const std::string repeats = support::RepeatsFor(1500, document);
+    const std::string text = ErrorsOnTerminal(document, repeats);
     EXPECT_NE(text.find("timing "), text.npos) << text;
-    EXPECT_NE(text.find(" of 4000: " + document), text.npos) << text;
+    EXPECT_NE(text.find(" of " + repeats + ": " + document), text.npos) << text;
     EXPECT_EQ(text.rfind("\r\x1b[K"), text.size() - 4) << "the line was taken away";
     EXPECT_EQ(text.find('\n'), text.npos) << "and was one line all the time";
 }

@@ -1,0 +1,197 @@
+// Timecode records: every label of a day against a naive clock, bounds of fields, counts at the ends of the range.
+
+#include <algorithm>
+#include <climits>
+#include <gtest/gtest.h>
+#include <TAVO/timecode.h>
+#include <tuple>
+#include <vector>
+
+using namespace TAVO;
+using namespace TAVO::TimeCode;
+
+namespace {
+
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr long long kEvery = 251; // sanitizers get a slice
+#else
+constexpr long long kEvery = 1;
+#endif
+
+// What a broadcaster's table says, independent of the library's.
+struct Facts {
+    const char* name;
+    ulong32 sys, evenFrames, oddFrames;
+    long long frame;
+    ulong32 skipped, block; // labels skipped at a minute's start, except every block-th minute
+    long long framesPerDay;
+};
+const Facts kFacts[] = {
+    {"PAL", 0, 25, 25, 48, 0, 1, 2160000},        {"NTSC", 1, 30, 30, 40, 0, 1, 2592000},
+    {"NTSC_DF", 2, 30, 30, 40, 2, 10, 2589408},   {"FILM", 3, 24, 24, 50, 0, 1, 2073600},
+    {"HDFILM", 4, 24, 24, 50, 0, 1, 2073600},     {"HDFILM_DF", 5, 24, 24, 50, 2, 4, 2071440},
+    {"HD50", 6, 50, 50, 24, 0, 1, 4320000},       {"HDNTSC", 7, 60, 60, 20, 0, 1, 5184000},
+    {"HDNTSC_DF", 8, 60, 60, 20, 4, 10, 5178816}, {"PAL_PX", 9, 13, 12, 96, 0, 1, 1080000},
+    {"NTSC_PX", 10, 15, 15, 80, 0, 1, 1296000},   {"FILM_PX", 11, 12, 12, 100, 0, 1, 1036800},
+    {"HD30", 12, 30, 30, 40, 0, 1, 2592000},      {"HD60", 13, 60, 60, 20, 0, 1, 5184000},
+};
+
+// Counts labels one by one, and skips those that do not exist one by one.
+struct Clock {
+    const Facts& facts;
+    ulong32 hh = 0, mm = 0, ss = 0, ff = 0;
+
+    bool IsSkipped() const { return ss == 0 && mm % facts.block != 0 && ff < facts.skipped; }
+    void Tick() {
+        if (++ff < (ss % 2 ? facts.oddFrames : facts.evenFrames)) return;
+        ff = 0;
+        if (++ss < 60) return;
+        ss = 0;
+        if (++mm < 60) return;
+        mm = 0;
+        ++hh;
+    }
+};
+
+auto FieldsOf(const TCINFO& r) { return std::make_tuple(r.dd(), r.hh(), r.mm(), r.ss(), r.ff(), r.sys()); }
+
+class EveryFrame : public testing::TestWithParam<Facts> {};
+
+} // namespace
+
+// The clock never shows a label twice, so agreeing with it at every frame means that each frame has its own label and
+// that the label exists.
+TEST_P(EveryFrame, HasItsLabelBothWaysAndInText) {
+    const Facts& facts = GetParam();
+    Clock clock{facts};
+    long long index = 0;
+    for (; clock.hh < 24; clock.Tick()) {
+        if (clock.IsSkipped()) {
+            ASSERT_EQ(TCINFO(long32(clock.hh), clock.mm, clock.ss, clock.ff, facts.sys).sys(), facts.sys | kInvalid);
+            continue;
+        }
+        const long long count = index++ * facts.frame;
+        if (index % kEvery != 0) continue;
+
+        const auto label = [&](long long dd) {
+            return std::make_tuple(dd, clock.hh, clock.mm, clock.ss, clock.ff, facts.sys);
+        };
+        const TCINFO forward(count, facts.sys), backward(-count, facts.sys);
+        const timecode value(count, facts.sys);
+        bool ok = FieldsOf(forward) == label(0) && (count == 0 || FieldsOf(backward) == label(-1));
+        ok = ok && static_cast<long long>(forward) == count && static_cast<long long>(backward) == -count;
+        ok = ok && FieldsOf(TCINFO(long32(clock.hh), clock.mm, clock.ss, clock.ff, facts.sys)) == label(0);
+        ok =
+            ok && FieldsOf(TCINFO(SZTC(forward))) == label(0) && FieldsOf(TCINFO(SZTC(backward))) == FieldsOf(backward);
+        // "PAL(PX)" exchanges itself with "/D", which it has no system for.
+        const timecode exchanged = SZUTC(value);
+        ok = ok && (facts.sys == eSystemPALPX ? !exchanged.IsAssigned() : exchanged == value);
+        ASSERT_TRUE(ok) << facts.name << " frame " << index - 1;
+    }
+    EXPECT_EQ(index, facts.framesPerDay);
+    EXPECT_EQ(TCINFO(index * facts.frame, facts.sys).dd(), 1) << "the next day begins";
+}
+INSTANTIATE_TEST_SUITE_P(Systems, EveryFrame, testing::ValuesIn(kFacts),
+                         [](const auto& info) { return info.param.name; });
+
+TEST(TimecodeRecord, BoundsOfFields) {
+    struct Row {
+        const char* name;
+        long32 hh;
+        ulong32 mm, ss, ff, sys, resulting;
+    };
+    const Row rows[] = {
+        {"largest hours", 743, 59, 59, 24, 0, 0},
+        {"hours too large", 744, 0, 0, 0, 0, 0x10000},
+        {"most negative hours", -743, 0, 0, 0, 0, 0},
+        {"hours too negative", -744, 0, 0, 0, 0, 0x10000},
+        {"hours at the end of the range", INT_MIN, 0, 0, 0, 0, 0x10000},
+        {"sixty minutes", 1, 60, 0, 0, 3, 0x10003},
+        {"sixty seconds", 1, 0, 60, 0, 0, 0x10000},
+        {"huge frames", 0, 0, 0, UINT_MAX, 13, 0x1000D},
+        {"first skipped label", 0, 1, 0, 0, 2, 0x10002},
+        {"last skipped label", 0, 1, 0, 1, 2, 0x10002},
+        {"first label of a minute", 0, 1, 0, 2, 2, 2},
+        {"tenth minute keeps its labels", 0, 10, 0, 0, 2, 2},
+        {"last skipped label of film", 0, 3, 0, 1, 5, 0x10005},
+        {"fourth minute keeps its labels", 0, 4, 0, 0, 5, 5},
+        {"last skipped label at double rate", 0, 1, 0, 3, 8, 0x10008},
+        {"first label at double rate", 0, 1, 0, 4, 8, 8},
+        {"thirteenth frame of an even second", 0, 0, 0, 12, 9, 9},
+        {"thirteenth frame of an odd second", 0, 0, 1, 12, 9, 0x10009},
+        {"no such system", 0, 0, 0, 0, 14, 0x20000},
+        {"no such system, with a flag", 0, 0, 0, 0, 0x1000F, 0x30000},
+        {"invalid beats the fields", 999, 0, 0, 0, 0x10003, 0x10003},
+        {"unassigned beats the fields", 999, 0, 0, 0, 0x20003, 0x20003},
+    };
+    for (const Row& row : rows) {
+        const TCINFO record(row.hh, row.mm, row.ss, row.ff, row.sys);
+        EXPECT_EQ(record.sys(), row.resulting) << row.name;
+        if (record.IsDefined()) continue;
+        EXPECT_EQ(FieldsOf(record), FieldsOf(TCINFO(0LL, row.resulting))) << row.name;
+        EXPECT_EQ(static_cast<long long>(record), 0) << row.name;
+        EXPECT_FALSE(record.GetInfo(nullptr, nullptr, nullptr, nullptr, nullptr, nullptr)) << row.name;
+    }
+    for (const Facts& facts : kFacts) {
+        EXPECT_TRUE(TCINFO(long32(0), 0, 0, facts.evenFrames - 1, facts.sys).IsDefined()) << facts.name;
+        EXPECT_FALSE(TCINFO(long32(0), 0, 0, facts.evenFrames, facts.sys).IsDefined()) << facts.name;
+    }
+}
+
+TEST(TimecodeRecord, CountsWithDaysAndSigns) {
+    using Row = std::tuple<const char*, long long, ulong32, long long, ulong32, ulong32, ulong32, ulong32>;
+    const Row rows[] = {
+        {"last frame before a skip", 71960, 2, 0, 0, 0, 59, 29},
+        {"first frame after it", 72000, 2, 0, 0, 1, 0, 2},
+        {"minus one unit", -1, 0, -1, 0, 0, 0, 0},
+        {"minus a day", -103680000, 0, -2, 0, 0, 0, 0},
+        {"a day and an hour", 108000000, 0, 1, 1, 0, 0, 0},
+        {"a film day", 103572000, 5, 1, 0, 0, 0, 0},
+        {"between two frames of half rate", 1, 8, 0, 0, 0, 0, 1},
+    };
+    for (const auto& [name, count, sys, dd, hh, mm, ss, ff] : rows)
+        EXPECT_EQ(FieldsOf(TCINFO(count, sys)), std::make_tuple(dd, hh, mm, ss, ff, sys)) << name;
+
+    EXPECT_EQ(static_cast<long long>(TCINFO(-1LL, 0)), 0);
+    EXPECT_EQ(TCINFO(-103680001LL, 0).Clip().dd(), -1);
+    EXPECT_EQ(static_cast<long long>(TCINFO(long32(0), 0, 0, 12, 9)), 1152);
+    EXPECT_EQ(static_cast<long long>(TCINFO(long32(0), 0, 1, 0, 9)), 1248);
+
+    ulong32 hh, mm, ss, ff, sys;
+    int sign;
+    ASSERT_TRUE(TCINFO(-2 * 103680000LL - 4320000 - 48, 0).GetInfo(&hh, &mm, &ss, &ff, &sign, &sys));
+    EXPECT_EQ(std::make_tuple(hh, mm, ss, ff, sign, sys), std::make_tuple(49u, 0u, 0u, 1u, -1, 0u));
+}
+
+// A position anywhere is at most one frame away from the frame it shows, at the ends of the range too.
+TEST(TimecodeRecord, AnyCountComesBackWithinAFrame) {
+    std::vector<long long> counts = {LLONG_MIN, LLONG_MIN + 1, LLONG_MIN / 2, LLONG_MAX / 2, LLONG_MAX - 200};
+    for (long long edge : {0LL, 71920LL, 71928LL, 719280LL, 71900LL, 71925LL, 103576320LL, 103572000LL, 103680000LL})
+        for (long long step = -101; step <= 101; ++step) counts.insert(counts.end(), {edge + step, -edge + step});
+    for (const Facts& facts : kFacts)
+        for (long long count : counts) {
+            const long long back = TCINFO(count, facts.sys);
+            // modulo 2^64: a label may be the frame just beyond the end of the range
+            const auto apart = static_cast<unsigned long long>(back) - static_cast<unsigned long long>(count);
+            EXPECT_LE(std::min(apart, 0 - apart), 2u * facts.frame) << facts.name << " " << count;
+        }
+}
+
+TEST(TimecodeRecord, FieldsOfNegativePositionsIntended) {
+    EXPECT_EQ(static_cast<long32>(TCINFO(48LL, 0)), 2);
+    // (2^64 - 48) / 24, its low 32 bits
+    EXPECT_EQ(static_cast<ulong32>(static_cast<long32>(TCINFO(-48LL, 0))), 0xAAAAAAA8u);
+}
+
+TEST(TimecodeRecord, FieldBoundsOfEverySystem) {
+    const long32 bounds[] = {89478485,  107374182, 107374182, 85899345, 85899345, 85899345,  178956970,
+                             214748364, 214748364, 44739242,  53687091, 42949672, 107374182, 214748364};
+    for (ulong32 sys = 0; sys < 14; ++sys)
+        for (int sign : {1, -1}) {
+            EXPECT_EQ(TCINFO(long32(sign * bounds[sys]), sys).sys(), sys);
+            EXPECT_EQ(TCINFO(long32(sign * (bounds[sys] + 1)), sys).sys(), kInvalid);
+            EXPECT_EQ(timecode(long32(sign * (bounds[sys] + 1)), sys).sys(), kInvalid);
+        }
+    EXPECT_EQ(TCINFO(long32(INT_MIN), 0).sys(), kInvalid);
+    EXPECT_EQ(TCINFO(long32(INT_MAX), kUnassigned | 3).sys(), kUnassigned | 3);
+}
