@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <atomic>
 #include <cstring>
 #include <gtest/gtest.h>
 #include <numeric>
@@ -18,7 +19,7 @@ namespace {
 
 constexpr std::size_t kHuge = ~std::size_t{0};
 
-// What a payload type was asked to do.
+// What a payload type was asked to do, by whichever thread.
 struct Calls {
     int cloned = 0, finalized = 0;
     std::size_t finalizedBytes = 0;
@@ -27,13 +28,13 @@ Calls g_calls;
 
 void CreateNothing(void*, std::size_t) {}
 void CloneCounted(void* target, const void* source, std::size_t bytes) {
-    ++g_calls.cloned;
+    ++std::atomic_ref(g_calls.cloned);
     std::memcpy(target, source, bytes);
 }
 void CloneThrowing(void*, const void*, std::size_t) { throw 1; }
 void FinalizeCounted(void*, std::size_t bytes) {
-    ++g_calls.finalized;
-    g_calls.finalizedBytes = bytes;
+    ++std::atomic_ref(g_calls.finalized);
+    std::atomic_ref(g_calls.finalizedBytes) = bytes;
 }
 void FinalizeThrowing(void* payload, std::size_t bytes) {
     FinalizeCounted(payload, bytes);
