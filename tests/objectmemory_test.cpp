@@ -19,7 +19,7 @@ namespace {
 
 constexpr std::size_t kHuge = ~std::size_t{0};
 
-// What a payload type was asked to do, by whichever thread.
+// What a payload type was asked to do.
 struct Calls {
     std::atomic<int> cloned{0}, finalized{0};
     std::atomic<std::size_t> finalizedBytes{0};
@@ -28,13 +28,13 @@ Calls g_calls;
 
 void CreateNothing(void*, std::size_t) {}
 void CloneCounted(void* target, const void* source, std::size_t bytes) {
-    ++std::atomic_ref(g_calls.cloned);
+    ++g_calls.cloned;
     std::memcpy(target, source, bytes);
 }
 void CloneThrowing(void*, const void*, std::size_t) { throw 1; }
 void FinalizeCounted(void*, std::size_t bytes) {
-    ++std::atomic_ref(g_calls.finalized);
-    std::atomic_ref(g_calls.finalizedBytes) = bytes;
+    ++g_calls.finalized;
+    g_calls.finalizedBytes = bytes;
 }
 void FinalizeThrowing(void* payload, std::size_t bytes) {
     FinalizeCounted(payload, bytes);
