@@ -76,7 +76,7 @@ step() {
 explain() { # <stage> <log>
   case $1 in
     test)
-      grep -E -A6 '^[0-9]+: .*(: Failure$|ERROR: |WARNING: ThreadSanitizer|runtime error: |CMake Error)' "$2" | head -n 60
+      grep -E -A6 '^[0-9]+: .*(: Failure$|ERROR: |WARNING: ThreadSanitizer|runtime error: | error: |CMake Error)' "$2" | head -n 60
       grep -E '^[0-9]+: \[  FAILED  \] [^0-9]|^ *[0-9]+/[0-9]+ Test .*(\*\*\*|Exception)' "$2"
       ;;
     build) grep -E -A3 '^FAILED|error: |undefined reference' "$2" | grep -v '^: && \|^/usr/bin/ccache ' | cut -c1-300 | head -n 40 ;;
