@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <atomic>
 #include <cstring>
 #include <gtest/gtest.h>
 #include <numeric>
@@ -20,8 +21,8 @@ constexpr std::size_t kHuge = ~std::size_t{0};
 
 // What a payload type was asked to do.
 struct Calls {
-    int cloned = 0, finalized = 0;
-    std::size_t finalizedBytes = 0;
+    std::atomic<int> cloned{0}, finalized{0};
+    std::atomic<std::size_t> finalizedBytes{0};
 };
 Calls g_calls;
 
@@ -78,7 +79,7 @@ constexpr ConstantBlock kVeryStatic{{-7, 16, 8, &kCounted}, "static payload."};
 
 class ObjectMemory : public testing::Test {
 protected:
-    void SetUp() override { g_calls = {}; }
+    void SetUp() override { g_calls.cloned = g_calls.finalized = 0; }
     support::Assertions m_assertions;
 };
 

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <bitset>
 #include <gtest/gtest.h>
 #include <optional>
 #include <string>
@@ -284,23 +285,25 @@ Wide CapitalsThatCancelOut() {
     const auto lower = crc(text);
     struct Row {
         unsigned long long change;
-        std::vector<std::size_t> letters;
+        std::bitset<74> letters;
     };
     std::vector<Row> rows; // reduced: each row's highest bit is in no later row
     for (std::size_t i = text.size(); i-- > 0;) {
         text[i] = L'Q';
-        Row row{crc(text) ^ lower, {i}};
+        Row row{crc(text) ^ lower, {}};
+        row.letters.set(i);
         text[i] = L'q';
         for (const Row& other : rows) {
             if ((row.change ^ other.change) >= row.change) continue;
             row.change ^= other.change;
-            row.letters.insert(row.letters.end(), other.letters.begin(), other.letters.end());
+            row.letters ^= other.letters;
         }
         if (row.change) {
             rows.push_back(row);
             std::sort(rows.begin(), rows.end(), [](const Row& a, const Row& b) { return a.change > b.change; });
         } else if (i < 10) {
-            for (const std::size_t letter : row.letters) text[letter] ^= 0x20; // twice is not at all
+            for (std::size_t letter = 0; letter < text.size(); ++letter)
+                if (row.letters[letter]) text[letter] = L'Q';
             return text;
         }
     }

@@ -129,7 +129,8 @@ TEST(Timecode, AddingAndSubtracting) {
     EXPECT_EQ(Of(++t), (Whole{200, 3}));
     EXPECT_EQ(Of(--t), (Whole{150, 3}));
     EXPECT_EQ(Of(t--), (Whole{150, 3}));
-    t -= t;
+    const timecode& same = t;
+    t -= same;
     EXPECT_EQ(Of(t), (Whole{0, 3}));
     timecode end(LLONG_MAX, 3);
     EXPECT_EQ(Of(++end), (Whole{LLONG_MIN + 49, kInvalid | 3}));

@@ -436,7 +436,8 @@ TEST(XmlTree, FailingAllocationsLeaveElementsUsable) {
             const bool added = bool(element.Add(leaf));
             ASSERT_EQ(CountOf(element), before + added);
         }
-        ASSERT_EQ(element.GetNAttributes(), element.AddAttribute(kName, kValue) ? 1u : 0u);
+        const bool named = element.AddAttribute(kName, kValue);
+        ASSERT_EQ(element.GetNAttributes(), named ? 1u : 0u);
         // Setting an attribute anew takes no memory.
         ASSERT_EQ(element.HasAttribute(kName), element.HasAttribute(kName) && element.SetAttribute(kName, kValue));
         const std::size_t count = CountOf(element);
