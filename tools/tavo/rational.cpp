@@ -23,7 +23,7 @@ int RationalApprox(const RationalApproxOptions& options) {
     }
     if (result.ec != std::errc() || result.ptr != end) {
         const auto good = result.ec == std::errc() ? result.ptr - text.data() : begin - text.data();
-        Complain(Named(text) + " is no decimal number: it ends being one at character " + std::to_string(good + 1));
+        Complain(Named(text) + " is no decimal number: it goes wrong at character " + std::to_string(good + 1));
         return kBadInput;
     }
     if (!std::isfinite(number)) {
