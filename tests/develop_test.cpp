@@ -4,6 +4,7 @@
 
 #include <chrono>
 #include <gtest/gtest.h>
+#include <regex>
 #include <stdexcept>
 #include <string>
 #include <TAVO/develop.h>
@@ -15,21 +16,14 @@ using namespace TAVO::Develop;
 
 namespace {
 
-// What a host's logger was told.
+// What a host's logger was told; format and arguments narrow.
 struct Line {
     int level;
     bool hasCategory;
     std::string source;
     int line;
-    std::vector<wchar_t> format;
+    std::string format;
     std::vector<std::string> arguments;
-
-    bool FormatIs(const wchar_t* expected) const {
-        std::size_t i = 0;
-        for (; expected[i]; ++i)
-            if (i >= format.size() || format[i] != expected[i]) return false;
-        return i == format.size();
-    }
 };
 
 std::vector<Line> g_lines;
@@ -38,8 +32,8 @@ std::vector<Line> g_lines;
 void KeepLine(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line, const wchar_t* format,
               std::va_list arguments) {
     Line kept{level, category != nullptr, source ? source : "", static_cast<int>(line), {}, {}};
-    for (const wchar_t* unit = format; *unit; ++unit) kept.format.push_back(*unit);
     for (const wchar_t* unit = format; *unit; ++unit) {
+        kept.format += static_cast<char>(*unit);
         if (*unit != L'%') continue;
         if (unit[1] == L'h') kept.arguments.emplace_back(va_arg(arguments, const char*));
         if (unit[1] == L'x') kept.arguments.push_back(std::to_string(va_arg(arguments, unsigned)));
@@ -75,7 +69,7 @@ TEST_F(Log, HostGetsLinesUnformatted) {
     _logWrite(acfDebugVerbose, nullptr, nullptr, 0, L"100%%");
     _logWrite(static_cast<_acfDebugLevel>(3), L"host", "a/b", 7, L"%hs and %x", "text", 255);
     ASSERT_EQ(g_lines.size(), 2u) << "an unknown level asserts only where the library itself writes the line";
-    EXPECT_TRUE(g_lines[0].FormatIs(L"100%%"));
+    EXPECT_EQ(g_lines[0].format, "100%%");
     EXPECT_FALSE(g_lines[0].hasCategory);
     EXPECT_EQ(g_lines[1].level, 3);
     EXPECT_EQ(g_lines[1].source, "a/b");
@@ -83,17 +77,13 @@ TEST_F(Log, HostGetsLinesUnformatted) {
     EXPECT_EQ(g_lines[1].arguments, (std::vector<std::string>{"text", "255"}));
 }
 
-TEST_F(Log, ThrowingLoggerIsRemovedForGood) {
-    SetExternalLogger(Throw);
-    _logWrite(acfDebugError, nullptr, nullptr, 0, L"first");
-    _logWrite(acfDebugError, nullptr, nullptr, 0, L"second");
+TEST_F(Log, ThrowingLoggerIsRemovedButNotItsReplacement) {
+    for (const ExternalLogger logger : {Throw, ReplaceAndThrow}) {
+        SetExternalLogger(logger);
+        _logWrite(acfDebugError, nullptr, nullptr, 0, L"first");
+        _logWrite(acfDebugError, nullptr, nullptr, 0, L"second");
+    }
     EXPECT_EQ(g_throwerCalls, 1);
-}
-
-TEST_F(Log, LoggerInstalledWhileTheOldOneThrowsStays) {
-    SetExternalLogger(ReplaceAndThrow);
-    _logWrite(acfDebugError, nullptr, nullptr, 0, L"first");
-    _logWrite(acfDebugError, nullptr, nullptr, 0, L"second");
     EXPECT_EQ(g_lines.size(), 1u);
 }
 
@@ -105,15 +95,16 @@ TEST_F(Log, AssertionsWriteOneErrorLineAndGoOn) {
     EXPECT_FALSE(_isfalse_(false, "spoken"));
     EXPECT_FALSE(Develop::OS::RTABox("caption", "text")) << "no box without configuration";
     ASSERT_EQ(g_lines.size(), 3u);
-    const char* captions[] = {"RTA_ON_TRUE", "RTA_ON_FALSE", "caption"};
-    for (int i = 0; i < 3; ++i) {
-        EXPECT_EQ(g_lines[i].level, acfDebugError);
-        EXPECT_EQ(g_lines[i].source, "source/TAVO/BaseOS_Win");
-        EXPECT_EQ(g_lines[i].line, 201);
-        EXPECT_TRUE(g_lines[i].FormatIs(L"Failed assumption: %hs:%hs"));
-        ASSERT_EQ(g_lines[i].arguments.size(), 2u);
-        EXPECT_EQ(g_lines[i].arguments[0], captions[i]);
+    for (const Line& line : g_lines) {
+        EXPECT_EQ(line.level, acfDebugError);
+        EXPECT_EQ(line.source, "source/TAVO/BaseOS_Win");
+        EXPECT_EQ(line.line, 201);
+        EXPECT_EQ(line.format, "Failed assumption: %hs:%hs");
+        EXPECT_EQ(line.arguments.size(), 2u);
     }
+    EXPECT_EQ(g_lines[0].arguments[0], "RTA_ON_TRUE");
+    EXPECT_EQ(g_lines[1].arguments[0], "RTA_ON_FALSE");
+    EXPECT_EQ(g_lines[2].arguments, (std::vector<std::string>{"caption", "text"}));
 }
 
 // Run by the tests below in a child process under a debugger.
@@ -127,28 +118,10 @@ TEST(Debuggee, DISABLED_WritesLines) {
     _logWrite(acfDebugTrace, L"long", nullptr, 0, L"%.*ls", 3000, letters.data());
 }
 
-namespace {
-
-// Takes "    0.123 " off: the time is of no fixed value.
-std::string DropTimes(const std::string& text) {
-    std::string rest;
-    for (std::size_t at = 0; at < text.size();) {
-        std::size_t end = text.find('\n', at);
-        end = end == std::string::npos ? text.size() : end + 1;
-        std::string line = text.substr(at, end - at);
-        at = end;
-        const std::size_t bracket = line.find(" [");
-        const bool timed = bracket != std::string::npos && bracket >= 8 && line[bracket - 4] == '.';
-        rest += timed ? line.substr(bracket + 1) : line;
-    }
-    return rest;
-}
-
-} // namespace
-
 TEST(DebuggerOutput, CarriesPrefixMessageAndLineEnd) {
     int exitCode = 0;
-    const std::string text = DropTimes(support::RunUnderDebugger("Debuggee.DISABLED_WritesLines", exitCode));
+    std::string text = support::RunUnderDebugger("Debuggee.DISABLED_WritesLines", exitCode);
+    text = std::regex_replace(text, std::regex(" *[0-9]+\\.[0-9]{3} \\["), "["); // the time is of no fixed value
     EXPECT_EQ(exitCode, 0);
     const std::string written = "[INFO   ] [TAVO.default] [] plain 5 wide\r\n"
                                 "[WARNING] [host] [] {[file:a/b] [line:12]} narrow\r\n"
@@ -169,16 +142,18 @@ TEST(DebuggerOutput, CarriesPrefixMessageAndLineEnd) {
 namespace {
 
 using SetLogger = void (*)(ExternalLogger);
-using Box = bool (*)(const char*, const char*);
 using MakeResult = void (*)(hr*, long32); // the constructor; both systems pass the object first
 
-// What constructing a code in a copy of the library with this configuration tells the logger.
-std::vector<Line> LinesOf(const char* configuration, long32 code) {
-    const support::LibraryCopy copy("Renamed", configuration);
-    if (!copy.IsLoaded()) {
-        ADD_FAILURE() << "the copy does not load";
-        return {};
-    }
+constexpr long32 kFailure = static_cast<long32>(0x80004005);
+
+// A configuration file: the switches that it sets, and which lines a failed code then writes (0: none).
+struct Configured {
+    const char* text;
+    bool box, log, stop;
+};
+
+// What constructing a code in this copy of the library tells the logger.
+std::vector<Line> LinesOf(const support::LibraryCopy& copy, long32 code) {
     const auto setLogger =
         copy.Find<SetLogger>("_ZN4TAVO7Develop17SetExternalLoggerEPFv14_acfDebugLevelPKwPKciS3_P13__va_list_tagE",
                              "_ZN4TAVO7Develop17SetExternalLoggerEPFv14_acfDebugLevelPKwPKclS3_PcE");
@@ -198,78 +173,55 @@ std::vector<Line> LinesOf(const char* configuration, long32 code) {
     return g_lines;
 }
 
-constexpr long32 kFailure = static_cast<long32>(0x80004005);
-
 } // namespace
 
 TEST(Configuration, SwitchesReportsOfFailedResultCodes) {
-    EXPECT_TRUE(LinesOf(nullptr, kFailure).empty()) << "no file: all off";
-    EXPECT_TRUE(LinesOf("[Debug]\nLogFailedHRESULT=0\n", kFailure).empty());
-    EXPECT_TRUE(LinesOf("[Other]\nLogFailedHRESULT=1\n", kFailure).empty());
-    EXPECT_TRUE(LinesOf("[Debug]\nLogFailedHRESULT=1\nBreakOnHRESULT=1\n", 0).empty());
-    EXPECT_TRUE(LinesOf("[Debug]\nLogFailedHRESULT=1\nBreakOnHRESULT=1\n", 5).empty());
-
-    const auto logged = LinesOf("; ours\r\n[debug]\r\nlogfailedhresult = 1\r\n", kFailure);
-    ASSERT_EQ(logged.size(), 1u);
-    EXPECT_EQ(logged[0].level, acfDebugTrace);
-    EXPECT_EQ(logged[0].source, "source/TAVO/TAVOACF");
-    EXPECT_EQ(logged[0].line, 28);
-    EXPECT_TRUE(logged[0].FormatIs(L"lResult < 0: %x"));
-    EXPECT_EQ(logged[0].arguments[0], std::to_string(0x80004005u));
-
-    const auto both = LinesOf("[Debug]\nBreakOnHRESULT=-1\nLogFailedHRESULT=0x10", kFailure);
-    ASSERT_EQ(both.size(), 2u) << "the assertion first";
-    EXPECT_EQ(both[0].arguments, (std::vector<std::string>{"RTA_ON_TRUE", "source/TAVO/TAVOACF,25:lResult < 0"}));
-    EXPECT_EQ(both[1].line, 28);
-}
-
-TEST(Configuration, TellsItsSwitches) {
-    const struct {
-        const char* configuration;
-        bool box, log, stop;
-    } rows[] = {{nullptr, false, false, false},
-                {"[Debug]\nAssertBox=1\n", true, false, false},
-                {"[Debug]\nLogFailedHRESULT=2\nAssertBox=0\n", false, true, false},
-                {"[Debug]\nBreakOnHRESULT=1\n", false, false, true},
-                {"[Debug]\nAssertBox=1\nLogFailedHRESULT=1\nBreakOnHRESULT=1\n", true, true, true}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.configuration ? row.configuration : "no file");
-        const support::LibraryCopy copy("Renamed", row.configuration);
+    for (const Configured& row : {
+             Configured{nullptr, false, false, false},
+             Configured{"[Other]\nLogFailedHRESULT=1\n", false, false, false},
+             Configured{"[Debug]\nAssertBox=1\n", true, false, false},
+             Configured{"; ours\r\n[debug]\r\nlogfailedhresult = 2\r\nAssertBox=0\n", false, true, false},
+             Configured{"[Debug]\nLogFailedHRESULT=0\nBreakOnHRESULT=1\n", false, false, true},
+             Configured{"[Debug]\nBreakOnHRESULT=-1\nLogFailedHRESULT=0x10", false, true, true},
+         }) {
+        SCOPED_TRACE(row.text ? row.text : "no file");
+        const support::LibraryCopy copy("Renamed", row.text);
         const auto get = copy.Find<tagSWITCHES (*)()>("_ZN4TAVO7Develop11GetSwitchesEv");
         ASSERT_TRUE(get);
         const tagSWITCHES switches = get();
         EXPECT_EQ(switches.AssertBox, row.box);
         EXPECT_EQ(switches.LogFailedHRESULT, row.log);
         EXPECT_EQ(switches.BreakOnHRESULT, row.stop);
+
+        for (const long32 good : {0, 5}) EXPECT_TRUE(LinesOf(copy, good).empty());
+        if (row.box) continue; // nobody would answer it
+        const auto lines = LinesOf(copy, kFailure);
+        ASSERT_EQ(lines.size(), (row.stop ? 1u : 0u) + (row.log ? 1u : 0u)) << "the assertion first";
+        for (const Line& line : lines) {
+            const bool assertion = line.level == acfDebugError;
+            EXPECT_EQ(assertion, row.stop && &line == &lines[0]);
+            EXPECT_EQ(line.source, assertion ? "source/TAVO/BaseOS_Win" : "source/TAVO/TAVOACF");
+            EXPECT_EQ(line.line, assertion ? 201 : 28);
+            EXPECT_EQ(line.format, assertion ? "Failed assumption: %hs:%hs" : "lResult < 0: %x");
+            EXPECT_EQ(line.arguments.back(), assertion ? "source/TAVO/TAVOACF,25:lResult < 0" : "2147500037");
+        }
     }
 }
 
 TEST(ResultCode, ComparesAndConverts) {
     const hr good(1), bad(kFailure), alsoBad(bad);
-    EXPECT_TRUE(good);
-    EXPECT_FALSE(bad);
-    EXPECT_TRUE(bad == alsoBad);
-    EXPECT_TRUE(good != bad);
-    EXPECT_TRUE(good == 1);
-    EXPECT_TRUE(good != 0);
-    EXPECT_TRUE(bad == kFailure);
+    EXPECT_TRUE(good && good == 1 && good != 0 && good != bad);
+    EXPECT_TRUE(!bad && bad == alsoBad && bad == kFailure);
     EXPECT_EQ(static_cast<long32>(bad), kFailure);
 }
 
-// --- process facts -------------------------------------------------------------------------------------------------
-
 TEST(ProcessFacts, AreFixedAtLoad) {
-    const wchar_t* name = Core::OS::GetProcessName();
-    std::string narrow;
-    for (; *name; ++name) narrow += static_cast<char>(*name);
-    EXPECT_EQ(narrow.substr(0, 10), "tavo_tests");
-    const wchar_t* startup = Core::OS::GetStartupPath();
-    EXPECT_EQ(startup[0], L'/');
-    EXPECT_EQ(startup[1], L't') << "the file name's start, not the folder's";
+    const wchar_t expected[] = L"tavo_tests";
+    for (int i = 0; i < 10; ++i) EXPECT_EQ(Core::OS::GetProcessName()[i], expected[i]);
+    EXPECT_EQ(Core::OS::GetStartupPath()[0], L'/');
+    EXPECT_EQ(Core::OS::GetStartupPath()[1], L't') << "the file name's start, not the folder's";
     EXPECT_STREQ(Core::OS::GetPlatformString(), L"Windows");
 }
-
-// --- clocks and numbers --------------------------------------------------------------------------------------------
 
 TEST(Clocks, AgreeWithTheStandardOnes) {
     using namespace std::chrono;
@@ -291,13 +243,9 @@ TEST(Clocks, AgreeWithTheStandardOnes) {
 
 TEST(Numbers, CountBitsAndKnowTheMachine) {
     EXPECT_EQ(bitcount64(0), 0u);
-    EXPECT_EQ(bitcount64(0xFFFFFFFFFFFFFFFFULL), 64u);
     for (int bit = 0; bit < 64; ++bit) EXPECT_EQ(bitcount64(1ULL << bit | 1ULL << 63), bit == 63 ? 1u : 2u);
-    EXPECT_FALSE(_isBigEndian());
-    EXPECT_FALSE(_isWChar32());
+    EXPECT_FALSE(_isBigEndian() || _isWChar32());
 }
-
-// --- random numbers ------------------------------------------------------------------------------------------------
 
 namespace {
 
@@ -333,7 +281,7 @@ struct NaiveTwister {
 } // namespace
 
 TEST(Random, SequenceOfASeedIsIntended) {
-    for (std::uint32_t seed : {0u, 1u, 5489u, 0xFFFFFFFFu}) {
+    for (std::uint32_t seed : {0u, 5489u, 0xFFFFFFFFu}) {
         CMTRandom random;
         random.rnd();
         random.seed(seed);

@@ -13,7 +13,7 @@ using namespace TAVO::String;
 using support::Bytes;
 using support::Units;
 using TAVO::ulong32;
-using Wides = std::vector<wchar_t>;
+using Numbers = std::vector<ulong32>;
 
 constexpr std::size_t kAll = SIZE_MAX;
 
@@ -109,9 +109,9 @@ TEST(TranscodingSizes, FollowTheirTables) {
         ulong32 value;
         std::size_t utf8, utf16, wide;
     };
-    for (const Row& row : {Row{0x7F, 1, 1, 1}, Row{0x80, 2, 1, 1}, Row{0x7FF, 2, 1, 1}, Row{0x800, 3, 1, 1},
-                           Row{0xFFFF, 3, 1, 1}, Row{0x10000, 4, 2, 2}, Row{0x10FFFF, 4, 2, 2}, Row{0x110000, 0, 2, 2},
-                           Row{0x110001, 0, 0, 2}, Row{0xFFFFFFFF, 0, 0, 2}}) {
+    for (const Row& row :
+         {Row{0x7F, 1, 1, 1}, Row{0x80, 2, 1, 1}, Row{0x7FF, 2, 1, 1}, Row{0x800, 3, 1, 1}, Row{0xFFFF, 3, 1, 1},
+          Row{0x10000, 4, 2, 2}, Row{0x10FFFF, 4, 2, 2}, Row{0x110000, 0, 2, 2}, Row{0x110001, 0, 0, 2}}) {
         EXPECT_EQ(UTF8Size(row.value), row.utf8) << row.value;
         EXPECT_EQ(UTF16Size(row.value), row.utf16) << row.value;
         EXPECT_EQ(acfWSize(row.value), row.wide) << row.value;
@@ -156,16 +156,12 @@ void ExpectStep(bool (*step)(Unit*&, const Source*&), const std::vector<Source>&
     EXPECT_EQ(std::vector<Unit>(target, out), As<Unit>(expected));
     EXPECT_EQ(*out, 7);
 }
-template <class Source>
-void ExpectValue(bool (*step)(ulong32*, const Source*&), const std::vector<Source>& text, bool good,
-                 std::ptrdiff_t moved, ulong32 expected) {
-    static const support::GuardedMemory memory;
-    const Source* const begin = memory.Place(text.data(), text.size());
-    const Source* in = begin;
-    ulong32 value = 0xABCD;
-    EXPECT_EQ(step(&value, in), good);
-    EXPECT_EQ(in - begin, moved);
-    EXPECT_EQ(value, expected);
+// A step that gives a number, as one that writes it.
+template <class Source, bool (*kStep)(ulong32*, const Source*&)> bool Number(ulong32*& out, const Source*& in) {
+    *out = 0xABCD;
+    const bool good = kStep(out, in);
+    ++out;
+    return good;
 }
 
 TEST(TranscodingStep, Utf8IsTakenAsItIs_Intended) {
@@ -197,7 +193,7 @@ TEST(TranscodingStep, Utf8IsTakenAsItIs_Intended) {
         const Bytes text = Terminated(row.bytes);
         const bool encodes = row.good && row.value <= 0x10FFFF;
         const Units expected = encodes ? Encoded16(row.value) : Units();
-        ExpectValue(utf8_acfW32, text, row.good, row.moved, row.value);
+        ExpectStep(Number<unsigned char, utf8_acfW32>, text, row.good, row.moved, Numbers{row.value});
         ExpectStep(utf8_utf16, text, encodes, row.moved, expected);
         ExpectStep(utf8_acfW, text, encodes, row.moved, expected);
     }
@@ -214,8 +210,9 @@ TEST(TranscodingStep, Utf16PairsDecodeToZeroOrOne_Intended) {
             const Character c = first ? LookAt(text, 0, kAll) : Character{Look::Good, 1, 0};
             const bool good = c.look == Look::Good;
             const auto moved = static_cast<std::ptrdiff_t>(c.units);
-            ExpectValue(utf16_acfW32, text, good, moved, good ? c.value : 0xABCD);
-            ExpectValue(acfW_acfW32, wide, good, moved, good ? c.value : 0xABCD);
+            const Numbers number{good ? c.value : 0xABCD};
+            ExpectStep(Number<unsigned short, utf16_acfW32>, text, good, moved, number);
+            ExpectStep(Number<wchar_t, acfW_acfW32>, wide, good, moved, number);
             ExpectStep(utf16_utf8, text, good, moved, good ? Encoded8(c.value) : Bytes());
             ExpectStep(acfW_utf8, wide, good, moved, good ? Encoded8(c.value) : Bytes());
             ExpectStep(acfW_utf16, wide, good, moved, good ? Encoded16(c.value) : Units());
@@ -329,20 +326,12 @@ TEST_F(Differential, RandomTextsAtEveryBound) {
 
 // One odd sequence at every place of a text whose other characters have one length: all block and run borders.
 TEST_F(Differential, OddSequencesAtEveryPlace) {
-    ExpectOddSequences<Bytes>({{'a'}, {0xC3, 0xA9}, {0xE4, 0xB8, 0xAD}, {0xF0, 0x9F, 0x98, 0x80}},
-                              {{'b'},
-                               {0xC3, 0xA9},
-                               {0xE4, 0xB8, 0xAD},
-                               {0xF0, 0x90, 0x80, 0x80},
-                               {0xF0, 0x8F, 0xBF, 0xBF},
-                               {0xC3},
-                               {0xE4, 0xB8},
-                               {0xF0, 0x9F, 0x98},
-                               {0xF4, 0x90, 0x80, 0x80},
-                               {0xF4, 0x8F, 0xBF, 0xBF},
-                               {0x80},
-                               {0xF5},
-                               {0xF8, 0x80, 0x80, 0x80, 0x80}});
+    std::vector<Bytes> odds;
+    for (const std::string odd :
+         {"b", "\xC3\xA9", "\xE4\xB8\xAD", "\xF0\x90\x80\x80", "\xF0\x8F\xBF\xBF", "\xC3", "\xE4\xB8", "\xF0\x9F\x98",
+          "\xF4\x90\x80\x80", "\xF4\x8F\xBF\xBF", "\x80", "\xF5", "\xF8\x80\x80\x80\x80"})
+        odds.push_back(As<unsigned char>(odd));
+    ExpectOddSequences<Bytes>({{'a'}, {0xC3, 0xA9}, {0xE4, 0xB8, 0xAD}, {0xF0, 0x9F, 0x98, 0x80}}, odds);
     ExpectOddSequences<Units>(
         {{'a'}, {0xE9}, {0x4E2D}, {0xD83D, 0xDE00}},
         {{'b'}, {0x7FF}, {0xFFFF}, {0xD800, 0xDBFF}, {0xD800, 0xDC00}, {0xD800}, {0xDC00}, {0xD800, 0xDBFE}});
@@ -363,37 +352,22 @@ TEST_F(Differential, LongTextsSumUp) {
 
 // The plainest of the cases above, told once in so many words.
 TEST(TranscodingWhole, InvalidTextIsCutOrRefused_Intended) {
-    struct Row {
-        const char* name;
-        Units source;
-        std::size_t length, result;
-        Bytes left;
-    };
-    for (const Row& row : {
-             Row{"invalid behind two bytes", {0xE9, 0xDC00}, kAll, 0, {0xC3, 0xA9}},
-             Row{"invalid behind one byte", {0x65, 0xDC00}, kAll, 2, {0x65, 0}},
-             Row{"bound cuts a pair", {0xE9, 0xD800, 0xDC00}, 2, 3, {0xC3, 0xA9, 0}},
-             Row{"terminator cuts a pair", {0xE9, 0xD800}, kAll, 0, {0xC3, 0xA9}},
-             Row{"zero inside", {0xD800, 0xDC00, 0x41}, kAll, 3, {0, 0x41, 0}},
-         }) {
-        const auto text = As<wchar_t>(Terminated(row.source));
-        Bytes target(8, 0xEE), left = row.left;
-        EXPECT_EQ(acfWChar_To_UTF8(text.data(), row.length, target.data(), 8), row.result) << row.name;
-        left.resize(8, 0xEE);
-        EXPECT_EQ(target, left) << row.name;
-    }
-    wchar_t target[3] = {};
+    const wchar_t behindOne[] = {0x65, 0xDC00, 0}, behindTwo[] = {0xE9, 0xDC00, 0}, high[] = {0xE9, 0xD800, 0xDC00, 0};
+    unsigned char bytes[4] = {};
+    EXPECT_EQ(acfWChar_To_UTF8(behindOne, kAll, bytes, 4), 2u) << "its one byte is all that was asked for";
+    EXPECT_EQ(acfWChar_To_UTF8(behindTwo, kAll, bytes, 4), 0u);
+    EXPECT_EQ(bytes[1], 0xA9) << "what was written stays";
+    EXPECT_EQ(acfWChar_To_UTF8(high, 2, bytes, 4), 3u) << "the bound cuts the pair";
+    wchar_t units[3] = {};
     const unsigned char behindFour[] = {0xF0, 0x9F, 0x98, 0x80, 0x80, 0}, behindLetter[] = {0x41, 0x80, 0x42, 0};
-    EXPECT_EQ(UTF8_To_acfWChar(behindFour, kAll, target, 3), 0u);
-    EXPECT_EQ(target[1], 0xDE00);
-    EXPECT_EQ(UTF8_To_acfWChar(behindLetter, kAll, target, 3), 2u);
-    EXPECT_STREQ(target, L"A");
+    EXPECT_EQ(UTF8_To_acfWChar(behindFour, kAll, units, 3), 0u);
+    EXPECT_EQ(UTF8_To_acfWChar(behindLetter, kAll, units, 3), 2u);
 }
 
 TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {
     struct Row {
         const char* name;
-        std::vector<ulong32> text; // no element behind those given is readable
+        Numbers text; // no element behind those given is readable
         std::size_t n, units, bytes;
     };
     const Row rows[] = {
@@ -412,14 +386,11 @@ TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {
 }
 
 TEST(TranscodingCounts, NullCountsZero) {
-    for (std::size_t n : {std::size_t(0), std::size_t(1), kAll})
-        for (std::size_t count :
-             {UTF8w32strlen(nullptr, n), UTF8u16strlen(nullptr, n), UTF8wstrlen(nullptr, n), UTF16w32strlen(nullptr, n),
-              acfWw32strlen(nullptr, n), UTF16u8strlen(nullptr, n), acfWu8strlen(nullptr, n), UTF16wstrlen(nullptr, n),
-              acfWu16strlen(nullptr, n), UTF32wstrlen(nullptr, n), UTF32u16strlen(nullptr, n),
-              UTF32u8strlen(nullptr, n), UTF8_To_acfWChar(nullptr, n, nullptr, 0),
-              acfWChar_To_UTF8(nullptr, n, nullptr, 0), OS::ANSI_To_acfWChar(nullptr, n, nullptr, 0),
-              OS::acfWChar_To_ANSI(nullptr, n, nullptr, 0)})
+    for (std::size_t n : {std::size_t(0), kAll})
+        for (std::size_t count : {UTF8w32strlen(nullptr, n), UTF8u16strlen(nullptr, n), UTF16w32strlen(nullptr, n),
+                                  acfWw32strlen(nullptr, n), acfWu8strlen(nullptr, n), UTF16wstrlen(nullptr, n),
+                                  UTF32wstrlen(nullptr, n), UTF32u8strlen(nullptr, n),
+                                  UTF8_To_acfWChar(nullptr, n, nullptr, 0), acfWChar_To_UTF8(nullptr, n, nullptr, 0)})
             EXPECT_EQ(count, 0u);
 }
 
@@ -443,12 +414,11 @@ TEST(TranscodingAnsi, FollowsTheSystemsProtocol) {
                            Row{2, 8, 2}, Row{0x100000002, 8, 2}, Row{0x80000000, 8, 4}}) {
         wchar_t wide[8] = L"#######";
         char narrow[8] = "#######";
-        SCOPED_TRACE(testing::Message() << row.length << " " << row.capacity);
-        EXPECT_EQ(OS::ANSI_To_acfWChar("abc", row.length, wide, row.capacity), row.result);
-        EXPECT_EQ(OS::acfWChar_To_ANSI(L"abc", row.length, narrow, row.capacity), row.result);
-        if (row.capacity != 8) continue;
-        EXPECT_STREQ(wide, row.result == 4 ? L"abc" : row.result == 2 ? L"ab#####" : L"#######");
-        EXPECT_STREQ(narrow, row.result == 4 ? "abc" : row.result == 2 ? "ab#####" : "#######");
+        EXPECT_EQ(OS::ANSI_To_acfWChar("abc", row.length, wide, row.capacity), row.result) << row.length;
+        EXPECT_EQ(OS::acfWChar_To_ANSI(L"abc", row.length, narrow, row.capacity), row.result) << row.length;
+        if (row.result != 2) continue;
+        EXPECT_STREQ(wide, L"ab#####");
+        EXPECT_STREQ(narrow, "ab#####");
     }
 }
 
