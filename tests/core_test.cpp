@@ -1,4 +1,4 @@
-// Allocation and atomic primitives.
+// Allocation.
 
 #include <gtest/gtest.h>
 #include <TAVO/core.h>
@@ -25,16 +25,4 @@ TEST(Allocation, RefusesAbsurdSizesAndAlignsTo16) {
         EXPECT_EQ(block[size - 1], 'x') << "the old block stays";
         OS::_ffree(block);
     }
-}
-
-TEST(Interlocked, AnswerOldOrNewValues) {
-    std::uint32_t count = 0xFFFFFFFF;
-    EXPECT_EQ(OS::InterlockedIncrement32(count), 0u);
-    EXPECT_EQ(OS::InterlockedDecrement32(count), 0xFFFFFFFFu);
-    std::size_t word = 5;
-    EXPECT_EQ(TAVO::Core::InterlockedCompareSwapSize_t(word, 4, 9), 5u);
-    EXPECT_EQ(TAVO::Core::InterlockedCompareSwapSize_t(word, 5, 9), 5u);
-    EXPECT_EQ(word, 9u);
-    TAVO::Core::InterlockedSet(word, 1);
-    EXPECT_EQ(word, 1u);
 }

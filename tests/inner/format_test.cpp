@@ -5,6 +5,7 @@
 #include "platform/platform.h"
 #include "support/heapwatch.h"
 
+#include <algorithm>
 #include <cfloat>
 #include <climits>
 #include <clocale>
@@ -38,7 +39,7 @@ template <class... Arguments> std::string Expected(const std::string& format, Ar
     return out;
 }
 
-// Both formatters on the same format, whose letters mean the same to both.
+// Both formatters on a format that means the same to both.
 template <class... Arguments> void Compare(const std::string& format, Arguments... arguments) {
     ASSERT_EQ(Format(Widen(format).data(), arguments...), Expected(format, arguments...)) << format;
 }
@@ -160,19 +161,17 @@ TEST(Format, BrokenConversionsEndTheFormatting) {
 }
 
 TEST(Format, BoundedAndTerminatedAtEveryCapacity) {
-    // "é" in the code page of the machine, whichever that is.
-    char narrow[8] = {};
+    char narrow[8] = {}; // "é" in the code page of the machine, whichever that is
     TAVO::Platform::WideToAnsi(L"\u00e9x", -1, narrow, 8);
-    wchar_t whole[64];
-    const std::size_t length = FormatWide(whole, 64, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0);
-    ASSERT_EQ(length, 19u);
-    EXPECT_EQ(FormatWide(nullptr, 0, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), length);
-    for (std::size_t capacity = 1; capacity <= length + 1; ++capacity) {
-        std::vector<wchar_t> out(capacity + 1, L'#');
-        EXPECT_EQ(FormatWide(out.data(), capacity, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), length);
-        for (std::size_t i = 0; i + 1 < capacity; ++i) ASSERT_EQ(out[i], whole[i]) << capacity;
-        EXPECT_EQ(out[capacity - 1], 0);
-        EXPECT_EQ(out[capacity], L'#') << "nothing behind";
+    wchar_t whole[20];
+    for (std::size_t capacity = 20; capacity < 21; --capacity) { // down to none
+        std::vector<wchar_t> cut(capacity + 1, L'#');
+        ASSERT_EQ(FormatWide(cut.data(), capacity, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), 19u);
+        if (capacity == 20) std::copy_n(cut.data(), 20, whole);
+        EXPECT_EQ(cut[capacity], L'#') << "nothing behind";
+        if (capacity == 0) break;
+        EXPECT_EQ(cut[capacity - 1], 0);
+        EXPECT_TRUE(std::equal(cut.data(), cut.data() + capacity - 1, whole)) << capacity;
     }
     wchar_t out[4];
     EXPECT_EQ(FormatWide(out, 4, L"%2000000000d%-2000000000ls", 1, L""), 4000000000u) << "costs no more than what fits";

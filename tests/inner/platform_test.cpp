@@ -68,29 +68,6 @@ TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
         EXPECT_EQ(ReadLevel(content.substr(0, length)), 0) << "cut at " << length;
 }
 
-TEST(CodePage, FollowsTheCallProtocol) {
-    wchar_t wide[8];
-    char narrow[8];
-    const struct {
-        int length, capacity, result;
-    } rows[] = {{-1, 0, 4}, {-7, 4, 4}, {-1, 3, 0}, {2, 2, 2}, {0, 8, 0}, {-1, -1, 0}};
-    for (const auto& row : rows) {
-        EXPECT_EQ(Platform::AnsiToWide("abc", row.length, wide, row.capacity), row.result) << row.length;
-        EXPECT_EQ(Platform::WideToAnsi(L"abc", row.length, narrow, row.capacity), row.result) << row.length;
-    }
-    EXPECT_EQ(Platform::AnsiToWide(nullptr, -1, wide, 8), 0);
-    EXPECT_EQ(Platform::WideToAnsi(nullptr, -1, narrow, 8), 0);
-}
-
-TEST(Memory, TellsReadableFromUnreadable) {
-    static const char constant[] = "x";
-    int local = 0;
-    for (const void* readable : {static_cast<const void*>(constant), static_cast<const void*>(&local)})
-        EXPECT_TRUE(Platform::IsReadable(readable));
-    for (const std::uintptr_t address : {std::uintptr_t{0}, std::uintptr_t{16}, ~std::uintptr_t{0}})
-        EXPECT_FALSE(Platform::IsReadable(reinterpret_cast<void*>(address)));
-}
-
 TEST(Threads, HaveTheirOwnIdentityPriorityAndScope) {
     const std::uint32_t self = Platform::GetThreadId();
     int scope = 0;

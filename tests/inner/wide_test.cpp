@@ -33,30 +33,4 @@ TEST(WideHelpers, LengthAtEveryAlignmentAndBound) {
     }
 }
 
-TEST(WideHelpers, CompareStopsAtTerminatorsAndBounds) {
-    const wchar_t high[] = {0xFFFF, 0};
-    EXPECT_EQ(WideCompare(L"ab", L"abc"), -1);
-    EXPECT_EQ(WideCompare<wchar_t>(high, L"a"), 1) << "units are unsigned";
-    EXPECT_EQ(WideCompareN(L"abc", L"abd", 2), 0);
-    EXPECT_EQ(WideCompareN(L"abc", L"abd", 3), -1);
-    EXPECT_EQ(WideCompareN(L"ab", L"ab", 100), 0);
-    EXPECT_TRUE(WideEqual(L"abc", L"abd", 2));
-    EXPECT_FALSE(WideEqual(L"abc", L"abd", 3));
-    EXPECT_TRUE(WideEqualFolded(L"aBc[", L"AbC[", 4));
-    EXPECT_FALSE(WideEqualFolded(L"a[", L"a{", 2));
-}
-
-TEST(Measuring, TellsWhatEndedTheText) {
-    const auto* bytes = reinterpret_cast<const unsigned char*>("a\xE4\xB8\xAD\xC3");
-    EXPECT_EQ(MeasureUtf8(bytes, 4).ending, Ending::Length);
-    EXPECT_EQ(MeasureUtf8(bytes, 5).ending, Ending::Cut);
-    EXPECT_EQ(MeasureUtf8(bytes, 5).source, 4u);
-    EXPECT_EQ(MeasureUtf8(bytes + 2, 3).ending, Ending::Invalid);
-    const wchar_t units[] = {'a', 0xD800, 0xDC00, 0xD800, 'b'};
-    EXPECT_EQ(MeasureUtf16(units, 3).ending, Ending::Length);
-    EXPECT_EQ(MeasureUtf16(units, 4).ending, Ending::Cut);
-    EXPECT_EQ(MeasureUtf16(units, 5).ending, Ending::Invalid);
-    EXPECT_EQ(MeasureUtf16(units, 5).source, 3u);
-}
-
 } // namespace

@@ -65,5 +65,6 @@ TEST(Memory, ProtectedPagesAreUnreadable) {
     EXPECT_TRUE(Platform::IsReadable(pages + Platform::PageSize - 1)) << "the last byte before";
     EXPECT_FALSE(Platform::IsReadable(pages + Platform::PageSize));
     munmap(pages, 2 * Platform::PageSize);
-    EXPECT_FALSE(Platform::IsReadable(pages));
+    for (const std::uintptr_t address : {reinterpret_cast<std::uintptr_t>(pages), std::uintptr_t{0}, UINTPTR_MAX})
+        EXPECT_FALSE(Platform::IsReadable(reinterpret_cast<void*>(address)));
 }
