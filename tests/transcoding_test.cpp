@@ -76,8 +76,7 @@ template <class Text> std::pair<std::size_t, std::size_t> Count(const Text& text
     return {characters, target};
 }
 
-// What a whole-string converter leaves: its result, and the target units written (terminator included when there is
-// one).
+// What a whole-string converter leaves: its result, and the target units written, the terminator too if there is one.
 template <class Target, class Text, class Encode>
 std::pair<std::size_t, Target> Convert(const Text& text, std::size_t n, Encode encode) {
     const std::size_t need = Count(text, n).second + 1;
@@ -304,7 +303,8 @@ protected:
     support::GuardedMemory m_source;
 };
 
-TEST_F(Differential, RandomTextsAtEveryBound) {
+// Invalid text is cut, or refused with what was written left in place, as Convert tells.
+TEST_F(Differential, RandomTextsAtEveryBound_Intended) {
     support::TextSource source(1);
     for (std::uint32_t i = 0; i < 400 && !HasFatalFailure(); ++i) {
         SCOPED_TRACE(i);
@@ -332,20 +332,6 @@ TEST_F(Differential, LongTextsSumUp) {
     for (const Bytes& bytes : {text, Bytes(50000, 'x')}) Expect(Terminated(bytes), kAll);
     for (const int unit : {0x78, 0xE9, 0x4E2D})
         Expect(Terminated(Units(40000, static_cast<unsigned short>(unit))), kAll);
-}
-
-// The plainest of the cases above, told once in so many words.
-TEST(TranscodingWhole, InvalidTextIsCutOrRefused_Intended) {
-    const wchar_t behindOne[] = {0x65, 0xDC00, 0}, behindTwo[] = {0xE9, 0xDC00, 0}, high[] = {0xE9, 0xD800, 0xDC00, 0};
-    unsigned char bytes[4] = {};
-    EXPECT_EQ(acfWChar_To_UTF8(behindOne, kAll, bytes, 4), 2u) << "its one byte is all that was asked for";
-    EXPECT_EQ(acfWChar_To_UTF8(behindTwo, kAll, bytes, 4), 0u);
-    EXPECT_EQ(bytes[1], 0xA9) << "what was written stays";
-    EXPECT_EQ(acfWChar_To_UTF8(high, 2, bytes, 4), 3u) << "the bound cuts the pair";
-    wchar_t units[3] = {};
-    const unsigned char behindFour[] = {0xF0, 0x9F, 0x98, 0x80, 0x80, 0}, behindLetter[] = {0x41, 0x80, 0x42, 0};
-    EXPECT_EQ(UTF8_To_acfWChar(behindFour, kAll, units, 3), 0u);
-    EXPECT_EQ(UTF8_To_acfWChar(behindLetter, kAll, units, 3), 2u);
 }
 
 TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {

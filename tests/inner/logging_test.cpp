@@ -11,8 +11,7 @@ using namespace TAVO::Develop;
 TEST(AssertionLock, IsRecursiveAndExcludesOthers) {
     AssertionLock lock;
     std::atomic<bool> entered{false};
-    lock.lock();
-    lock.lock();
+    for (int level = 0; level < 2; ++level) lock.lock();
     std::thread other([&] {
         const std::lock_guard guard(lock);
         entered = true;
