@@ -5,6 +5,7 @@
 #include "platform/platform.h"
 #include "support/heapwatch.h"
 
+#include <algorithm>
 #include <cfloat>
 #include <climits>
 #include <clocale>
@@ -21,19 +22,14 @@ namespace {
 
 using TAVO::FormatWide;
 
-std::string Narrow(const wchar_t* text) {
-    std::string narrow;
-    for (; *text; ++text) narrow += *text < 0x80 ? static_cast<char>(*text) : '?';
-    return narrow;
-}
-
 std::vector<wchar_t> Widen(const std::string& text) { return {text.c_str(), text.c_str() + text.size() + 1}; }
 
 template <class... Arguments> std::string Format(const wchar_t* format, Arguments... arguments) {
     wchar_t out[4096];
     const std::size_t length = FormatWide(out, 4096, format, arguments...);
-    const std::string text = Narrow(out);
-    EXPECT_EQ(text.size(), length);
+    EXPECT_EQ(out[length], 0);
+    std::string text;
+    for (const wchar_t* unit = out; *unit; ++unit) text += *unit < 0x80 ? static_cast<char>(*unit) : '?';
     return text;
 }
 
@@ -43,7 +39,7 @@ template <class... Arguments> std::string Expected(const std::string& format, Ar
     return out;
 }
 
-// Both formatters on the same format, whose letters mean the same to both.
+// Both formatters on a format that means the same to both.
 template <class... Arguments> void Compare(const std::string& format, Arguments... arguments) {
     ASSERT_EQ(Format(Widen(format).data(), arguments...), Expected(format, arguments...)) << format;
 }
@@ -59,7 +55,7 @@ public:
         if (Below(2)) format += std::to_string(Below(30));
         if (Below(2)) (format += '.') += std::to_string(Below(25));
         format += length;
-        format += types[Below(static_cast<unsigned>(std::char_traits<char>::length(types)))];
+        format += types[Below(static_cast<unsigned>(std::strlen(types)))];
         return format += '>';
     }
 
@@ -67,16 +63,11 @@ public:
     // All magnitudes alike.
     unsigned long long Integer() { return m_random() >> Below(64); }
     double Real() {
-        switch (Below(4)) {
-        case 0:
-            return static_cast<double>(Integer()) / 1000.0 * (Below(2) ? 1 : -1);
-        case 1:
-            return std::ldexp(static_cast<double>(m_random()), static_cast<int>(Below(2000)) - 1060);
-        case 2:
-            return static_cast<double>(Below(2000)) / 8.0; // ties
-        default:
-            return static_cast<double>(Below(100)) * 0.01;
-        }
+        const double values[] = {static_cast<double>(Integer()) / (Below(2) ? 1000.0 : -1000.0),
+                                 std::ldexp(static_cast<double>(m_random()), static_cast<int>(Below(2000)) - 1060),
+                                 static_cast<double>(Below(2000)) / 8.0, // ties
+                                 static_cast<double>(Below(100)) * 0.01};
+        return values[Below(4)];
     }
 
 private:
@@ -103,20 +94,18 @@ const char* RealTypes() { return Expected("%-4g", 200.0) == "200 " ? "fFeEgG" : 
 TEST(Format, IntegersEqualTheCLibrary) {
     RandomFormats formats(1);
     for (int i = 0; i < 40000; ++i) {
-        const std::string format = formats.Make("", "diuxXo");
-        const auto value = static_cast<int>(formats.Integer());
-        if (IsDefined(format)) Compare(format, value);
-        const std::string longFormat = formats.Make("ll", "diuxXo");
-        const auto longValue = static_cast<long long>(formats.Integer());
-        if (IsDefined(longFormat)) Compare(longFormat, longValue);
-        const std::string shortFormat = formats.Make(i % 2 ? "h" : "hh", "diuxXo");
-        if (IsDefined(shortFormat)) Compare(shortFormat, value);
+        const long long corners[] = {0, -1, INT_MAX, INT_MIN, LLONG_MAX, LLONG_MIN};
+        const auto value = i % 4 ? static_cast<long long>(formats.Integer()) : corners[formats.Below(6)];
+        for (const char* length : {"", "h", "hh", "ll"}) {
+            const std::string format = formats.Make(length, "diuxXo");
+            if (!IsDefined(format)) continue;
+            if (*length == 'l')
+                Compare(format, value);
+            else
+                Compare(format, static_cast<int>(value));
+        }
     }
-    for (const char* format : {"%d", "%i", "%+.0d", "%#o", "%#x", "%.0x", "% 5d", "%-5d|"})
-        for (int value : {0, 1, -1, INT_MAX, INT_MIN}) Compare(format, value);
     EXPECT_EQ(Format(L"%#.0o %#.3o %#o", 0, 8, 8), "0 010 010");
-    for (const char* format : {"%lld", "%llu", "%llx"})
-        for (long long value : {0LL, -1LL, LLONG_MAX, LLONG_MIN}) Compare(format, value);
 }
 
 TEST(Format, RealsEqualTheCLibrary) {
@@ -126,8 +115,7 @@ TEST(Format, RealsEqualTheCLibrary) {
     const double corners[] = {0.0,  -0.0, 1.0,         0.5,      1.5,       2.5,     9.9995,  1e-5,  0.0001,
                               1e15, 1e16, 123456789.0, infinity, -infinity, DBL_MAX, DBL_MIN, 5e-324};
     for (const char* format :
-         {"%f",    "%e",   "%g",     "%G",     "%E",     "%F",  "%#g",   "%#.0f",   "%#.0e",   "%.0f",    "%.0g",
-          "%8.3f", "%.4g", "%.2fms", "%08.3f", "%-12g|", "%+e", "%.17g", "%.1100f", "%.1080e", "%.1100g", "%#.1090g"})
+         {"%f", "%e", "%g", "%G", "%#g", "%#.0f", "%#.0e", "%.17g", "%.1100f", "%.1080e", "%.1100g", "%#.1090g"})
         for (double value : corners)
             if (std::strpbrk(format, RealTypes())) Compare(format, value);
     EXPECT_EQ(Format(L"%g %#g", 999999.5, 999999.5),
@@ -135,9 +123,7 @@ TEST(Format, RealsEqualTheCLibrary) {
 }
 
 TEST(Format, LocaleDoesNotMatter) {
-    bool german = false;
-    for (const char* name : {"de_DE.UTF-8", "de_DE", "German_Germany.1252", "de"})
-        if (!german) german = std::setlocale(LC_ALL, name) != nullptr;
+    for (const char* name : {"de_DE.UTF-8", "German_Germany.1252"}) std::setlocale(LC_ALL, name);
     EXPECT_EQ(Format(L"%8.3f %g", 1234.5, 0.25), "1234.500 0.25");
     std::setlocale(LC_ALL, "C");
 }
@@ -154,14 +140,10 @@ TEST(Format, RulesOfItsOwn) {
     const void* none = nullptr;
     EXPECT_EQ(Format(L"%s %hs %ls %.3hs %8hs|", none, none, none, none, none), "(null) (null) (null) (nu   (null)|");
     EXPECT_EQ(Format(L"%5.2s|%-5hs|%.1hs|%5c|%-3c|", L"abc", "xyz", "xyz", 'c', 'd'), "   ab|xyz  |x|    c|d  |");
-    EXPECT_EQ(Format(L"100%%%d%%", 5), "100%5%");
     EXPECT_EQ(Format(L"%*d|%-*d|%*d|%.*f|%.*f", 5, 1, 5, 2, -5, 3, 1, 2.25, -1, 0.5), "    1|2    |3    |2.2|0.500000");
     wchar_t out[8] = L"rest";
     EXPECT_EQ(FormatWide(out, 8, nullptr), 0u);
     EXPECT_STREQ(out, L"");
-}
-
-TEST(Format, Positions) {
     EXPECT_EQ(Format(L"%2$ls %1$d %1$x %2$.2ls", 10, L"text"), "text 10 a te");
     EXPECT_EQ(Format(L"%3$*1$.*2$f|%%|%4$hs", 8, 3, 1.5, "end"), "   1.500|%|end");
     EXPECT_EQ(Format(L"%3$d %1$lld", 1LL, 2, 3), "3 1") << "a position that nobody names passes for an int";
@@ -169,45 +151,38 @@ TEST(Format, Positions) {
 
 TEST(Format, BrokenConversionsEndTheFormatting) {
     EXPECT_EQ(Format(L"%d %n %d", 1, 2), "1 %n %d");
-    EXPECT_EQ(Format(L"%d %q %s", 1, 2, nullptr), "1 %q %s");
     EXPECT_EQ(Format(L"%d%", 1), "1%");
     EXPECT_EQ(Format(L"%1$d %d", 1, 2), "1 %d") << "positions and order do not mix";
     EXPECT_EQ(Format(L"%d %1$d", 1, 2), "1 %1$d");
     EXPECT_EQ(Format(L"%1$d %1$s", 1), "1 %1$s") << "a number is never taken for a pointer";
     EXPECT_EQ(Format(L"%33$d", 1), "%33$d");
     EXPECT_EQ(Format(L"%1$*d", 1, 2), "%1$*d");
-    EXPECT_EQ(Format(L"%5$", 1), "%5$");
     EXPECT_EQ(Format(L"%99999999999999999999$d", 1), "%99999999999999999999$d");
 }
 
 TEST(Format, BoundedAndTerminatedAtEveryCapacity) {
-    // "é" in the code page of the machine, whichever that is.
-    char narrow[8] = {};
+    char narrow[8] = {}; // "é" in the code page of the machine, whichever that is
     TAVO::Platform::WideToAnsi(L"\u00e9x", -1, narrow, 8);
-    wchar_t whole[64];
-    const std::size_t length = FormatWide(whole, 64, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0);
-    ASSERT_EQ(length, 19u);
-    EXPECT_EQ(FormatWide(nullptr, 0, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), length);
-    for (std::size_t capacity = 1; capacity <= length + 1; ++capacity) {
-        std::vector<wchar_t> out(capacity + 1, L'#');
-        EXPECT_EQ(FormatWide(out.data(), capacity, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), length);
-        for (std::size_t i = 0; i + 1 < capacity; ++i) ASSERT_EQ(out[i], whole[i]) << capacity;
-        EXPECT_EQ(out[capacity - 1], 0);
-        EXPECT_EQ(out[capacity], L'#') << "nothing behind";
+    wchar_t whole[20];
+    for (std::size_t capacity = 20; capacity < 21; --capacity) { // down to none
+        std::vector<wchar_t> cut(capacity + 1, L'#');
+        ASSERT_EQ(FormatWide(cut.data(), capacity, L"ab%5d%-4ls|%hs%.3f", 7, L"w", narrow, 1.0), 19u);
+        if (capacity == 20) std::copy_n(cut.data(), 20, whole);
+        EXPECT_EQ(cut[capacity], L'#') << "nothing behind";
+        if (capacity == 0) break;
+        EXPECT_EQ(cut[capacity - 1], 0);
+        EXPECT_TRUE(std::equal(cut.data(), cut.data() + capacity - 1, whole)) << capacity;
     }
     wchar_t out[4];
     EXPECT_EQ(FormatWide(out, 4, L"%2000000000d%-2000000000ls", 1, L""), 4000000000u) << "costs no more than what fits";
 }
 
-TEST(Format, SurvivesARefusingHeap) {
+TEST(Format, SurvivesARefusingHeapAndUnendedTexts) {
     support::ForEachFailingAllocation([] {
         wchar_t out[4];
         EXPECT_EQ(FormatWide(out, 4, L"%hs", "longer than that"), 16u);
     });
-}
-
-TEST(Format, ReadsNothingBehindAPrecision) {
     const char narrow[2] = {'a', 'b'};
     const wchar_t wide[2] = {L'a', L'b'};
-    EXPECT_EQ(Format(L"%.2hs%.2ls%.0hs", narrow, wide, narrow), "abab");
+    EXPECT_EQ(Format(L"%.2hs%.2ls%.0hs", narrow, wide, narrow), "abab") << "nothing is read behind a precision";
 }

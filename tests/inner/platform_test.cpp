@@ -27,12 +27,6 @@ int ReadLevel(const std::string& content) {
     return value;
 }
 
-std::string Utf16File(const char* text) {
-    std::string bytes = "\xFF\xFE";
-    for (; *text; ++text) (bytes += *text) += '\0';
-    return bytes;
-}
-
 } // namespace
 
 TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
@@ -40,12 +34,9 @@ TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
         const char* content;
         int value;
     } rows[] = {
-        {"[Debug]\nLevel=5\n", 5},
-        {"[Debug]\r\nLevel=5", 5},
-        {"[DEBUG]\nLEVEL=5\n", 5},
-        {"  [ Debug ] ; ours\n\t Level \t=\t 5 \t\r\n", 5},
-        {"[Debug]\nLevel=-5\n", -5},
-        {"[Debug]\nLevel=+5\n", 5},
+        {"[Debug]\nLevel=5\nLevel=6\n", 5},
+        {"[DEBUG]\r\nLEVEL=-5", -5},
+        {"  [ Debug ] ; ours\n\t Level \t=\t +5 \t\r\n", 5},
         {"[Debug]\nLevel=0x1F\n", 31},
         {"[Debug]\nLevel=0X1f\n", 0},
         {"[Debug]\nLevel=12ab\n", 12},
@@ -57,74 +48,32 @@ TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
         {"[Debug]\nLevel=4294967297\n", 1},
         {"[Debug]\nLevel 5\n", 0},
         {"[Debug]\n;Level=5\nLevel=6\n", 6},
-        {"[Debug]\nLevel=5\nLevel=6\n", 5},
-        {"[Debug]\nLevels=5\nLeve=6\n", 0},
-        {"[Debu]\nLevel=5\n[Debugs]\nLevel=6\n", 0},
+        {"[Debug]\nLevels=5\nLeve=6\n[Debugs]\nLevel=7\n[Debu]\nLevel=8", 0},
         {"Level=5\n[Other]\nLevel=6\n", 0},
         {"[Other]\nLevel=6\n[Debug]\nLevel=5\n", 5},
         {"[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
         {"\xEF\xBB\xBF[Debug]\nLevel=5\n", 5},
         {"[Debug\nLevel=5\n", 0},
-        {"[", 0},
         {"=", 0},
-        {"\n\n\r\n", 0},
-        {"", 0},
     };
     for (const auto& row : rows) EXPECT_EQ(ReadLevel(row.content), row.value) << row.content;
-    EXPECT_EQ(ReadLevel(Utf16File("[Debug]\r\nLevel=5\r\n")), 5);
-    EXPECT_EQ(ReadLevel(std::string("\xFF\xFE\x5B", 3)), 0);
+    std::string utf16 = "\xFF\xFE";
+    for (const char c : std::string("[Debug]\r\nLevel=5\r\n")) (utf16 += c) += '\0';
+    EXPECT_EQ(ReadLevel(utf16), 5);
+    EXPECT_EQ(ReadLevel(utf16.substr(0, 3)), 0);
     EXPECT_EQ(Platform::ReadConfigurationInteger(L"/no/such file.ini", L"Debug", L"Level"), 0);
-}
 
-TEST(ConfigurationFile, ReadsNothingBehindACut) {
     const std::string content = "[Debug]\nA=1\nLevel=\"0x15\"";
     for (std::size_t length = 0; length < content.size() - 5; ++length)
-        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0);
-}
-
-TEST(CodePage, FollowsTheCallProtocol) {
-    wchar_t wide[8];
-    char narrow[8];
-    EXPECT_EQ(Platform::AnsiToWide("abc", -1, nullptr, 0), 4) << "with the terminator";
-    EXPECT_EQ(Platform::AnsiToWide("abc", -7, wide, 4), 4) << "any negative length";
-    EXPECT_STREQ(wide, L"abc");
-    EXPECT_EQ(Platform::AnsiToWide("abc", -1, wide, 3), 0) << "too small";
-    EXPECT_EQ(Platform::AnsiToWide("abc", 2, wide, 2), 2) << "no terminator";
-    EXPECT_EQ(Platform::AnsiToWide("abc", 0, wide, 8), 0);
-    EXPECT_EQ(Platform::AnsiToWide("abc", -1, wide, -1), 0);
-    EXPECT_EQ(Platform::AnsiToWide(nullptr, -1, wide, 8), 0);
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", -1, nullptr, 0), 4);
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", -7, narrow, 4), 4);
-    EXPECT_STREQ(narrow, "abc");
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", -1, narrow, 3), 0);
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", 2, narrow, 2), 2);
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", 0, narrow, 8), 0);
-    EXPECT_EQ(Platform::WideToAnsi(L"abc", -1, narrow, -1), 0);
-    EXPECT_EQ(Platform::WideToAnsi(nullptr, -1, narrow, 8), 0);
-}
-
-TEST(Memory, TellsReadableFromUnreadable) {
-    static const char constant[] = "x";
-    int local = 0;
-    EXPECT_TRUE(Platform::IsReadable(constant));
-    EXPECT_TRUE(Platform::IsReadable(&local));
-    EXPECT_FALSE(Platform::IsReadable(nullptr));
-    EXPECT_FALSE(Platform::IsReadable(reinterpret_cast<void*>(16)));
-    EXPECT_FALSE(Platform::IsReadable(reinterpret_cast<void*>(~std::uintptr_t{0}))) << "the system's half";
+        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0) << "cut at " << length;
 }
 
 TEST(Threads, HaveTheirOwnIdentityPriorityAndScope) {
-    const std::uint32_t self = Platform::GetThreadId();
-    EXPECT_NE(self, 0u);
-    EXPECT_EQ(Platform::GetThreadId(), self);
     int scope = 0;
     Platform::SetReleaseScope(&scope);
-    std::thread([&] {
-        EXPECT_NE(Platform::GetThreadId(), 0u);
+    std::thread([self = Platform::GetThreadId()] {
         EXPECT_NE(Platform::GetThreadId(), self);
         EXPECT_EQ(Platform::GetReleaseScope(), nullptr);
-        int other = 0;
-        Platform::SetReleaseScope(&other);
         for (int level : {-15, -2, 1, 0}) {
             Platform::SetThreadPriority(level);
             EXPECT_EQ(Platform::GetThreadPriority(), level) << "a lowered thread can be raised again";
@@ -132,16 +81,12 @@ TEST(Threads, HaveTheirOwnIdentityPriorityAndScope) {
     }).join();
     EXPECT_EQ(Platform::GetReleaseScope(), &scope);
     Platform::SetReleaseScope(nullptr);
-    EXPECT_EQ(Platform::GetThreadPriority(), 0);
 }
 
 TEST(Modules, TellATruncatedPath) {
     wchar_t whole[1024];
     bool truncated = true;
     const std::size_t length = Platform::GetModulePath(Platform::Module::Executable, whole, 1024, truncated);
-    ASSERT_GT(length, 16u);
-    EXPECT_FALSE(truncated);
-    EXPECT_EQ(whole[length], 0);
     for (std::size_t capacity : {length + 1, length, std::size_t{8}}) {
         std::vector<wchar_t> cut(capacity + 1, L'#');
         const std::size_t kept = Platform::GetModulePath(Platform::Module::Executable, cut.data(), capacity, truncated);
@@ -150,14 +95,4 @@ TEST(Modules, TellATruncatedPath) {
         EXPECT_EQ(cut[kept], 0);
         EXPECT_EQ(cut[capacity], L'#');
     }
-}
-
-TEST(Modules, CanBeHeldAndDropped) {
-    void* first = Platform::HoldLibrary();
-    void* second = Platform::HoldLibrary();
-    EXPECT_NE(first, nullptr);
-    EXPECT_EQ(first, second);
-    Platform::DropLibrary(second);
-    Platform::DropLibrary(first);
-    Platform::DropLibrary(nullptr);
 }

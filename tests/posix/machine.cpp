@@ -3,7 +3,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
-#include <fstream>
 #include <pthread.h>
 #include <sys/ptrace.h>
 #include <sys/wait.h>
@@ -17,42 +16,22 @@ extern "C" __attribute__((visibility("default"))) const char* __asan_default_opt
 
 namespace support {
 
-LibraryCopy::LibraryCopy(const std::string& name, const char* configuration) {
-    char folder[] = "/tmp/tavo_copy_XXXXXX";
-    if (!mkdtemp(folder)) return;
-    m_folder = folder;
-    m_library = m_folder + "/" + name + ".so.1.2"; // with version digits, as installed
-    m_configuration = m_folder + "/" + name + ".ini";
-    Dl_info info;
-    if (!dladdr(reinterpret_cast<void*>(&TAVO::Core::OS::_falloc), &info)) return;
-    std::ofstream(m_library, std::ios::binary) << std::ifstream(info.dli_fname, std::ios::binary).rdbuf();
-    if (configuration) std::ofstream(m_configuration, std::ios::binary) << configuration;
-    m_module = dlopen(m_library.c_str(), RTLD_NOW | RTLD_LOCAL);
+const char* const kModuleEnding = ".so";
+const char* const kCopyEnding = ".so.1.2";
+
+std::filesystem::path LibraryPath() {
+    Dl_info info = {};
+    dladdr(reinterpret_cast<void*>(&TAVO::Core::OS::_falloc), &info);
+    return info.dli_fname;
+}
+
+Module::Module(const std::filesystem::path& file) : m_module(dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL)) {
     if (!m_module) std::fprintf(stderr, "%s\n", dlerror());
 }
-
-LibraryCopy::~LibraryCopy() {
-    if (m_module) dlclose(m_module);
-    unlink(m_library.c_str());
-    unlink(m_configuration.c_str());
-    rmdir(m_folder.c_str());
-}
-
-void* LibraryCopy::FindSymbol(const char* name, const char*) const { return dlsym(m_module, name); }
-
-Plugin::Plugin(const char* name) {
-    char program[4096] = {};
-    if (readlink("/proc/self/exe", program, sizeof program - 1) < 0) program[0] = 0;
-    const std::string folder(program, std::string(program).rfind('/') + 1);
-    m_module = dlopen((folder + name + ".so").c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (!m_module) std::fprintf(stderr, "%s\n", dlerror());
-}
-
-Plugin::~Plugin() {
+Module::~Module() {
     if (m_module) dlclose(m_module);
 }
-
-void* Plugin::FindSymbol(const char* name) const { return m_module ? dlsym(m_module, name) : nullptr; }
+void* Module::FindSymbol(const char* name, const char*) const { return m_module ? dlsym(m_module, name) : nullptr; }
 
 namespace {
 
@@ -62,18 +41,9 @@ int FollowChild(pid_t child) {
     while (waitpid(child, &status, 0) == child) {
         if (WIFEXITED(status)) return WEXITSTATUS(status);
         if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
-        const int signal = WSTOPSIG(status) == SIGTRAP ? 0 : WSTOPSIG(status);
-        ptrace(PTRACE_CONT, child, nullptr, signal);
+        ptrace(PTRACE_CONT, child, nullptr, WSTOPSIG(status) == SIGTRAP ? 0 : WSTOPSIG(status));
     }
     return -1;
-}
-
-std::string ReadToEnd(int descriptor) {
-    std::string text;
-    char piece[4096];
-    for (ssize_t got; (got = read(descriptor, piece, sizeof piece)) > 0;)
-        text.append(piece, static_cast<std::size_t>(got));
-    return text;
 }
 
 } // namespace
@@ -94,7 +64,9 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
     }
     close(ends[1]);
     exitCode = FollowChild(child); // the texts of a test are small enough to wait in the pipe
-    const std::string text = ReadToEnd(ends[0]);
+    std::string text;
+    char piece[4096];
+    for (ssize_t got; (got = read(ends[0], piece, sizeof piece)) > 0;) text.append(piece, piece + got);
     close(ends[0]);
     return text;
 }

@@ -1,52 +1,65 @@
 #pragma once
-// What the tests need of the machine: copies of the library with a configuration of their own, plug-ins and
-// child processes.
+// What the tests need of the machine: copies of the library with a configuration of their own, plug-ins, a process
+// under a debugger and threads with small stacks.
 
-#include <cstddef>
+#include <filesystem>
+#include <fstream>
 #include <functional>
+#include <random>
 #include <string>
 
 namespace support {
 
-// The library copied as `name` + the system's extension into a fresh folder, beside a configuration file with this
-// text, and loaded. Null text: no file.
-class LibraryCopy {
-public:
-    LibraryCopy(const std::string& name, const char* configuration);
-    ~LibraryCopy();
-    LibraryCopy(const LibraryCopy&) = delete;
-    LibraryCopy& operator=(const LibraryCopy&) = delete;
+extern const char* const kModuleEnding; // of a file name
+extern const char* const kCopyEnding;   // with version digits where they are usual
 
-    // The copy's function of that C++ name; `windowsName` where its parameters make it another.
+std::filesystem::path LibraryPath(); // of the library under test, which stands beside the program
+
+// A library that is loaded; Find gives null when it could not be.
+class Module {
+public:
+    explicit Module(const std::filesystem::path& file);
+    ~Module();
+    Module(const Module&) = delete;
+    Module& operator=(const Module&) = delete;
+
+    // Its function of that linker's name; `windowsName` where its parameters make it another.
     template <class Function> Function Find(const char* name, const char* windowsName = nullptr) const {
         return reinterpret_cast<Function>(FindSymbol(name, windowsName ? windowsName : name));
     }
-    bool IsLoaded() const { return m_module != nullptr; }
 
 private:
     void* FindSymbol(const char* name, const char* windowsName) const;
 
-    std::string m_folder, m_library, m_configuration;
-    void* m_module = nullptr;
+    void* m_module;
 };
 
-// A plug-in of the tests: the library `name` beside this program, loaded by its full path.
-class Plugin {
-public:
-    explicit Plugin(const char* name);
-    ~Plugin();
-    Plugin(const Plugin&) = delete;
-    Plugin& operator=(const Plugin&) = delete;
+// A plug-in of the tests.
+struct Plugin : Module {
+    explicit Plugin(const char* name) : Module(LibraryPath().replace_filename(std::string(name) + kModuleEnding)) {}
+};
 
-    // Its C function of that name; null when there is none or the plug-in was not loaded.
-    template <class Function> Function Find(const char* name) const {
-        return reinterpret_cast<Function>(FindSymbol(name));
+struct FreshFolder {
+    const std::filesystem::path folder =
+        std::filesystem::temp_directory_path() / ("tavo_copy_" + std::to_string(std::random_device()()));
+    FreshFolder() { std::filesystem::create_directory(folder); }
+    ~FreshFolder() {
+        std::error_code ignored;
+        std::filesystem::remove_all(folder, ignored);
     }
+};
+
+// The library copied as `name` + the system's ending into a fresh folder, beside a configuration file with this text,
+// and loaded. Null text: no file.
+struct LibraryCopy : FreshFolder, Module {
+    LibraryCopy(const std::string& name, const char* configuration) : Module(Copy(name, configuration)) {}
 
 private:
-    void* FindSymbol(const char* name) const;
-
-    void* m_module;
+    std::filesystem::path Copy(const std::string& name, const char* configuration) const {
+        if (configuration) std::ofstream(folder / (name + ".ini"), std::ios::binary) << configuration;
+        std::filesystem::copy_file(LibraryPath(), folder / (name + kCopyEnding));
+        return folder / (name + kCopyEnding);
+    }
 };
 
 // Runs this program again, under a debugger that lets it run, with one (disabled) test only. Gives what reached the

@@ -59,17 +59,10 @@ private:
 
     void Damage(Bytes& text) {
         const std::size_t at = Below(static_cast<std::uint32_t>(text.size()));
-        switch (Below(3)) {
-        case 0:
-            text[at] = static_cast<unsigned char>(Below(256));
-            break;
-        case 1:
-            text.erase(text.begin() + static_cast<std::ptrdiff_t>(at));
-            break;
-        default:
-            text[at] = static_cast<unsigned char>(0xC0 + Below(0x40));
-            break;
-        }
+        const std::uint32_t how = Below(3);
+        if (how == 0) text.erase(text.begin() + static_cast<std::ptrdiff_t>(at));
+        if (how == 1) text[at] = static_cast<unsigned char>(Below(256));
+        if (how == 2) text[at] = static_cast<unsigned char>(0xC0 + Below(0x40));
     }
 
     std::mt19937 m_random;

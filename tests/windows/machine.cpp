@@ -1,53 +1,24 @@
 #include "support/machine.h"
 
 #include <cstdlib>
-#include <fstream>
 #include <windows.h>
 
 namespace support {
 
-LibraryCopy::LibraryCopy(const std::string& name, const char* configuration) {
-    char temporary[MAX_PATH];
-    char folder[MAX_PATH];
-    GetTempPathA(MAX_PATH, temporary);
-    if (!GetTempFileNameA(temporary, "tav", 0, folder)) return;
-    DeleteFileA(folder);
-    CreateDirectoryA(folder, nullptr);
-    m_folder = folder;
-    m_library = m_folder + "\\" + name + ".dll";
-    m_configuration = m_folder + "\\" + name + ".ini";
-    char library[MAX_PATH];
-    GetModuleFileNameA(GetModuleHandleA("TAVO.dll"), library, MAX_PATH);
-    if (!CopyFileA(library, m_library.c_str(), FALSE)) return;
-    if (configuration) std::ofstream(m_configuration, std::ios::binary) << configuration;
-    m_module = LoadLibraryA(m_library.c_str());
+const char* const kModuleEnding = ".dll";
+const char* const kCopyEnding = ".dll";
+
+std::filesystem::path LibraryPath() {
+    wchar_t path[MAX_PATH] = L"";
+    GetModuleFileNameW(GetModuleHandleW(L"TAVO.dll"), path, MAX_PATH);
+    return path;
 }
 
-LibraryCopy::~LibraryCopy() {
-    if (m_module) FreeLibrary(static_cast<HMODULE>(m_module));
-    DeleteFileA(m_library.c_str());
-    DeleteFileA(m_configuration.c_str());
-    RemoveDirectoryA(m_folder.c_str());
-}
-
-void* LibraryCopy::FindSymbol(const char*, const char* windowsName) const {
-    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_module), windowsName));
-}
-
-Plugin::Plugin(const char* name) {
-    wchar_t path[MAX_PATH];
-    const DWORD length = GetModuleFileNameW(nullptr, path, MAX_PATH);
-    std::wstring file(path, length);
-    file.resize(file.rfind(L'\\') + 1);
-    for (; *name; ++name) file += static_cast<wchar_t>(*name);
-    m_module = LoadLibraryW((file + L".dll").c_str());
-}
-
-Plugin::~Plugin() {
+Module::Module(const std::filesystem::path& file) : m_module(LoadLibraryW(file.c_str())) {}
+Module::~Module() {
     if (m_module) FreeLibrary(static_cast<HMODULE>(m_module));
 }
-
-void* Plugin::FindSymbol(const char* name) const {
+void* Module::FindSymbol(const char*, const char* name) const {
     return m_module ? reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_module), name)) : nullptr;
 }
 
@@ -66,27 +37,14 @@ std::string FollowChild(HANDLE process, int& exitCode) {
     DEBUG_EVENT event;
     while (WaitForDebugEvent(&event, 60000)) {
         DWORD how = DBG_CONTINUE;
-        switch (event.dwDebugEventCode) {
-        case OUTPUT_DEBUG_STRING_EVENT:
-            text += ReadText(process, event.u.DebugString);
-            break;
-        case CREATE_PROCESS_DEBUG_EVENT:
-            CloseHandle(event.u.CreateProcessInfo.hFile);
-            break;
-        case LOAD_DLL_DEBUG_EVENT:
-            if (event.u.LoadDll.hFile) CloseHandle(event.u.LoadDll.hFile);
-            break;
-        case EXCEPTION_DEBUG_EVENT:
-            if (event.u.Exception.ExceptionRecord.ExceptionCode != static_cast<DWORD>(EXCEPTION_BREAKPOINT))
-                how = DBG_EXCEPTION_NOT_HANDLED;
-            break;
-        case EXIT_PROCESS_DEBUG_EVENT:
-            exitCode = static_cast<int>(event.u.ExitProcess.dwExitCode);
-            break;
-        }
-        const bool last = event.dwDebugEventCode == EXIT_PROCESS_DEBUG_EVENT;
+        const DWORD code = event.dwDebugEventCode;
+        if (code == OUTPUT_DEBUG_STRING_EVENT) text += ReadText(process, event.u.DebugString);
+        if (code == EXCEPTION_DEBUG_EVENT &&
+            event.u.Exception.ExceptionRecord.ExceptionCode != static_cast<DWORD>(EXCEPTION_BREAKPOINT))
+            how = DBG_EXCEPTION_NOT_HANDLED;
+        if (code == EXIT_PROCESS_DEBUG_EVENT) exitCode = static_cast<int>(event.u.ExitProcess.dwExitCode);
         ContinueDebugEvent(event.dwProcessId, event.dwThreadId, how);
-        if (last) break;
+        if (code == EXIT_PROCESS_DEBUG_EVENT) break;
     }
     return text;
 }

@@ -21,7 +21,6 @@ TEST(Unload, GivesTheThreadSlotBack) {
     DWORD unused = 0;
     {
         const support::LibraryCopy copy("Slots", nullptr);
-        ASSERT_TRUE(copy.IsLoaded());
         const auto make = copy.Find<NewBlock>("", "_ZN4TAVO7Buffers14CPObjectMemory8NewBlockEyyPKNS0_11tagCPOVTABLE");
         const auto free = copy.Find<Free>("", "_ZN4TAVO7Buffers14CPObjectMemory4FreeEPNS0_15tagCPOMEMHEADERE");
         ASSERT_NE(make, nullptr);
