@@ -35,12 +35,6 @@ void Sweep(int times = 1) {
     for (int i = 0; i < times; ++i) EXPECT_TRUE(CStringPool::Collect(60000));
 }
 
-// What stands in an entry, its terminator left out.
-Wide UnitsOf(const CPPoolString& text, std::size_t count) {
-    const wchar_t* units = text;
-    EXPECT_EQ(units[count], 0);
-    return Wide(units, units + count);
-}
 const wchar_t* Entry(const CPPoolString& text) { return text; }
 
 // --- keys, computed slowly -------------------------------------------------------------------------------------------
@@ -89,11 +83,7 @@ std::optional<Expected> Read(const Bytes& text, std::size_t n) {
     std::size_t i = 0;
     while (i < text.size() && i < n) {
         const unsigned lead = text[i];
-        static constexpr std::pair<unsigned, unsigned> kSizes[] = {{0x80, 1}, {0xC0, 0}, {0xE0, 2},
-                                                                   {0xF0, 3}, {0xF5, 4}, {0x100, 0}};
-        std::size_t size = 0;
-        for (auto row = std::end(kSizes); row-- != kSizes;)
-            if (lead < row->first) size = row->second;
+        const std::size_t size = lead < 0x80 ? 1 : lead < 0xC0 || lead > 0xF4 ? 0 : 2 + (lead >= 0xE0) + (lead >= 0xF0);
         if (size == 0) return {};
         unsigned value = size == 1 ? lead : lead & (0x7Fu >> size);
         for (std::size_t k = 1; k < size; ++k) {
@@ -122,7 +112,9 @@ std::string Wrong(const CPPoolString& text, const std::optional<Expected>& expec
     if (text.UTF8Size() != expected->utf8Size) return "UTF-8 size";
     if (text.sHash() != Checksum(expected->values, false)) return "hash";
     if (text.sHashi() != Checksum(expected->values, true)) return "hash regardless of case";
-    if (UnitsOf(text, expected->units.size()) != expected->units) return "units";
+    const wchar_t* units = text;
+    if (units[expected->units.size()] || !std::equal(expected->units.begin(), expected->units.end(), units))
+        return "units";
     return text.Verify() ? "" : "verify";
 }
 
@@ -161,42 +153,14 @@ TEST(PoolKeys, FollowTheRulesForEveryText) {
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, source.Utf8(length), i % 16 == 0));
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, source.Utf16(length), i % 16 == 0));
     }
-    EXPECT_EQ(assertions.Take(), Texts());
-}
-
-TEST(PoolKeys, FollowTheRulesForChosenTexts) {
-    const support::GuardedMemory memory;
-    for (const Units& text : std::initializer_list<Units>{
-             {'a'},
-             {'A', 'b', 'C', 'd', 'E', 'f', 'G', 'h', 'Z', '[', '@', 'z', '{', '`'},
-             {0x41, 0xD83D, 0xDE00, 0x42},
-             {0xD800, 0xDC00},
-             {0xD83D, 0xDBFF},
-             {0xD83D, 0xE000, 0xD83D, 0xFFFF},
-             {'a', 'b', 'c', 'd', 'e', 'f', 'g', 'h', 'i', 'j', 0xD83D, 0xDE00},
-             {'a', 0xDC00, 'b'},
-             {'a', 0xD83D},
-             {0xD7FF, 0xE000, 0xFFFF, 0x7F, 0x80, 0x7FF, 0x800, 0x141, 0x4100},
-             {0xC1, 0xC0, 0x41C0, 0x410},
-         })
+    for (const Units& text : {Units{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'}, Units{0xD800, 0xDC00},
+                              Units{0xD83D, 0xDBFF}, Units{0xD83D, 0xE000, 0xD83D, 0xFFFF}, Units{'a', 0xDC00, 'b'},
+                              Units{'a', 0xD83D}, Units{0xC1, 0xC0, 0x41C0, 0x410}})
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, text, true));
-    for (const char* text :
-         {"a", "Abc", "\xC1\x81", "\xC0\x80", "x\xC0\x80y", "\xED\xA0\x80", "\xED\xA0\x80\xED\xB0\x80",
-          "\xF0\x9F\x98\x80", "\xF4\x8F\xBF\xBF", "\xF4\x90\x80\x80", "\xF0\x80\x81\x81", "\x80", "ab\xE4\xB8",
-          "ab\xE4\xB8\xAD", "abcd\xFF", "ABCDEFGH\xC3\x84IJKLMNOP",
-          "\xF0\x9F\x98\x80"
-          "ABC"}) {
-        const std::string bytes(text);
-        ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(bytes.begin(), bytes.end()), true)) << text;
-    }
-}
-
-TEST(PoolKeys, PairsDoNotMeetTheirUtf8FormIntended) {
-    EXPECT_EQ(Entry(CPPoolString(L"Gr\u00FC\u00DF \u4E2D")),
-              Entry(CPPoolString(Utf8("Gr\xC3\xBC\xC3\x9F \xE4\xB8\xAD"))));
-    const wchar_t pair[] = {0xD83D, 0xDE00, 0};
-    const CPPoolString utf8(Utf8("\xF0\x9F\x98\x80"));
-    EXPECT_NE(Entry(CPPoolString(pair)), Entry(utf8));
+    for (const std::string text : {"\xC1\x81", "x\xC0\x80y", "\xED\xA0\x80\xED\xB0\x80", "\xF4\x8F\xBF\xBF",
+                                   "\xF4\x90\x80\x80", "\xF0\x80\x81\x81", "\x80", "ab\xE4\xB8", "abcd\xFF"})
+        ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(text.begin(), text.end()), true)) << text;
+    EXPECT_EQ(assertions.Take(), Texts());
 }
 
 TEST(PoolKeys, OverlongFormMeetsItsShortForm_Intended) {
@@ -208,7 +172,6 @@ TEST(PoolKeys, OverlongFormMeetsItsShortForm_Intended) {
     const CPPoolString overlong(Utf8("\xC1\x81")), shortForm(L"A");
     EXPECT_EQ(Entry(shortForm), Entry(overlong));
     EXPECT_EQ(shortForm.UTF8Size(), 2u) << "who came first decides";
-    EXPECT_EQ(*static_cast<const unsigned char*>(shortForm), 0);
 }
 
 // --- ten units -------------------------------------------------------------------------------------------------------
@@ -224,29 +187,12 @@ TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
     for (std::size_t at = 0; at < 20; ++at) {
         Wide text(30, L'\u4000'), twin = WithGenerator(text, at);
         const CPPoolString first(Terminated(text)), second(Terminated(twin));
-        ASSERT_EQ(first.sHash(), second.sHash());
-        ASSERT_EQ(first.sHashi(), second.sHashi());
+        ASSERT_TRUE(first.sHash() == second.sHash() && first.sHashi() == second.sHashi());
         EXPECT_EQ(Entry(first) == Entry(second), at >= 10) << at;
-        EXPECT_EQ(UnitsOf(second, 30)[at] == text[at], at >= 10);
+        EXPECT_EQ(Entry(second)[at] == text[at], at >= 10);
         EXPECT_EQ(Entry(CStringPool::GetStringRefi(twin.data())), Entry(second));
         EXPECT_TRUE(CStringPool::Verify());
     }
-}
-
-TEST(PoolTenUnits, ManyTwinsInOneBucketStayApart) {
-    std::vector<CPPoolString> twins;
-    for (unsigned mask = 0; mask < 32; ++mask) {
-        Wide text(40, L'\u4000');
-        for (std::size_t bit = 0; bit < 5; ++bit)
-            if (mask >> bit & 1) text = WithGenerator(text, bit);
-        const CPPoolString twin(Terminated(text));
-        for (const auto& other : twins) ASSERT_TRUE(Entry(other) != Entry(twin) && other.sHash() == twin.sHash());
-        twins.push_back(twin);
-    }
-    twins.erase(twins.begin(), twins.begin() + 20);
-    Sweep(2);
-    for (const auto& twin : twins) EXPECT_EQ(Entry(CStringPool::QueryStringRef(Entry(twin))), Entry(twin));
-    EXPECT_TRUE(CStringPool::Verify());
 }
 
 TEST(PoolTenUnits, CapitalsThatCancelOutKeepTheirGroup) {
@@ -255,17 +201,14 @@ TEST(PoolTenUnits, CapitalsThatCancelOutKeepTheirGroup) {
                                        L"qqqqqqqqqQqQqqqqQqQQQQqqqqQQQqqqqQQQQqQqQQQqQqQqqQQQQqQqQqqqQQqQQqQqqQqqQQ"};
     for (const int first : {0, 1}) {
         CPPoolString one(variants[first]);
-        EXPECT_EQ(Entry(CStringPool::QueryStringRefi(variants[!first])), Entry(one));
         CPPoolString two(variants[!first]);
-        ASSERT_EQ(one.sHash(), two.sHash());
-        ASSERT_NE(Entry(one), Entry(two));
+        ASSERT_TRUE(one.sHash() == two.sHash() && Entry(one) != Entry(two));
         for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(one));
         one.free();
         Sweep(2);
         for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(two));
         two.free();
         Sweep(2);
-        EXPECT_TRUE(CStringPool::QueryStringRefi(variants[0]).isnull());
     }
 }
 
@@ -277,9 +220,7 @@ TEST(Pool, NullAndEmptyTextsHaveTheirOwnEntries) {
     const support::FailingHeap heap(0);
     for (const std::size_t n : {std::size_t{0}, std::size_t{5}, kAll}) {
         EXPECT_TRUE(CStringPool::GetStringRefn(noWide, n).isnull() && CStringPool::GetStringRefni(noUtf8, n).isnull());
-        EXPECT_TRUE(CStringPool::QueryStringRefni(noWide, n).isnull());
-        EXPECT_TRUE(CStringPool::GetStringRefn(L"", n).isempty() && CStringPool::QueryStringRefn(L"", n).isempty());
-        EXPECT_TRUE(CStringPool::GetStringRefni(Utf8(""), n).isempty() && CStringPool::GetStringRef(L"").isempty());
+        EXPECT_TRUE(CStringPool::GetStringRefn(L"", n).isempty() && CStringPool::GetStringRefni(Utf8(""), n).isempty());
     }
     EXPECT_TRUE(CStringPool::GetStringRef(noWide).isnull() && CStringPool::QueryStringRefi(noUtf8).isnull());
     EXPECT_TRUE(CStringPool::GetStringRef(static_cast<IStringSubmitter*>(nullptr)).isnull());
@@ -308,37 +249,25 @@ TEST(Pool, CaseGroupsAnswerTheEarliestVariant) {
 
 bool IsKept(const wchar_t* text) { return !CStringPool::QueryStringRef(text).isnull(); }
 
-TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweep) {
+TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweepInARow) {
     Sweep(2);
-    const auto items = CStringPool::GetNItems();
-    const auto size = CStringPool::GetSize();
-    CPPoolString text(L"swept at the second sweep");
+    const auto items = CStringPool::GetNItems(), size = CStringPool::GetSize();
+    CPPoolString text(L"swept");
     const auto without = support::LiveBlocks();
-    EXPECT_EQ(*static_cast<const unsigned char*>(text), 's');
-    EXPECT_EQ(support::LiveBlocks(), without + 1);
-    EXPECT_TRUE(CStringPool::GetNItems() == items + 1 && CStringPool::GetSize() > size);
-    Sweep(3);
-    EXPECT_EQ(support::LiveBlocks(), without + 1) << "held";
-    text.free();
+    for (int times = 0; times < 2; ++times) {
+        text = L"swept"; // the second time: between the sweeps
+        EXPECT_EQ(*static_cast<const unsigned char*>(text), 's');
+        EXPECT_TRUE(CStringPool::GetNItems() == items + 1 && CStringPool::GetSize() > size);
+        Sweep(3);
+        EXPECT_EQ(support::LiveBlocks(), without + 1) << "held";
+        text.free();
+        Sweep();
+        EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
+        EXPECT_TRUE(IsKept(L"swept")) << "a look-up does not prolong its life";
+    }
     Sweep();
-    EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
-    EXPECT_TRUE(IsKept(L"swept at the second sweep")) << "a look-up does not prolong its life";
-    Sweep();
-    EXPECT_FALSE(IsKept(L"swept at the second sweep"));
+    EXPECT_FALSE(IsKept(L"swept"));
     EXPECT_TRUE(CStringPool::GetNItems() == items && CStringPool::GetSize() == size);
-}
-
-TEST(PoolSweep, StartsAnewWhenAnEntryWasHeldMeanwhile) {
-    CPPoolString text(L"held meanwhile");
-    text.free();
-    Sweep();
-    text = L"held meanwhile";
-    Sweep();
-    text.free();
-    Sweep();
-    EXPECT_TRUE(IsKept(L"held meanwhile"));
-    Sweep();
-    EXPECT_FALSE(IsKept(L"held meanwhile"));
     EXPECT_EQ(Entry(CStringPool::QueryStringRef(L"true")), Entry(CPPoolString::ptrue)) << "never taken";
     EXPECT_EQ(Wrong(CPPoolString::pfalse, Read(Units{'f', 'a', 'l', 's', 'e'}, kAll)), "");
 }
@@ -355,24 +284,19 @@ TEST(PoolSweep, InInstalmentsReachesEveryBucket) {
 
 // --- submitters ------------------------------------------------------------------------------------------------------
 
-class Submitter : public IStringSubmitter {
-public:
-    Submitter(std::size_t announced, Wide text, bool result = true, bool throws = false)
-        : m_announced(announced), m_text(std::move(text)), m_result(result), m_throws(throws) {}
-    std::size_t GetStringLen() override { return m_announced; }
+struct Submitter : IStringSubmitter {
+    Submitter(std::size_t announced, Wide text, int how = 1) : announced(announced), text(std::move(text)), how(how) {}
+    std::size_t GetStringLen() override { return announced; }
     bool GetString(wchar_t* out) override {
-        for (std::size_t i = 0; i <= m_announced; ++i) EXPECT_EQ(out[i], 0) << "room that is zeroed";
-        std::copy(m_text.begin(), m_text.end(), out);
+        for (std::size_t i = 0; i <= announced; ++i) EXPECT_EQ(out[i], 0) << "room that is zeroed";
+        std::copy(text.begin(), text.end(), out);
         // Called without the lock: another thread gets in meanwhile.
         std::thread([] { EXPECT_NE(CPPoolString(L"meanwhile").len(), 1u); }).join();
-        if (m_throws) throw 1;
-        return m_result;
+        return how < 0 ? throw 1 : how > 0;
     }
-
-private:
-    std::size_t m_announced;
-    Wide m_text;
-    bool m_result, m_throws;
+    std::size_t announced;
+    Wide text;
+    int how; // below 0: throws; 0: refuses
 };
 
 TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
@@ -387,20 +311,17 @@ TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
         {"short", {400, {'a', 'b', 'c'}}, L"abc"},
         {"ends within", {5, {'a', 0, 'c', 'd', 'e'}}, L"a"},
         {"nothing written", {5, {}}, L""},
-        {"refused", {3, {'a', 'b', 'c'}, false}, nullptr},
-        {"throwing", {3, {'a', 'b', 'c'}, true, true}, nullptr},
+        {"refused", {3, {'a', 'b', 'c'}, 0}, nullptr},
+        {"throwing", {3, {'a', 'b', 'c'}, -1}, nullptr},
         {"half a pair inside", {3, {'a', 0xD83D, 'c'}}, nullptr},
-        {"half a pair at the end", {2, {'a', 0xD83D}}, nullptr},
         {"half a pair before the end", {9, {'a', 0xD83D}}, nullptr},
         {"already there", {4, {'t', 'r', 'u', 'e'}}, L"true"},
     };
     for (Row& row : rows) {
         const CPPoolString text = CStringPool::GetStringRef(&row.submitter);
+        EXPECT_TRUE(text.Verify() && Entry(text) == Entry(CPPoolString(row.expected))) << row.name;
         EXPECT_EQ(text.isnull(), row.expected == nullptr) << row.name;
-        EXPECT_EQ(Entry(text), Entry(CPPoolString(row.expected))) << row.name;
-        EXPECT_TRUE(text.Verify()) << row.name;
     }
-    EXPECT_EQ(assertions.Take(), Texts());
     for (const std::size_t announced : {kAll, kAll / 4, std::size_t{0}}) {
         Submitter submitter(announced, {});
         EXPECT_TRUE(CStringPool::GetStringRef(&submitter).isnull());
@@ -419,18 +340,15 @@ TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
 
 TEST(Pool, VerifyFindsADamagedEntry) {
     const support::Assertions assertions;
-    const CPPoolString text(L"to be damaged"), other(L"sound");
-    EXPECT_TRUE(CStringPool::Verify());
+    const CPPoolString text(L"to be damaged");
     auto* units = const_cast<wchar_t*>(Entry(text));
     for (const std::size_t at : {0u, 6u, 12u}) {
         const wchar_t old = std::exchange(units[at], L'#');
-        EXPECT_FALSE(text.Verify());
-        EXPECT_FALSE(CStringPool::Verify());
+        EXPECT_FALSE(text.Verify() || CStringPool::Verify());
         EXPECT_EQ(assertions.Take(), (Texts{"String pool integrity violation", "String pool integrity violation"}));
         units[at] = old;
     }
-    EXPECT_TRUE(text.Verify() && other.Verify() && CPPoolString().Verify() && CStringPool::Verify());
-    EXPECT_EQ(assertions.Take(), Texts());
+    EXPECT_TRUE(text.Verify() && CPPoolString().Verify() && CStringPool::Verify());
 }
 
 TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
@@ -449,11 +367,8 @@ TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
             const CPPoolString submitted = CStringPool::GetStringRef(&submitter);
             std::size_t made = !submitted.isnull();
             for (const auto& text : texts) made += !text.isnull();
-            const bool meanwhile = IsKept(L"meanwhile");
-            EXPECT_EQ(CStringPool::GetNItems(), items + made + meanwhile);
+            EXPECT_EQ(CStringPool::GetNItems(), items + made + IsKept(L"meanwhile"));
             EXPECT_STREQ(Entry(CStringPool::QueryStringRefi(L"A TEXT THAT MAY NOT FIT")), Entry(variant));
-            const char form = static_cast<char>(*static_cast<const unsigned char*>(texts[0]));
-            EXPECT_TRUE(form == 0 || (form == 'A' && texts[0].isdef()));
         }
         EXPECT_TRUE(CStringPool::Verify());
         Sweep(2);
@@ -463,22 +378,17 @@ TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
 }
 
 TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
-    constexpr int kThreads = 4, kTexts = 64, kRounds = 3000;
     std::atomic<bool> stop{false};
     std::thread sweeper([&] {
-        while (!stop) {
-            CStringPool::Collect(1);
-            CStringPool::GetSize();
-        }
+        while (!stop) CStringPool::Collect(1), CStringPool::GetSize();
     });
     std::vector<std::thread> threads;
     std::atomic<int> wrong{0};
-    for (int t = 0; t < kThreads; ++t)
+    for (int t = 0; t < 4; ++t)
         threads.emplace_back([&, t] {
             std::vector<CPPoolString> held(8);
-            for (int i = 0; i < kRounds; ++i) {
-                const int number = (i * 7 + t * 13) % kTexts;
-                const std::string name = (i % 3 ? "Thread text " : "thread text ") + std::to_string(number);
+            for (int i = 0; i < 3000; ++i) {
+                const std::string name = (i % 3 ? "Thread " : "thread ") + std::to_string((i * 7 + t * 13) % 64);
                 const CPPoolString text(Utf8(name.c_str())), again(name.c_str());
                 wrong += Entry(text) != Entry(again);
                 wrong += !CStringPool::GetStringRefi(Utf8(name.c_str())).iequals(text);
