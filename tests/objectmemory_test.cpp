@@ -156,31 +156,31 @@ TEST_F(ObjectMemory, StaticBlocksAreNeverTouched) {
     EXPECT_EQ(g_finalized, 2) << "the two copies";
 }
 
-using Node = CPObjectMemory; // a block's payload: the handle of the next
+using Node = std::pair<CPObjectMemory, CPObjectMemory>; // a block that holds others
 void FinalizeNode(void* payload, std::size_t) {
     ++g_finalized;
     static_cast<Node*>(payload)->~Node();
 }
 constexpr tagCPOVTABL kNode{CreateNothing, nullptr, FinalizeNode, nullptr};
 
-Handle NewNode(CPObjectMemory next) {
+Handle NewNode(CPObjectMemory first, CPObjectMemory second = {}) {
     Handle node(sizeof(Node), kNode);
-    ::new (node.Payload()) Node(std::move(next));
+    ::new (node.Payload()) Node(std::move(first), std::move(second));
     return node;
 }
 
-TEST_F(ObjectMemory, ChainsAreReleasedWithoutDepth) {
+TEST_F(ObjectMemory, TreesAreReleasedWithoutDepth) {
     constexpr int kDepth = 500000;
     Handle chain;
-    for (int i = 0; i < kDepth; ++i) chain = NewNode(std::move(chain));
+    for (int i = 0; i < kDepth; ++i) chain = NewNode(std::move(chain), i % 2 ? Handle() : NewNode({}));
     // On a stack that one frame per node would overrun many times.
     std::thread([&] { chain.free(); }).join();
     CPObjectMemory list = NewNode(NewNode(NewNode({})));
     while (list.key()) {
-        const CPObjectMemory& next = *static_cast<Node*>(static_cast<Handle&>(list).Payload());
+        const CPObjectMemory& next = static_cast<Node*>(static_cast<Handle&>(list).Payload())->first;
         list = next; // the source goes with the block that it replaces
     }
-    EXPECT_EQ(g_finalized, kDepth + 3);
+    EXPECT_EQ(g_finalized, kDepth + kDepth / 2 + 3);
 }
 
 TEST_F(ObjectMemory, BlocksAreSharedBetweenThreads) {
