@@ -3,10 +3,10 @@
 #include "support/assertions.h"
 #include "support/heapwatch.h"
 
+#include <algorithm>
 #include <chrono>
 #include <functional>
 #include <gtest/gtest.h>
-#include <map>
 #include <random>
 #include <TAVO/lookup.h>
 #include <thread>
@@ -19,23 +19,27 @@ using TAVO::Buffers::CPPlainMemory;
 namespace {
 
 using Hash = unsigned long long;
-
-// An item: `value` is compared, `id` tells equal items apart.
-struct Content {
-    int value, id;
-    bool operator==(const Content& other) const { return value == other.value && id == other.id; }
-};
+using Content = std::pair<int, int>; // the value, which is compared, and an id that tells equal items apart
+using Entry = std::pair<Hash, Content>;
+using Entries = std::vector<Entry>;
+constexpr Content kNone{-1, -1};
 
 class Item : public CPPlainMemory {
 public:
-    explicit Item(const CPObjectMemory& item) : CPPlainMemory(item) {}
     Item(int value, int id) {
         if (Alloc(sizeof(Content))) *static_cast<Content*>(static_cast<void*>(*this)) = {value, id};
     }
-    const Content& operator*() const { return *static_cast<Content*>(static_cast<void*>(*this)); }
+    static Content Of(const CPObjectMemory& item) {
+        return item.key() ? *static_cast<Content*>(static_cast<void*>(static_cast<const Item&>(item))) : kNone;
+    }
 };
-const Content kNone{-1, -1};
-Content ContentOf(const CPObjectMemory& item) { return item.key() ? *Item(item) : kNone; }
+
+using Visit = std::function<bool(Hash, const CPObjectMemory&)>;
+struct Visitor : IBaseHashTableEnum {
+    explicit Visitor(Visit visit) : visit(std::move(visit)) {}
+    bool OnItem(Hash hash, const CPObjectMemory& item) override { return visit(hash, item); }
+    Visit visit;
+};
 
 class Table : public CBaseHashTable {
 public:
@@ -44,114 +48,67 @@ public:
     using CBaseHashTable::DeleteIndex;
     using CBaseHashTable::DeleteItem;
     using CBaseHashTable::DisposeTable;
-    using CBaseHashTable::EnumTableBy;
     using CBaseHashTable::FindItem;
     using CBaseHashTable::PurgeTable;
 
-    std::function<bool(const CPObjectMemory&, TAVO::ulong32 count)> disposable;
-    std::function<void(const CPObjectMemory&)> onDispose;
+    void Fill(int items, Hash hashes) {
+        for (int i = 0; i < items; ++i) AddItem(static_cast<Hash>(i) % hashes, Item(i, i), eHashKeep);
+    }
+    bool Enum(Visit visit, Hash hash = 0, bool byHash = false) {
+        Visitor visitor(std::move(visit));
+        return EnumTableBy(&visitor, hash, byHash);
+    }
+    bool Purge(Visit visit) {
+        Visitor visitor(std::move(visit));
+        return PurgeTable(&visitor);
+    }
+    Entries List(Hash hash = 0, bool byHash = false) {
+        Entries entries;
+        Enum([&](Hash h, const CPObjectMemory& item) { return entries.emplace_back(h, Item::Of(item)), true; }, hash,
+             byHash);
+        return entries;
+    }
+
+    std::function<bool(Content, TAVO::ulong32 count)> disposable = [](Content, TAVO::ulong32) { return false; };
+    std::function<void(Content, TAVO::ulong32 count)> onDispose = [](Content, TAVO::ulong32) {};
     bool compareThrows = false;
-    int compared = 0;
 
 private:
     TAVO::long32 CompareItems(const CPObjectMemory& first, const CPObjectMemory& second) override {
-        ++compared;
         if (compareThrows) throw 1;
-        return 1000 * ((*Item(first)).value - (*Item(second)).value);
+        return 1000 * (Item::Of(first).first - Item::Of(second).first);
     }
-    bool IsDisposable(CPObjectMemory item) override { return disposable ? disposable(item, item.lockcnt()) : false; }
-    void OnDispose(const CPObjectMemory& item) override {
-        if (onDispose) onDispose(item);
-    }
+    bool IsDisposable(CPObjectMemory item) override { return disposable(Item::Of(item), item.lockcnt()); }
+    void OnDispose(const CPObjectMemory& item) override { onDispose(Item::Of(item), item.lockcnt()); }
 };
 
-class Visitor : public IBaseHashTableEnum {
-public:
-    using Function = std::function<bool(Hash, const CPObjectMemory&)>;
-    explicit Visitor(Function function) : m_function(std::move(function)) {}
-    bool OnItem(Hash hash, const CPObjectMemory& item) override { return m_function(hash, item); }
-
-private:
-    Function m_function;
-};
-
-struct Entry {
-    Hash hash;
-    Content content;
-    bool operator==(const Entry& other) const { return hash == other.hash && content == other.content; }
-};
-std::ostream& operator<<(std::ostream& out, const Entry& entry) {
-    return out << "{" << std::hex << entry.hash << ", " << entry.content.value << ", " << entry.content.id << "}";
-}
-
-std::vector<Entry> EntriesOf(Table& table) {
-    std::vector<Entry> entries;
-    Visitor visitor([&](Hash hash, const CPObjectMemory& item) {
-        entries.push_back({hash, ContentOf(item)});
-        return true;
-    });
-    table.EnumTableBy(&visitor, 0, false);
-    return entries;
-}
-
-// The rules over a map in the table's order: bucket, hash, value.
-class Model {
-public:
+// The rules over a list in the table's order: bucket, hash, value.
+struct Model {
     static constexpr Hash kMask = 15;
+    Entries entries;
 
+    static bool Before(const Entry& a, const Entry& b) {
+        return std::tuple(a.first & kMask, a.first, a.second.first) <
+               std::tuple(b.first & kMask, b.first, b.second.first);
+    }
+    Entries::iterator Find(Hash hash, int value, bool anyValue = false) {
+        return std::find_if(entries.begin(), entries.end(), [&](const Entry& entry) {
+            return entry.first == hash && (anyValue || entry.second.first == value);
+        });
+    }
     Content Add(Hash hash, Content item, unsigned policy) {
-        const bool byHash = policy == eHashKeepByHash || policy == eHashReplaceByHash;
-        const auto old = byHash ? FirstOf(hash) : EqualTo(hash, item.value);
-        if (old == m_entries.end()) return Insert(hash, item);
-        if (policy == eHashKeep || policy == eHashKeepByHash) return old->second;
-        if (policy >= eHashRefuse) return kNone;
-        if (policy == eHashReplace) return old->second = item;
-        m_entries.erase(old);
-        return Insert(hash, item);
-    }
-    Content Find(Hash hash, int value) {
-        const auto found = EqualTo(hash, value);
-        return found == m_entries.end() ? kNone : found->second;
-    }
-    bool Delete(Hash hash, int value) {
-        const auto found = EqualTo(hash, value);
-        return found != m_entries.end() && (m_entries.erase(found), true);
+        const auto old = Find(hash, item.first, policy == eHashKeepByHash || policy == eHashReplaceByHash);
+        if (old != entries.end()) {
+            if (policy == eHashKeep || policy == eHashKeepByHash) return old->second;
+            if (policy >= eHashRefuse) return kNone;
+            entries.erase(old);
+        }
+        const Entry entry(hash, item); // before those that are equal
+        return entries.insert(std::lower_bound(entries.begin(), entries.end(), entry, Before), entry)->second;
     }
     template <class Test> void EraseIf(Test test) {
-        for (auto it = m_entries.begin(); it != m_entries.end();)
-            it = test(Entry{std::get<1>(it->first), it->second}) ? m_entries.erase(it) : std::next(it);
+        entries.erase(std::remove_if(entries.begin(), entries.end(), test), entries.end());
     }
-    std::vector<Entry> Entries() const {
-        std::vector<Entry> entries;
-        for (const auto& [key, content] : m_entries) entries.push_back({std::get<1>(key), content});
-        return entries;
-    }
-    std::vector<Entry> EntriesOf(Hash hash) const {
-        std::vector<Entry> entries;
-        for (const auto& entry : Entries())
-            if (entry.hash == hash) entries.push_back(entry);
-        return entries;
-    }
-
-private:
-    using Key = std::tuple<Hash, Hash, int>;
-    static Key KeyOf(Hash hash, int value) { return {hash & kMask, hash, value}; }
-    using Map = std::multimap<Key, Content>; // replacing by hash alone can leave equal items side by side
-
-    // Before those that are equal.
-    Content Insert(Hash hash, Content item) {
-        const Key key = KeyOf(hash, item.value);
-        return m_entries.emplace_hint(m_entries.lower_bound(key), key, item)->second;
-    }
-    Map::iterator EqualTo(Hash hash, int value) {
-        const auto found = m_entries.lower_bound(KeyOf(hash, value));
-        return found != m_entries.end() && found->first == KeyOf(hash, value) ? found : m_entries.end();
-    }
-    Map::iterator FirstOf(Hash hash) {
-        const auto first = m_entries.lower_bound(KeyOf(hash, -1000));
-        return first != m_entries.end() && std::get<1>(first->first) == hash ? first : m_entries.end();
-    }
-    Map m_entries;
 };
 
 TEST(HashTable, BehavesLikeTheModel) {
@@ -159,192 +116,96 @@ TEST(HashTable, BehavesLikeTheModel) {
     for (int round = 0; round < 6; ++round) {
         Table table;
         Model model;
-        // Few hashes and few buckets, many hashes in few buckets, or hashes all over.
-        const auto someHash = [&]() -> Hash {
-            switch (round % 3) {
-            case 0:
-                return random() % 5 << 60 | random() % 3;
-            case 1:
-                return random() % 300 << 4 | 7;
-            default:
-                return random();
-            }
-        };
         std::vector<Hash> used{0};
-        int id = 0;
         for (int step = 0; step < 3000; ++step) {
-            Hash hash = random() % 2 ? used[random() % used.size()] : someHash();
+            // Few hashes and few buckets, many hashes in few buckets, or hashes all over.
+            const Hash hashes[] = {random() % 5 << 60 | random() % 3, random() % 300 << 4 | 7, random()};
+            const Hash hash = random() % 2 ? used[random() % used.size()] : hashes[round % 3];
             used.push_back(hash);
-            const int value = static_cast<int>(random() % 4);
-            switch (const auto kind = random() % 64; kind) {
-            case 0: {
-                Visitor visitor([](Hash, const CPObjectMemory& item) { return ContentOf(item).id % 3 != 0; });
-                ASSERT_TRUE(table.PurgeTable(&visitor));
-                model.EraseIf([](const Entry& entry) { return entry.content.id % 3 == 0; });
-                break;
-            }
-            case 1:
+            const Item item(static_cast<int>(random() % 4), step);
+            const Content content = Item::Of(item);
+            const auto found = model.Find(hash, content.first);
+            const auto kind = random() % 64;
+            if (kind == 0) {
+                ASSERT_TRUE(table.Purge([](Hash, const CPObjectMemory& i) { return Item::Of(i).second % 3 != 0; }));
+                model.EraseIf([](const Entry& entry) { return entry.second.second % 3 == 0; });
+            } else if (kind == 1) {
                 ASSERT_TRUE(table.DeleteIndex(hash));
-                model.EraseIf([&](const Entry& entry) { return (entry.hash & Model::kMask) == (hash & Model::kMask); });
-                break;
-            case 2: {
-                table.disposable = [](const CPObjectMemory& item, TAVO::ulong32) {
-                    return ContentOf(item).id % 2 == 0;
-                };
+                model.EraseIf([&](const Entry& entry) { return ((entry.first ^ hash) & Model::kMask) == 0; });
+            } else if (kind == 2) {
+                table.disposable = [](Content disposed, TAVO::ulong32) { return disposed.second % 2 == 0; };
                 ASSERT_TRUE(table.DisposeTable(60000));
-                model.EraseIf([](const Entry& entry) { return entry.content.id % 2 == 0; });
-                break;
-            }
-            case 3:
-                if (step % 7) break;
+                model.EraseIf([](const Entry& entry) { return entry.second.second % 2 == 0; });
+            } else if (kind == 3 && step % 7 == 0) {
                 table.ClearTable();
                 model = {};
-                ASSERT_TRUE(table.DeleteItem(hash, Item(value, 0))) << "no index";
-                break;
-            default:
-                if (kind < 40) {
-                    const unsigned policy = static_cast<unsigned>(random() % 6);
-                    const Item item(value, ++id);
-                    const auto added = table.AddItem(hash, item, static_cast<eHashCollision>(policy));
-                    ASSERT_EQ(ContentOf(added), model.Add(hash, *item, policy)) << "policy " << policy;
-                } else if (kind < 52) {
-                    ASSERT_EQ(ContentOf(table.FindItem(hash, Item(value, 0))), model.Find(hash, value));
-                } else if (!model.Entries().empty()) {
-                    ASSERT_EQ(table.DeleteItem(hash, Item(value, 0)), model.Delete(hash, value));
-                }
+                ASSERT_TRUE(table.DeleteItem(hash, item) && table.DeleteIndex(hash)) << "no index";
+                ASSERT_TRUE(table.PurgeTable(nullptr) && table.DisposeTable(0));
+            } else if (kind < 40) {
+                const auto policy = static_cast<eHashCollision>(random() % 6);
+                ASSERT_EQ(Item::Of(table.AddItem(hash, item, policy)), model.Add(hash, content, policy)) << policy;
+            } else if (kind < 52 || model.entries.empty()) {
+                ASSERT_EQ(Item::Of(table.FindItem(hash, item)), found == model.entries.end() ? kNone : found->second);
+            } else {
+                ASSERT_EQ(table.DeleteItem(hash, item), found != model.entries.end());
+                if (found != model.entries.end()) model.entries.erase(found);
             }
-            if (step % 8 == 0) {
-                ASSERT_EQ(EntriesOf(table), model.Entries()) << "step " << step;
-                ASSERT_EQ(table.GetNItems(), model.Entries().size());
-                std::vector<Entry> same;
-                Visitor visitor([&](Hash found, const CPObjectMemory& item) {
-                    same.push_back({found, ContentOf(item)});
-                    return true;
-                });
-                table.EnumTableBy(&visitor, hash, true);
-                ASSERT_EQ(same, model.EntriesOf(hash));
-            }
+            if (step % 8) continue;
+            ASSERT_EQ(table.List(), model.entries) << "step " << step;
+            ASSERT_EQ(table.GetNItems(), model.entries.size());
+            Model same = model;
+            same.EraseIf([&](const Entry& entry) { return entry.first != hash; });
+            ASSERT_EQ(table.List(hash, true), same.entries);
         }
     }
 }
 
-TEST(HashTable, WithoutItemsAnswersAtOnce) {
-    Table table(10);
-    const Item item(1, 1);
-    Visitor visitor([](Hash, const CPObjectMemory&) { return true; });
-    EXPECT_EQ(table.FindItem(1, item).key(), 0u);
-    EXPECT_TRUE(table.DeleteItem(1, item));
-    EXPECT_TRUE(table.DeleteIndex(1));
-    EXPECT_FALSE(table.EnumTableBy(&visitor, 1, true));
-    EXPECT_FALSE(table.EnumTableBy(&visitor, 0, false));
-    EXPECT_TRUE(table.PurgeTable(&visitor));
-    EXPECT_TRUE(table.PurgeTable(nullptr));
-    EXPECT_TRUE(table.DisposeTable(0));
-    EXPECT_EQ(table.GetNItems(), 0u);
-    EXPECT_EQ(table.AddItem(1, CPObjectMemory(), eHashKeep).key(), 0u);
-    EXPECT_EQ(table.AddItem(1, item, eHashKeep).key(), item.key());
-    EXPECT_FALSE(table.EnumTableBy(nullptr, 0, false));
-    EXPECT_FALSE(table.DeleteItem(2, item));
-}
-
 TEST(HashTable, IndexLengthIsChecked) {
-    struct Row {
-        std::uint32_t length;
-        bool asserts;
-        Hash inSameBucket; // as 1; 0 when none is
-    };
-    for (const Row& row : {Row{4, false, 17}, Row{3, true, 9}, Row{0, true, 2}, Row{10, false, 1025}, Row{64, false, 2},
-                           Row{65, true, 3}, Row{68, true, 17}}) {
+    // A length, and a hash in the same bucket as 1; 2 when there is but one bucket.
+    const std::pair<std::uint32_t, Hash> rows[] = {{4, 17}, {3, 9}, {0, 2}, {10, 1025}, {64, 2}, {65, 3}};
+    for (const auto& [length, hash] : rows) {
         const support::Assertions assertions;
-        Table table(row.length);
-        EXPECT_EQ(assertions.Take(),
-                  row.asserts ? support::Texts{"(uDirectIndexLength >= 4) && (uDirectIndexLength <= sizeof(size_t)*8)"}
-                              : support::Texts())
-            << row.length;
-        const Item item(1, 1);
-        table.AddItem(1, item, eHashKeep);
-        table.AddItem(row.inSameBucket, item, eHashKeep);
-        table.AddItem(row.inSameBucket + 1, item, eHashKeep);
-        EXPECT_EQ(table.GetNItems(), 3u);
+        Table table(length);
+        const support::Texts text{"(uDirectIndexLength >= 4) && (uDirectIndexLength <= sizeof(size_t)*8)"};
+        EXPECT_EQ(assertions.Take(), length < 4 || length > 64 ? text : support::Texts()) << length;
+        for (const Hash one : {Hash{1}, hash, hash + 1}) table.AddItem(one, Item(1, 1), eHashKeep);
         table.DeleteIndex(1);
-        EXPECT_EQ(table.GetNItems(), row.length % 64 ? 1u : 0u) << row.length;
+        EXPECT_EQ(table.GetNItems(), length % 64 ? 1u : 0u) << length;
     }
-    Table vast(63);
-    EXPECT_EQ(vast.AddItem(1, Item(1, 1), eHashKeep).key(), 0u) << "more buckets than any memory has";
-    EXPECT_EQ(vast.GetNItems(), 0u);
+    EXPECT_EQ(Table(63).AddItem(1, Item(1, 1), eHashKeep).key(), 0u) << "more buckets than any memory has";
 }
 
-TEST(HashTable, PoliciesByHashCompareNoItems) {
+TEST(HashTable, VisitorsMayChangeTheTableStopOrThrow) {
     Table table;
-    const Item low(1, 1), high(2, 2), other(3, 3);
-    table.AddItem(5, high, eHashKeep);
-    table.AddItem(5, low, eHashKeep);
-    table.compared = 0;
-    EXPECT_EQ(table.AddItem(5, other, eHashKeepByHash).key(), low.key()) << "the first of that hash";
-    EXPECT_EQ(table.compared, 0);
-    EXPECT_EQ(table.AddItem(5, other, eHashReplaceByHash).key(), other.key());
-    EXPECT_EQ(EntriesOf(table), (std::vector<Entry>{{5, {2, 2}}, {5, {3, 3}}})) << "in order again";
-    EXPECT_EQ(low.lockcnt(), 1u);
-}
-
-TEST(HashTable, VisitorsMayChangeTheTable) {
-    const auto fill = [](Table& table) {
-        for (int i = 0; i < 20; ++i) table.AddItem(static_cast<Hash>(i % 3), Item(i, i), eHashKeep);
-    };
-    Table table;
-    fill(table);
     int visits = 0;
-    Visitor clearing([&](Hash, const CPObjectMemory& item) {
-        table.ClearTable();
-        EXPECT_EQ(item.lockcnt(), 1u) << "the walk's own";
-        return ++visits, true;
-    });
-    EXPECT_TRUE(table.EnumTableBy(&clearing, 0, false));
-    EXPECT_EQ(visits, 1);
-    fill(table);
-    Visitor purging([&](Hash, const CPObjectMemory&) { return table.ClearTable(), ++visits, false; });
-    EXPECT_TRUE(table.PurgeTable(&purging));
-    EXPECT_EQ(visits, 2);
-
-    fill(table);
-    Visitor deleting([&](Hash hash, const CPObjectMemory& item) { return table.DeleteItem(hash, item); });
-    EXPECT_TRUE(table.EnumTableBy(&deleting, 1, true));
-    fill(table);
-    Visitor counting([](Hash, const CPObjectMemory& item) {
+    EXPECT_FALSE(table.Enum([](Hash, const CPObjectMemory&) { return true; })) << "no index";
+    const auto clear = [&](Hash, const CPObjectMemory& item) {
         EXPECT_EQ(item.lockcnt(), 2u) << "the table's and the walk's";
-        return true;
-    });
-    EXPECT_TRUE(table.EnumTableBy(&counting, 0, false));
+        table.ClearTable();
+        return ++visits > 1;
+    };
+    table.Fill(20, 3);
+    EXPECT_FALSE(table.Enum(clear));
+    table.Fill(20, 3);
+    EXPECT_TRUE(table.Purge(clear));
+    EXPECT_EQ(visits, 2);
+    table.Fill(20, 3);
     int added = 100;
-    Visitor adding([&](Hash hash, const CPObjectMemory&) {
+    EXPECT_TRUE(table.Enum([&](Hash hash, const CPObjectMemory&) {
         if (added < 130) table.AddItem(hash, Item(added, added), eHashKeep), ++added;
         return true;
-    });
-    EXPECT_TRUE(table.EnumTableBy(&adding, 0, false));
+    }));
     EXPECT_EQ(added, 130);
 
-    // Rejects an entry after another one took its place.
-    Table moving;
-    for (int i = 10; i < 13; ++i) moving.AddItem(1, Item(i, i), eHashKeep);
-    Visitor rejecting([&](Hash hash, const CPObjectMemory& item) {
-        if (ContentOf(item).value == 11) moving.AddItem(hash, Item(1, 1), eHashKeep);
-        return ContentOf(item).value != 11;
-    });
-    EXPECT_TRUE(moving.PurgeTable(&rejecting));
-    EXPECT_EQ(EntriesOf(moving), (std::vector<Entry>{{1, {1, 1}}, {1, {10, 10}}, {1, {12, 12}}}));
-}
-
-TEST(HashTable, VisitorsThatStopOrThrow) {
-    Table table;
-    for (int i = 0; i < 10; ++i) table.AddItem(static_cast<Hash>(i), Item(i, i), eHashKeep);
-    int visits = 0;
-    Visitor stopping([&](Hash, const CPObjectMemory&) { return ++visits < 4; });
-    EXPECT_FALSE(table.EnumTableBy(&stopping, 0, false));
-    EXPECT_EQ(visits, 4);
-    Visitor throwing([&](Hash, const CPObjectMemory&) -> bool { return ++visits < 8 ? false : throw 1; });
-    EXPECT_FALSE(table.PurgeTable(&throwing));
-    EXPECT_EQ(table.GetNItems(), 7u) << "three were rejected, the one that threw stays";
-    EXPECT_FALSE(table.EnumTableBy(&throwing, 0, false));
+    table.ClearTable();
+    table.Fill(4, 1);
+    EXPECT_TRUE(table.Purge([&](Hash hash, const CPObjectMemory& item) { // rejects what is no longer at its place
+        if (Item::Of(item).first == 2) table.AddItem(hash, Item(-5, 1), eHashKeep);
+        return Item::Of(item).first != 2;
+    }));
+    EXPECT_EQ(table.GetNItems(), 4u);
+    EXPECT_FALSE(table.Purge([&](Hash, const CPObjectMemory&) -> bool { return ++visits < 5 ? false : throw 1; }));
+    EXPECT_EQ(table.GetNItems(), 2u) << "two were rejected, the one that threw stays";
 }
 
 TEST(HashTable, ComparisonThatThrowsFindsAndInsertsNothing) {
@@ -352,88 +213,60 @@ TEST(HashTable, ComparisonThatThrowsFindsAndInsertsNothing) {
     const Item first(1, 1), second(2, 2);
     table.AddItem(5, first, eHashKeep);
     table.compareThrows = true;
-    EXPECT_EQ(table.FindItem(5, second).key(), 0u);
-    EXPECT_EQ(table.AddItem(5, second, eHashKeep).key(), 0u);
-    EXPECT_EQ(table.AddItem(5, second, eHashReplace).key(), 0u);
+    EXPECT_TRUE(!table.FindItem(5, second).key() && !table.AddItem(5, second, eHashReplace).key());
     EXPECT_FALSE(table.DeleteItem(5, second));
-    EXPECT_EQ(table.AddItem(6, second, eHashKeep).key(), second.key()) << "nothing to compare with";
-    EXPECT_EQ(table.GetNItems(), 2u);
+    EXPECT_EQ(table.AddItem(5, second, eHashKeepByHash).key(), first.key()) << "compares no items";
     EXPECT_EQ(table.AddItem(5, second, eHashReplaceByHash).key(), second.key());
-    EXPECT_EQ(table.GetNItems(), 2u);
-}
-
-TEST(HashTable, DisposalSeesAnItemThatNobodyHoldsWithThree) {
-    Table table;
-    const Item held(1, 1);
-    table.AddItem(3, held, eHashKeep);
-    for (int i = 2; i < 6; ++i) table.AddItem(3, Item(i, i), eHashKeep);
-    std::vector<int> asked, disposed;
-    table.disposable = [&](const CPObjectMemory& item, TAVO::ulong32 count) {
-        asked.push_back(ContentOf(item).value);
-        EXPECT_EQ(count, ContentOf(item).value == 1 ? 4u : 3u);
-        return count == 3;
-    };
-    table.onDispose = [&](const CPObjectMemory& item) {
-        disposed.push_back(ContentOf(item).value);
-        EXPECT_EQ(item.lockcnt(), 2u);
-    };
-    EXPECT_TRUE(table.DisposeTable(60000));
-    EXPECT_EQ(asked, (std::vector<int>{5, 4, 3, 2, 1})) << "from the last to the first";
-    EXPECT_EQ(disposed, (std::vector<int>{5, 4, 3, 2}));
-    EXPECT_EQ(held.lockcnt(), 2u);
-    disposed.clear();
-    table.onDispose = [&](const CPObjectMemory& item) {
-        disposed.push_back(ContentOf(item).value);
-        if (disposed.size() == 1) throw 1;
-    };
-    table.AddItem(19, Item(8, 8), eHashKeep); // the same bucket, another hash
-    EXPECT_TRUE(table.DeleteIndex(3));
-    EXPECT_EQ(disposed, (std::vector<int>{1, 8}));
-    EXPECT_EQ(table.GetNItems(), 0u);
-    EXPECT_EQ(held.lockcnt(), 1u);
 }
 
 TEST(HashTable, DisposalGoesOnWhereItEnded) {
     Table table;
-    for (int i = 0; i < 16; ++i) table.AddItem(static_cast<Hash>(i), Item(i, i), eHashKeep);
+    table.Fill(16, 16);
     std::vector<int> asked;
-    bool slow = true;
-    table.disposable = [&](const CPObjectMemory& item, TAVO::ulong32) {
-        asked.push_back(ContentOf(item).value);
-        if (slow) std::this_thread::sleep_for(std::chrono::milliseconds(3));
+    table.disposable = [&](Content item, TAVO::ulong32) {
+        asked.push_back(item.first);
+        std::this_thread::sleep_for(std::chrono::milliseconds(3));
         return false;
     };
-    for (int call = 0; call < 17; ++call) EXPECT_FALSE(table.DisposeTable(0));
-    std::vector<int> expected;
-    for (int i = 0; i < 17; ++i) expected.push_back(i % 16);
-    EXPECT_EQ(asked, expected) << "one bucket a call";
-    asked.clear();
-    slow = false;
+    for (int call = 0; call < 17; ++call) {
+        EXPECT_FALSE(table.DisposeTable(0));
+        ASSERT_EQ(asked.size(), static_cast<std::size_t>(call) + 1) << "one bucket a call";
+        EXPECT_EQ(asked.back(), call % 16);
+    }
     EXPECT_TRUE(table.DisposeTable(60000));
-    ASSERT_EQ(asked.size(), 16u) << "a whole round, from wherever it begins";
-    EXPECT_EQ(asked.front(), 1);
-    EXPECT_EQ(asked.back(), 0);
+    ASSERT_EQ(asked.size(), 33u) << "a whole round, from wherever it begins";
+    EXPECT_EQ(asked[17], 1);
 }
 
-TEST(HashTable, DisposalThatThrowsOrChangesTheTable) {
+TEST(HashTable, DisposalSeesCountsMayThrowAndChangeTheTable) {
     Table table;
-    for (int i = 0; i < 16; ++i) table.AddItem(static_cast<Hash>(i), Item(i, i), eHashKeep);
-    table.disposable = [&](const CPObjectMemory& item, TAVO::ulong32) {
-        if (ContentOf(item).value == 5) throw 1;
-        return true;
+    const Item held(5, 5);
+    table.AddItem(5, held, eHashKeep);
+    table.Fill(16, 16);
+    table.disposable = [&](Content item, TAVO::ulong32 count) {
+        EXPECT_EQ(count, item.first == 5 ? 4u : 3u) << "three: nobody holds it";
+        return count == 3 ? true : throw 1;
     };
+    table.onDispose = [](Content, TAVO::ulong32 count) { EXPECT_EQ(count, 2u); };
     EXPECT_FALSE(table.DisposeTable(60000));
     EXPECT_EQ(table.GetNItems(), 11u);
     EXPECT_FALSE(table.DisposeTable(60000)) << "reaches the others first";
-    EXPECT_EQ(EntriesOf(table), (std::vector<Entry>{{5, {5, 5}}}));
+    EXPECT_EQ(table.List(), (Entries{{5, {5, 5}}}));
+
     for (int i = 0; i < 16; ++i) table.AddItem(5, Item(i, i), eHashKeep);
-    table.disposable = [](const CPObjectMemory&, TAVO::ulong32) { return true; };
-    table.onDispose = [&](const CPObjectMemory& item) {
-        if (ContentOf(item).value == 9) table.DeleteItem(5, Item(2, 0));
-        if (ContentOf(item).value == 7) table.ClearTable();
+    std::vector<int> disposed;
+    table.disposable = [](Content, TAVO::ulong32) { return true; };
+    table.onDispose = [&](Content item, TAVO::ulong32) {
+        disposed.push_back(item.first);
+        if (item.first == 13) table.DeleteItem(5, Item(2, 0));
+        if (item.first == 11) table.ClearTable();
     };
     EXPECT_TRUE(table.DisposeTable(60000));
-    EXPECT_EQ(table.GetNItems(), 0u);
+    EXPECT_EQ(disposed, (std::vector<int>{15, 14, 13, 13, 12, 11})) << "13 again: it was elsewhere after its end";
+    table.Fill(3, 1);
+    table.onDispose = [](Content, TAVO::ulong32) { throw 1; };
+    EXPECT_TRUE(table.DeleteIndex(0));
+    EXPECT_TRUE(table.GetNItems() == 0 && held.lockcnt() == 1);
 }
 
 TEST(HashTable, WithoutMemoryStaysAsItWas) {
@@ -442,12 +275,11 @@ TEST(HashTable, WithoutMemoryStaysAsItWas) {
         Model model;
         for (int i = 0; i < 40; ++i) {
             const Item item(i, i);
-            if (!item.key()) continue;
-            const auto hash = static_cast<Hash>(i % 2);
-            if (table.AddItem(hash, item, eHashReplace).key()) model.Add(hash, *item, eHashReplace);
-            EXPECT_EQ(item.lockcnt() == 2, model.Find(hash, i) == Content({i, i}));
+            const Hash hash = i % 2 ? 5 : 21;
+            if (item.key() && table.AddItem(hash, item, eHashReplace).key()) model.Add(hash, {i, i}, eHashReplace);
+            EXPECT_EQ(item.lockcnt() == 2, model.Find(hash, i) != model.entries.end());
         }
-        EXPECT_EQ(EntriesOf(table), model.Entries());
+        EXPECT_EQ(table.List(), model.entries);
     });
 }
 

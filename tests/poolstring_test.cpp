@@ -27,24 +27,10 @@ int Sign(int value) { return value < 0 ? -1 : value > 0; }
 // --- values ----------------------------------------------------------------------------------------------------------
 
 TEST(PooledString, NullEmptyAndTextDiffer) {
-    struct Row {
-        const char* name;
-        CPPoolString text;
-        bool null, empty;
-    };
-    for (const Row& row : {Row{"default", CPPoolString(), true, false}, Row{"nullptr", nullptr, true, false},
-                           Row{"null pointer", static_cast<const char*>(nullptr), true, false},
-                           Row{"empty", L"", false, true}, Row{"empty UTF-8", Utf8(""), false, true},
-                           Row{"empty ANSI", "", false, true}, Row{"text", L"x", false, false}}) {
-        EXPECT_EQ(row.text.isnull(), row.null) << row.name;
-        EXPECT_EQ(static_cast<bool>(row.text), !row.null) << row.name;
-        EXPECT_EQ(row.text.isempty(), row.empty) << row.name;
-        EXPECT_EQ(row.text.isdef(), !row.null && !row.empty) << row.name;
-        EXPECT_EQ(row.text.len(), row.text.isdef() ? 1u : 0u) << row.name;
-        EXPECT_STREQ(Entry(row.text), row.text.isdef() ? L"x" : L"") << row.name;
-        EXPECT_EQ(Utf8Of(row.text), row.text.isdef() ? "x" : "") << row.name;
-        EXPECT_TRUE(row.text.Verify());
-    }
+    for (const auto& null : {CPPoolString(), CPPoolString(nullptr), CPPoolString(static_cast<const char*>(nullptr))})
+        EXPECT_TRUE(null.isnull() && !null && !null.isempty() && !null.isdef() && null.len() == 0 && *Entry(null) == 0);
+    for (const auto& empty : {CPPoolString(L""), CPPoolString(Utf8("")), CPPoolString("")})
+        EXPECT_TRUE(!empty.isnull() && empty && empty.isempty() && !empty.isdef() && Utf8Of(empty) == "");
     EXPECT_TRUE(CPPoolString().iequals(CPPoolString(L""))) << "both hashes are 0";
 }
 
@@ -60,8 +46,6 @@ TEST(PooledString, NumbersKeepTheirLow32BitsIntended) {
           Row{-4294967295LL, L"1"}, Row{static_cast<short>(-5), L"-5"}, Row{static_cast<unsigned char>(200), L"200"},
           Row{static_cast<signed char>(-128), L"-128"}, Row{true, L"true"}, Row{false, L"false"}})
         EXPECT_STREQ(Entry(row.text), row.expected);
-    EXPECT_EQ(Entry(CPPoolString(true)), Entry(CPPoolString::ptrue));
-    EXPECT_EQ(Entry(CPPoolString(7)), Entry(CPPoolString(L"7")));
 }
 
 TEST(PooledString, HandlesMoveAndTransfer) {
@@ -70,56 +54,42 @@ TEST(PooledString, HandlesMoveAndTransfer) {
     CPPoolString moved(std::move(text));
     EXPECT_TRUE(text.isnull());
     text = std::move(moved);
-    EXPECT_TRUE(moved.isnull());
     CPPoolString& same = text;
     text = same;
     text = std::move(same);
     text.TransferFrom(same);
-    EXPECT_EQ(Entry(text), entry);
     moved = L"replaced";
     moved.TransferFrom(text);
-    EXPECT_TRUE(text.isnull());
-    EXPECT_EQ(Entry(moved), entry);
+    EXPECT_TRUE(text.isnull() && Entry(moved) == entry);
     moved.free();
     moved.free();
     EXPECT_TRUE(moved.isnull());
-    EXPECT_STREQ(Entry(copy), L"a text on its way");
     copy = Entry(copy) + 2; // its own text as the source
     EXPECT_STREQ(Entry(copy), L"text on its way");
 }
 
 TEST(PooledString, IncRaisesTheTrailingNumber) {
-    const std::pair<const wchar_t*, const wchar_t*> rows[] = {
-        {L"clip009", L"clip010"},
-        {L"clip", L"clip1"},
-        {L"", L"1"},
-        {L"9", L"10"},
-        {L"a99", L"a100"},
-        {L"0", L"1"},
-        {L"a1b", L"a1b1"},
-        {L"x0099", L"x0100"},
-        {L"18446744073709551615", L"18446744073709551616"},
-    };
-    for (const auto& [text, expected] : rows) EXPECT_STREQ(Entry(CPPoolString(text).inc()), expected);
+    using Row = std::pair<const wchar_t*, const wchar_t*>;
+    for (const auto& [text, expected] :
+         {Row{L"clip009", L"clip010"}, Row{L"clip", L"clip1"}, Row{L"", L"1"}, Row{L"a99", L"a100"},
+          Row{L"a1b", L"a1b1"}, Row{L"18446744073709551615", L"18446744073709551616"}})
+        EXPECT_STREQ(Entry(CPPoolString(text).inc()), expected);
     EXPECT_TRUE(CPPoolString().inc().isnull());
 }
 
 TEST(PooledString, Utf8FormIsMadeOnceAndOnlyWhereItFits) {
     const wchar_t onePair[] = {0xD83D, 0xDE00, 0}, between[] = {0x41, 0xD83D, 0xDE00, 0x42, 0},
                   twoPairs[] = {0xD83D, 0xDE00, 0xD83D, 0xDE00, 0};
-    struct Row {
-        CPPoolString text;
-        const char* expected;
-    };
-    for (const Row& row : {Row{L"\u00E9", "\xC3\xA9"}, Row{onePair, "\x01"}, Row{between, "\x41\x01\x42"},
-                           Row{twoPairs, ""}, Row{Utf8("\xF0\x9F\x98\x80"), ""}, Row{Utf8("\xED\xA0\x80"), ""},
-                           Row{L"\u4E2D\u6587 abc", "\xE4\xB8\xAD\xE6\x96\x87 abc"}}) {
-        EXPECT_EQ(Utf8Of(row.text), row.expected);
-        const CPPoolString same(Entry(row.text));
-        if (*row.expected) {
-            EXPECT_EQ(static_cast<const unsigned char*>(row.text), static_cast<const unsigned char*>(same));
-            EXPECT_EQ(row.text.UTF8Size(), std::string(row.expected).size());
-        }
+    const std::pair<CPPoolString, const char*> rows[] = {{onePair, "\x01"},
+                                                         {between, "\x41\x01\x42"},
+                                                         {twoPairs, ""},
+                                                         {Utf8("\xF0\x9F\x98\x80"), ""},
+                                                         {Utf8("\xED\xA0\x80"), ""},
+                                                         {L"\u4E2D\u6587 abc", "\xE4\xB8\xAD\xE6\x96\x87 abc"}};
+    for (const auto& [text, expected] : rows) {
+        EXPECT_EQ(Utf8Of(text), expected);
+        const unsigned char* const form = text;
+        EXPECT_TRUE(!*expected || form == static_cast<const unsigned char*>(CPPoolString(Entry(text)))) << expected;
     }
     const CPPoolString text(L"no memory for its UTF-8");
     {
@@ -132,8 +102,8 @@ TEST(PooledString, Utf8FormIsMadeOnceAndOnlyWhereItFits) {
 // --- comparison ------------------------------------------------------------------------------------------------------
 
 // A text as an entry and as raw text; raw null is the null string.
-const wchar_t* const kTexts[] = {nullptr,        L"",       L"a",      L"A",    L"ab",         L"aB",  L"b",
-                                 L"abc",         L"abcdef", L"ABCDEF", L"def",  L"DEF",        L"bcd", L"abcd\u00E9f",
+const wchar_t* const kTexts[] = {nullptr,        L"",       L"a",      L"A",    L"aB",         L"b",
+                                 L"abcdef",      L"ABCDEF", L"def",    L"DEF",  L"bcd",        L"abcd\u00E9f",
                                  L"abcd\u00C9f", L"[",      L"ababac", L"abac", L"zzzzzzzzzzz"};
 
 std::vector<int> FoldedUnits(const wchar_t* text, bool fold) {
@@ -148,8 +118,7 @@ TEST(PooledString, ComparesLikeASlowReading) {
         for (const wchar_t* second : kTexts) {
             const CPPoolString text(first), other(second);
             const bool same = Entry(text) == Entry(other);
-            SCOPED_TRACE(testing::Message() << "text " << (&first - kTexts) << ": " << Utf8Of(text) << " and "
-                                            << Utf8Of(other) << (second ? "" : " (null)"));
+            SCOPED_TRACE(Utf8Of(text) + (first ? "" : "(null)") + " and " + Utf8Of(other) + (second ? "" : "(null)"));
             for (const bool fold : {false, true}) {
                 const auto a = FoldedUnits(first, fold), b = FoldedUnits(second, fold);
                 const bool shorter = a.size() < b.size();
@@ -171,20 +140,9 @@ TEST(PooledString, ComparesLikeASlowReading) {
             EXPECT_EQ(text.pcmp(other) == 0, same);
             EXPECT_EQ(text.pcmp(other), -other.pcmp(text));
             EXPECT_EQ(text.iequals(other), FoldedUnits(first, true) == FoldedUnits(second, true));
-            EXPECT_EQ(text == second, text.cmp(second) == 0);
-            EXPECT_EQ(text != second, text.cmp(second) != 0);
+            EXPECT_TRUE((text == second) == (text.cmp(second) == 0) && (text != second) == (text.cmp(second) != 0));
             EXPECT_EQ(text == other, same);
         }
-}
-
-TEST(PooledString, OwnTextIsEqualAtOnce) {
-    const CPPoolString text(L"own");
-    const wchar_t* const own = text;
-    EXPECT_EQ(text.cmp(own), 0);
-    EXPECT_TRUE(text.cnt(own) && text.cnti(own));
-    EXPECT_EQ(CPPoolString().cmp(static_cast<const wchar_t*>(nullptr)), 0);
-    EXPECT_LT(CPPoolString().cmp(CPPoolString(L"")), 0);
-    EXPECT_EQ(CPPoolString().cmpi(CPPoolString(L"")), 0);
 }
 
 TEST(PooledString, SuffixesCountPairsAsOneIntended) {
@@ -221,37 +179,24 @@ TEST(StringArray, SortedOneIsASet) {
     for (int step = 0; step < 4000; ++step) {
         const std::string name = std::to_string(random() % 90);
         const CPPoolString text(name.c_str());
-        if (random() % 2) {
-            ASSERT_TRUE(array.Add(text));
-            model.insert(name);
-        } else {
-            ASSERT_TRUE(array.Delete(text));
-            model.erase(name);
-        }
-        held |= !model.empty();
-        ASSERT_EQ(array.LocateEntry(text),
-                  held ? static_cast<std::size_t>(std::distance(model.begin(), model.lower_bound(name)))
-                       : TAVO::Buffers::NotFound);
-        if (step % 32 == 0) {
-            ASSERT_EQ(Elements(array), Strings(model.begin(), model.end()));
-        }
+        const bool add = random() % 2;
+        ASSERT_TRUE(add ? array.Add(text) : array.Delete(text));
+        add ? void(model.insert(name)) : void(model.erase(name));
+        held |= add;
+        const auto place = static_cast<std::size_t>(std::distance(model.begin(), model.lower_bound(name)));
+        ASSERT_EQ(array.LocateEntry(text), held ? place : TAVO::Buffers::NotFound);
+        ASSERT_EQ(array.GetNItems(), model.size());
     }
+    EXPECT_EQ(Elements(array), Strings(model.begin(), model.end()));
     EXPECT_FALSE(array.Insert(L"x", 0));
-    ASSERT_TRUE(array.Add(nullptr));
-    ASSERT_TRUE(array.Add(L""));
+    ASSERT_TRUE(array.Add(nullptr) && array.Add(L""));
     EXPECT_TRUE(array[0].isnull() && array[1].isempty()) << "null sorts first";
 }
 
 TEST(StringArray, UnsortedOneIsAList) {
-    CPPoolStringArray array(false);
-    EXPECT_EQ(array.LocateEntry(L"a"), TAVO::Buffers::NotFound);
-    EXPECT_EQ(CPPoolStringArray(true).LocateEntry(L"a"), TAVO::Buffers::NotFound) << "never held an element";
-    for (const wchar_t* text : {L"b", L"a", L"b"}) EXPECT_TRUE(array.Add(text));
-    EXPECT_TRUE(array.Insert(L"c", 1));
-    EXPECT_TRUE(array.Insert(array[0], 4));
-    EXPECT_FALSE(array.Insert(L"d", 6)) << "beyond the end";
-    EXPECT_FALSE(array.Delete(L"a"));
-    EXPECT_EQ(array.LocateEntry(L"a"), TAVO::Buffers::NotFound);
+    CPPoolStringArray array = ArrayOf(false, {L"b", L"a", L"b"});
+    EXPECT_TRUE(array.Insert(L"c", 1) && array.Insert(array[0], 4));
+    EXPECT_FALSE(array.Insert(L"d", 6) || array.Delete(L"a") || array.LocateEntry(L"a") + 1);
     EXPECT_EQ(Elements(array), (Strings{"b", "c", "a", "b", "b"}));
     array.Sort();
     EXPECT_EQ(Elements(array), (Strings{"a", "b", "b", "b", "c"}));
@@ -259,21 +204,19 @@ TEST(StringArray, UnsortedOneIsAList) {
 
 TEST(StringArray, CopiesNeverChangeEachOther) {
     const CPPoolStringArray original = ArrayOf(false, {L"c", L"a", L"b"});
-    using Change = void (*)(CPPoolStringArray&);
-    for (const Change change : {Change([](CPPoolStringArray& a) { a.Sort(); }),
-                                Change([](CPPoolStringArray& a) { EXPECT_TRUE(a.Add(a[1])); }),
-                                Change([](CPPoolStringArray& a) { EXPECT_TRUE(a.Insert(L"x", 0)); }),
-                                Change([](CPPoolStringArray& a) { EXPECT_TRUE(a.Inflate(L"x,y", L',')); })}) {
+    for (int change = 0; change < 4; ++change) {
         CPPoolStringArray copy(original);
-        change(copy);
+        if (change == 0) copy.Sort();
+        if (change == 1) copy.Add(copy[1]);
+        if (change == 2) copy.Insert(L"x", 0);
+        if (change == 3) copy.Inflate(L"x,y", L',');
         EXPECT_EQ(Elements(original), (Strings{"c", "a", "b"}));
         EXPECT_NE(Elements(copy), Elements(original));
     }
     const CPPoolStringArray set = ArrayOf(true, {L"c", L"a"});
     CPPoolStringArray copy(false);
     copy = set;
-    EXPECT_TRUE(copy.IsSorted()) << "the flag comes along";
-    EXPECT_TRUE(copy.Delete(L"a"));
+    EXPECT_TRUE(copy.IsSorted() && copy.Delete(L"a")) << "the flag comes along";
     EXPECT_EQ(Elements(set), (Strings{"a", "c"}));
 }
 
@@ -285,32 +228,22 @@ TEST(StringArray, TakesBlocksOfPooledStrings) {
     set = block;
     EXPECT_EQ(Elements(list), (Strings{"b", "a", "b"}));
     EXPECT_EQ(Elements(set), (Strings{"a", "b", "b"})) << "sorted; duplicates stay";
-    EXPECT_EQ(block[0], CPPoolString(L"b")) << "the block itself is not touched";
     list = TAVO::Buffers::CPOMVector(2);
-    EXPECT_TRUE(list.isEmpty());
-    set = TAVO::Buffers::CPObjectMemory();
-    EXPECT_TRUE(set.isEmpty());
     {
         const support::FailingHeap heap(0);
         set = block;
     }
-    EXPECT_TRUE(set.isEmpty()) << "no memory for a sorted copy";
+    EXPECT_TRUE(list.isEmpty() && set.isEmpty()) << "another type; no memory for a sorted copy";
 }
 
 TEST(StringArray, JoinsWithTheSeparator) {
-    EXPECT_STREQ(Entry(ArrayOf(false, {L"a", L"b", L"c"}).Flatten(L',')), L"a,b,c");
     EXPECT_TRUE(CPPoolStringArray(false).Flatten(L',').isnull());
-    const support::Assertions assertions;
     EXPECT_TRUE(ArrayOf(false, {nullptr}).Flatten(L',').isempty());
-    EXPECT_TRUE(ArrayOf(false, {L""}).Flatten(L',').isempty());
     EXPECT_STREQ(Entry(ArrayOf(false, {nullptr, L"", L"x"}).Flatten(L',')), L",,x");
     const wchar_t pair[] = {'p', 0xD83D, 0xDE00, 0xD83D, 0xDE01, 0};
-    const CPPoolString joined = ArrayOf(false, {pair, L"q", pair}).Flatten(L';');
-    const wchar_t expected[] = {'p', 0xD83D, 0xDE00, 0xD83D, 0xDE01, ';',    'q',
-                                ';', 'p',    0xD83D, 0xDE00, 0xD83D, 0xDE01, 0};
+    const CPPoolString joined = ArrayOf(false, {pair, L"q"}).Flatten(L';');
+    const wchar_t expected[] = {'p', 0xD83D, 0xDE00, 0xD83D, 0xDE01, ';', 'q', 0};
     EXPECT_EQ(joined.cmp(expected), 0) << "all units, not len()";
-    EXPECT_EQ(joined.len(), 9u);
-    EXPECT_EQ(assertions.Take(), Texts());
 }
 
 TEST(StringArray, SplitsAtTheSeparator) {
@@ -321,13 +254,11 @@ TEST(StringArray, SplitsAtTheSeparator) {
         bool sorted;
         Strings expected;
     };
-    const wchar_t longText[] = L"\u4E2D\u6587\u5B57,odd";
     for (const Row& row :
-         {Row{L"a,b,c", ',', false, {"a", "b", "c"}}, Row{L",x", ',', false, {"(null)", "x"}},
-          Row{L"x,", ',', false, {"x"}}, Row{L",", ',', false, {"(null)"}},
-          Row{L"a,,b", ',', false, {"a", "(null)", "b"}}, Row{L"", ',', false, {}}, Row{nullptr, ',', false, {}},
-          Row{L"a,b", 0, false, {"a,b"}}, Row{L"", 0, false, {}}, Row{L"b,a,b,,a", ',', true, {"(null)", "a", "b"}},
-          Row{longText, ',', false, {"\xE4\xB8\xAD\xE6\x96\x87\xE5\xAD\x97", "odd"}}}) {
+         {Row{L"a,b", ',', false, {"a", "b"}}, Row{L",x", ',', false, {"(null)", "x"}}, Row{L"x,", ',', false, {"x"}},
+          Row{L",", ',', false, {"(null)"}}, Row{L"a,,b", ',', false, {"a", "(null)", "b"}}, Row{L"", ',', false, {}},
+          Row{nullptr, ',', false, {}}, Row{L"a,b", 0, false, {"a,b"}},
+          Row{L"b,a,b,,a", ',', true, {"(null)", "a", "b"}}}) {
         CPPoolStringArray array(row.sorted);
         EXPECT_TRUE(array.Add(L"old"));
         EXPECT_TRUE(array.Inflate(row.text, row.separator));
@@ -335,17 +266,12 @@ TEST(StringArray, SplitsAtTheSeparator) {
     }
     const wchar_t pairs[] = {'a', 0xD83D, 0xDE00, ',', 0xD83D, 0xDE01, 'b', ',', 'c', 0};
     CPPoolStringArray array(false);
-    EXPECT_TRUE(array.Inflate(pairs, L','));
-    ASSERT_EQ(array.GetNItems(), 3u);
-    const wchar_t second[] = {0xD83D, 0xDE01, 'b', 0};
-    EXPECT_EQ(array[1].cmp(second), 0);
+    EXPECT_TRUE(array.Inflate(pairs, L',') && array.GetNItems() == 3);
     EXPECT_STREQ(Entry(array[2]), L"c");
     EXPECT_TRUE(array.Inflate(pairs, 0xDE00)) << "pieces with half a pair are null strings";
-    ASSERT_EQ(array.GetNItems(), 2u);
-    EXPECT_TRUE(array[0].isnull());
+    EXPECT_TRUE(array.GetNItems() == 2 && array[0].isnull());
     EXPECT_TRUE(array.Inflate(array[1], L',')) << "from one of its own elements";
     EXPECT_EQ(array.GetNItems(), 3u);
-    EXPECT_EQ(assertions.Take(), Texts());
     CSubStringSubmitter nothing(L"x", 0);
     wchar_t out[2] = {};
     EXPECT_FALSE(nothing.GetString(out));
@@ -353,27 +279,21 @@ TEST(StringArray, SplitsAtTheSeparator) {
 }
 
 TEST(StringArray, WithoutMemoryStaysAsItWas) {
-    const CPPoolString source(L"one,two,three,,four");
+    const CPPoolString source(L"one,two,,three"), a(L"a"), b(L"b");
     support::ForEachFailingAllocation([&] {
-        {
-            CPPoolStringArray array(false);
-            if (array.Inflate(source, L',')) {
-                EXPECT_EQ(Elements(array).size(), 5u);
-                EXPECT_TRUE(array[0].isdef() && array[3].isnull());
-                const CPPoolString joined = array.Flatten(L',');
-                EXPECT_TRUE(joined.isnull() || joined == source);
-            }
-            CPPoolStringArray set(true);
-            const CPPoolString a(L"a"), b(L"b");
-            if (set.Add(b) && set.Add(a) && !a.isnull() && !b.isnull()) {
-                CPPoolStringArray copy(set);
-                const bool deleted = copy.Delete(a);
-                EXPECT_EQ(copy.GetNItems(), deleted ? 1u : 2u);
-                EXPECT_EQ(set.GetNItems(), 2u);
-            }
+        CPPoolStringArray array(false), set(true);
+        if (array.Inflate(source, L',')) {
+            EXPECT_TRUE(array.GetNItems() == 4 && array[0].isdef() && array[2].isnull());
+            const CPPoolString joined = array.Flatten(L',');
+            EXPECT_TRUE(joined.isnull() || joined == source);
         }
-        CStringPool::Collect(60000);
-        CStringPool::Collect(60000);
+        if (set.Add(b) && set.Add(a)) {
+            CPPoolStringArray copy(set);
+            const bool deleted = copy.Delete(a);
+            EXPECT_TRUE(copy.GetNItems() == (deleted ? 1 : 2) && set.GetNItems() == 2);
+        }
+        array = CPPoolStringArray(false);
+        EXPECT_TRUE(CStringPool::Collect(60000) && CStringPool::Collect(60000));
     });
 }
 

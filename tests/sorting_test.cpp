@@ -19,7 +19,6 @@ struct Element {
     int key;
     int tag; // tells equal keys apart
     bool operator==(const Element& other) const { return key == other.key && tag == other.tag; }
-    bool operator<(const Element& other) const { return std::pair(key, tag) < std::pair(other.key, other.tag); }
 };
 using Elements = std::vector<Element>;
 
@@ -63,40 +62,34 @@ Elements RandomElements(std::mt19937& random, std::size_t count, unsigned keys) 
 
 TEST(Sort, PlacesEqualElementsAsStatedIntended) {
     std::mt19937 random(1);
-    for (std::size_t count = 0; count <= 1024; count += count < 80 ? 1 : 59)
-        for (const unsigned keys : {1u, 2u, 7u, 40u, 1000000u}) {
-            Elements sorted = RandomElements(random, count, keys);
-            if (random() % 4 == 0) std::sort(sorted.begin(), sorted.end());
-            Elements expected = sorted;
+    // A random long range never runs out of patience, so the same holds there.
+    for (std::size_t count = 0; count <= 20000; count += count < 80 ? 1 : count < 1000 ? 59 : 6007)
+        for (const unsigned keys : {1u, 2u, 7u, 40u, 1u << 30}) {
+            if (count > 1024 && keys <= 40) continue;
+            Elements sorted = RandomElements(random, count, keys), expected = sorted;
             if (count) SlowSort(expected, 0, static_cast<long>(count) - 1);
             Sort::vfqsort(sorted.data(), count, sizeof(Element), CompareKeys);
             ASSERT_EQ(sorted, expected) << count << " elements of " << keys << " keys";
         }
-    // A random long range never runs out of patience, so the same holds there.
-    for (const std::size_t count : {1025, 5000, 20000}) {
-        Elements sorted = RandomElements(random, count, 1u << 30), expected = sorted;
-        SlowSort(expected, 0, static_cast<long>(count) - 1);
-        Sort::vfqsort(sorted.data(), count, sizeof(Element), CompareKeys);
-        ASSERT_EQ(sorted, expected) << count;
-    }
 }
 
 TEST(Sort, MovesElementsOfEverySizeWhole) {
     std::mt19937 random(2);
     for (std::size_t size = 1; size <= 41; ++size) {
         constexpr std::size_t kCount = 137;
-        std::vector<unsigned char> bytes(size * kCount);
-        for (auto& byte : bytes) byte = static_cast<unsigned char>(random() % 3);
-        std::vector<std::string> expected;
-        for (std::size_t i = 0; i < kCount; ++i)
-            expected.emplace_back(reinterpret_cast<const char*>(bytes.data()) + i * size, size);
-        std::sort(expected.begin(), expected.end());
-        const auto compare = [](const void* a, const void* b, void* context) {
-            return std::memcmp(a, b, *static_cast<std::size_t*>(context));
+        std::string bytes(size * kCount, 0);
+        for (auto& byte : bytes) byte = static_cast<char>(random() % 3);
+        const auto elements = [&] {
+            std::vector<std::string> list;
+            for (std::size_t i = 0; i < kCount; ++i) list.push_back(bytes.substr(i * size, size));
+            return list;
         };
-        Sort::vfpqsort(bytes.data(), kCount, size, &size, compare);
-        for (std::size_t i = 0; i < kCount; ++i)
-            ASSERT_EQ(std::memcmp(bytes.data() + i * size, expected[i].data(), size), 0) << size << ", " << i;
+        std::vector<std::string> expected = elements();
+        std::sort(expected.begin(), expected.end());
+        Sort::vfpqsort(bytes.data(), kCount, size, &size, [](const void* a, const void* b, void* context) {
+            return std::memcmp(a, b, *static_cast<std::size_t*>(context));
+        });
+        ASSERT_EQ(elements(), expected) << size;
     }
     Element untouched[] = {{2, 0}, {1, 1}};
     Sort::vfqsort(untouched, 1, sizeof(Element), CompareKeys);
@@ -126,44 +119,31 @@ struct Adversary {
 };
 
 TEST(Sort, IsNeverQuadraticOnLongArrays) {
-    const auto bound = [](std::size_t n) {
-        // Ranges of up to 1024 elements may be.
-        return static_cast<double>(n) * (512 + 12 * std::log2(static_cast<double>(n)));
+    using Key = int (*)(int i, int n);
+    const std::pair<const char*, Key> orders[] = {
+        {"all equal", [](int, int) { return 0; }},
+        {"ascending", [](int i, int) { return i; }},
+        {"organ pipe", [](int i, int n) { return i < n / 2 ? i : n - i; }},
+        {"saw", [](int i, int) { return i % 37; }},
+        {"killer", nullptr},
     };
-    for (const int n : {1025, 5000, 60000}) {
-        using Key = int (*)(int i, int n);
-        const std::pair<const char*, Key> orders[] = {
-            {"all equal", [](int, int) { return 0; }},
-            {"two values", [](int i, int) { return i % 2; }},
-            {"ascending", [](int i, int) { return i; }},
-            {"descending", [](int i, int n) { return n - i; }},
-            {"organ pipe", [](int i, int n) { return i < n / 2 ? i : n - i; }},
-            {"inverse organ pipe", [](int i, int n) { return i < n / 2 ? n / 2 - i : i; }},
-            {"saw", [](int i, int) { return i % 37; }},
-        };
+    for (const int n : {1025, 5000, 60000})
         for (const auto& [name, key] : orders) {
             Adversary counter;
             std::vector<int> indexes;
             for (int i = 0; i < n; ++i) {
-                counter.values.push_back(key(i, n));
+                counter.values.push_back(key ? key(i, n) : n);
                 indexes.push_back(i);
             }
-            counter.gas = -1;
+            counter.gas = key ? -1 : n;
             Sort::vfpqsort(indexes.data(), indexes.size(), sizeof(int), &counter, Adversary::Compare);
-            EXPECT_LT(static_cast<double>(counter.comparisons), bound(indexes.size())) << name << " of " << n;
-            for (std::size_t i = 1; i < indexes.size(); ++i)
-                ASSERT_LE(counter.values[static_cast<std::size_t>(indexes[i - 1])],
-                          counter.values[static_cast<std::size_t>(indexes[i])])
-                    << name << " of " << n;
+            // Ranges of up to 1024 elements may be quadratic.
+            EXPECT_LT(static_cast<double>(counter.comparisons), n * (512 + 12 * std::log2(n))) << name << " of " << n;
+            const auto value = [&](int index) { return counter.values[static_cast<std::size_t>(index)]; };
+            EXPECT_TRUE(
+                std::is_sorted(indexes.begin(), indexes.end(), [&](int a, int b) { return value(a) < value(b); }))
+                << name << " of " << n;
         }
-        Adversary killer;
-        killer.gas = n;
-        killer.values.assign(static_cast<std::size_t>(n), n);
-        std::vector<int> indexes(static_cast<std::size_t>(n));
-        for (int i = 0; i < n; ++i) indexes[static_cast<std::size_t>(i)] = i;
-        Sort::vfpqsort(indexes.data(), indexes.size(), sizeof(int), &killer, Adversary::Compare);
-        EXPECT_LT(static_cast<double>(killer.comparisons), bound(indexes.size())) << "killer of " << n;
-    }
 }
 
 struct Fuse {
@@ -176,16 +156,13 @@ struct Fuse {
 
 TEST(Sort, ThrowingComparisonLeavesAPermutation) {
     std::mt19937 random(3);
-    for (const std::size_t count : {9, 100, 3000}) {
-        const Elements original = RandomElements(random, count, 2);
-        for (std::size_t allowed = 0; allowed < 40000; allowed = allowed * 5 / 4 + 1) {
-            Elements elements = original;
-            Fuse fuse{allowed};
-            Sort::vfpqsort(elements.data(), count, sizeof(Element), &fuse, Fuse::Compare);
-            std::sort(elements.begin(), elements.end(),
-                      [](const Element& a, const Element& b) { return a.tag < b.tag; });
-            ASSERT_EQ(elements, original);
-        }
+    const Elements original = RandomElements(random, 3000, 2);
+    for (std::size_t allowed = 0; allowed < 40000; allowed = allowed * 5 / 4 + 1) {
+        Elements elements = original;
+        Fuse fuse{allowed};
+        Sort::vfpqsort(elements.data(), elements.size(), sizeof(Element), &fuse, Fuse::Compare);
+        std::sort(elements.begin(), elements.end(), [](const Element& a, const Element& b) { return a.tag < b.tag; });
+        ASSERT_EQ(elements, original);
     }
 }
 
@@ -196,10 +173,8 @@ TEST(Search, FindsTheLowerBound) {
             for (int i = 0; i < count; ++i) elements.push_back({i / step * 2, i});
             for (int key = -1; key <= 2 * count + 1; ++key) {
                 const Element wanted{key, -1}; // a tag that no element has: the key comes first
-                const auto expected =
-                    static_cast<std::size_t>(std::lower_bound(elements.begin(), elements.end(), key,
-                                                              [](const Element& e, int k) { return e.key < k; }) -
-                                             elements.begin());
+                std::size_t expected = 0;
+                while (expected < elements.size() && elements[expected].key < key) ++expected;
                 const auto compare = [](const void* a, const void* b) {
                     EXPECT_EQ(static_cast<const Element*>(a)->tag, -1);
                     return CompareKeys(a, b);
@@ -207,30 +182,13 @@ TEST(Search, FindsTheLowerBound) {
                 ASSERT_EQ(Sort::vfqfind(&wanted, elements.data(), elements.size(), sizeof(Element), compare), expected);
                 Fuse fuse{9}; // 2 for the ends and one for each halving
                 ASSERT_EQ(
-                    Sort::vfpqsearch(&wanted, elements.data(), elements.size(), sizeof(Element), &fuse, Fuse::Compare),
-                    expected)
-                    << count << ", " << key;
+                    Sort::vfpqsearch(&wanted, elements.data(), elements.size(), sizeof wanted, &fuse, Fuse::Compare),
+                    expected);
             }
         }
     const Elements elements{{1, 0}, {2, 0}, {3, 0}, {4, 0}};
-    for (std::size_t allowed = 0; allowed < 3; ++allowed) {
-        Fuse fuse{allowed};
-        EXPECT_EQ(Sort::vfpqsearch(&elements[1], elements.data(), 4, sizeof(Element), &fuse, Fuse::Compare), 4u);
-    }
-}
-
-TEST(Swap, ExchangesEveryByteAndNoMore) {
-    for (std::size_t size = 0; size <= 40; ++size) {
-        std::vector<unsigned char> a(size + 2, 0xAA), b(size + 2, 0xBB);
-        for (std::size_t i = 0; i < size; ++i) a[i + 1] = static_cast<unsigned char>(i), b[i + 1] = 0x80;
-        auto x = a, y = b;
-        swap(x.data() + 1, y.data() + 1, size);
-        std::swap_ranges(a.begin() + 1, a.end() - 1, b.begin() + 1);
-        EXPECT_EQ(x, a);
-        EXPECT_EQ(y, b);
-        swap(x.data(), x.data(), size);
-        EXPECT_EQ(x, a);
-    }
+    Fuse blown{2};
+    EXPECT_EQ(Sort::vfpqsearch(&elements[1], elements.data(), 4, sizeof(Element), &blown, Fuse::Compare), 4u);
 }
 
 // --- checksums -------------------------------------------------------------------------------------------------------
@@ -239,7 +197,6 @@ constexpr unsigned long long kPoolPolynomial = 0x42F0E1EBA9EA3693;
 
 unsigned long long BitByBit(unsigned width, unsigned long long polynomial, const unsigned char* data,
                             std::size_t length, unsigned long long initial) {
-    if (width <= 8 || width > 64) return initial;
     const unsigned long long mask = ~0ULL >> (64 - width);
     unsigned long long crc = initial & mask;
     for (std::size_t i = 0; i < length; ++i)
@@ -251,54 +208,31 @@ unsigned long long BitByBit(unsigned width, unsigned long long polynomial, const
 }
 
 TEST(Checksum, AgreesWithBitByBitInEveryWidth) {
-    std::mt19937_64 random(4);
-    unsigned char data[64];
-    for (auto& byte : data) byte = static_cast<unsigned char>(random());
-    for (unsigned width = 0; width <= 66; ++width)
-        for (int times = 0; times < 8; ++times) {
-            const auto polynomial = width == 64 && times == 0 ? kPoolPolynomial : random(); // bits above the width too
-            const CMachineCRC machine(width, polynomial);
-            const auto initial = times ? random() : 0;
-            for (std::size_t length = 0; length <= sizeof data; length += 1 + times) {
-                const auto expected = BitByBit(width, polynomial, data, length, initial);
-                ASSERT_EQ(machine.Eval(data, length, initial), expected) << width << ", " << length;
-                ASSERT_EQ(machine.Eval(data + length / 3, length - length / 3, machine.Eval(data, length / 3, initial)),
-                          expected)
-                    << "continued";
-            }
-        }
-}
-
-TEST(Checksum, LibraryPolynomialAtEveryLengthAndAlignment) {
     const support::GuardedMemory memory;
-    std::mt19937_64 random(5);
-    const CMachineCRC machine(64, kPoolPolynomial);
-    std::vector<unsigned char> data(700);
+    std::mt19937_64 random(4);
+    unsigned char data[700];
     for (auto& byte : data) byte = static_cast<unsigned char>(random());
-    for (std::size_t length = 0; length < 150; ++length) {
-        const auto expected = BitByBit(64, kPoolPolynomial, data.data(), length, length);
-        ASSERT_EQ(machine.Eval(memory.Place(data.data(), length), length, length), expected)
-            << "at the end, " << length;
-        for (std::size_t offset = 0; offset < 17; ++offset) {
-            unsigned char* const place = memory.End() - 256 + offset;
-            std::memcpy(place, data.data(), length);
-            ASSERT_EQ(machine.Eval(place, length, length), expected) << length << " at " << offset;
+    for (unsigned width = 9; width <= 64; ++width)
+        for (std::size_t times = 0; times < 8; ++times) {
+            const auto polynomial = random(), initial = random(); // bits above the width too
+            const CMachineCRC machine(width, polynomial);
+            for (std::size_t length = 0; length <= 64; length += 1 + times)
+                ASSERT_EQ(machine.Eval(data + length / 3, length - length / 3, machine.Eval(data, length / 3, initial)),
+                          BitByBit(width, polynomial, data, length, initial))
+                    << width << ", " << length;
         }
-    }
-    EXPECT_EQ(machine.Eval(data.data(), data.size(), 1), BitByBit(64, kPoolPolynomial, data.data(), data.size(), 1));
-    EXPECT_EQ(machine.Eval(nullptr, 0, 77), 77u);
-}
-
-TEST(Checksum, KnownValues) {
-    EXPECT_EQ(CMachineCRC(32, 0x04C11DB7).Eval("123456789", 9, 0xFFFFFFFF) ^ 0xFFFFFFFF, 0xFC891918u);
-    EXPECT_EQ(CMachineCRC(16, 0x1021).Eval("123456789", 9, 0xFFFF), 0x29B1u);
-    EXPECT_EQ(CMachineCRC(64, kPoolPolynomial).Eval("123456789", 9, 0), 0x6C40DF5F0B497347u);
+    const CMachineCRC machine(64, kPoolPolynomial);
+    for (std::size_t length = 0; length <= 700; length += length < 150 ? 1 : 50)
+        for (std::size_t offset = 0; offset < 17; ++offset) { // from the end of the memory
+            auto* const place = static_cast<unsigned char*>(std::memcpy(memory.End() - length - offset, data, length));
+            ASSERT_EQ(machine.Eval(place, length, 1), BitByBit(64, kPoolPolynomial, data, length, 1)) << length;
+        }
+    EXPECT_EQ(CMachineCRC(16, 0x1021).Eval("123456789", 9, 0xFFFF), 0x29B1u) << "the well-known check value";
 }
 
 TEST(Checksum, OfEightBitsComputesNothingIntended) {
     for (const unsigned width : {0u, 7u, 8u, 65u, 0xFFFFFFFFu})
-        for (const unsigned long long initial : {0ULL, 0x1234ULL, ~0ULL})
-            EXPECT_EQ(CMachineCRC(width, 0x07).Eval("abc", 3, initial), initial) << width;
+        EXPECT_EQ(CMachineCRC(width, 0x07).Eval("abc", 3, 0x1234), 0x1234u) << width;
 }
 
 } // namespace
