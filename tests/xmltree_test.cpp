@@ -1,7 +1,6 @@
 // The element tree: names, attributes, children, data, searches.
 
 #include "support/heapwatch.h"
-#include "support/smallstack.h"
 
 #include <TAVO/xml.h>
 
