@@ -223,14 +223,10 @@ TEST(XmlDocumentObject, CopiesShareTreeAndError) {
 // Elements that hold children, data or nothing are told apart by what can be added to them.
 TEST(XmlDocumentObject, ElementsHaveTheKindOfTheirContent) {
     CXMLDoc document;
-    ASSERT_TRUE(document.OpenDocText(L"<a><none/><section><![CDATA[]]></section><text>x</text><deep><b/></deep></a>"));
-    std::size_t count = 0;
-    CPXMLObject* elements = document.GetRootElement().GetElements(count);
-    ASSERT_EQ(count, 4u);
-    EXPECT_TRUE(elements[0].IsNamedDefault());
-    EXPECT_TRUE(elements[1].IsNamedDefault()) << "an empty section is no data";
-    CPXMLObject child;
+    ASSERT_TRUE(document.OpenDocText(L"<a><section><![CDATA[]]></section><text>x</text><deep><b/></deep></a>"));
+    CPXMLObject &root = document.GetRootElement(), child;
     child.SetName(L"c");
-    EXPECT_FALSE(elements[2].Insert(child, 0)) << "refused beside data";
-    EXPECT_TRUE(elements[3].Insert(child, 0));
+    EXPECT_TRUE(root.item(0).IsNamedDefault()) << "an empty section is no data";
+    EXPECT_FALSE(root.item(1).Insert(child, 0)) << "refused beside data";
+    EXPECT_TRUE(root.item(2).Insert(child, 0));
 }
