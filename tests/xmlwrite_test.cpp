@@ -66,49 +66,20 @@ CPXMLObject Sample() {
 
 } // namespace
 
-TEST(XmlWrite, PlainAndPretty) {
+// What the naive writer of the inner tests does, once more in bytes.
+TEST(XmlWrite, PlainPrettyEscapedAndInSections) {
     EXPECT_EQ(Utf8(Sample()), "<root a=\"1\"><inner><leaf/><data>text</data></inner></root>");
     EXPECT_EQ(Utf8(Sample(), true), "\r\n<root a=\"1\">\r\n  <inner>\r\n    <leaf/>\r\n    <data>text</data>\r\n"
                                     "  </inner>\r\n</root>\r\n");
-}
-
-TEST(XmlWrite, ValuesAreEscapedAndDataGoesIntoSections) {
-    const struct {
-        const wchar_t* text;
-        const char *value, *data;
-    } kRows[] = {
-        {L"plain", "plain", "plain"},
-        {L"&<>\"'", "&amp;&lt;&gt;&quot;&apos;", "<![CDATA[&<>\"']]>"},
-        {L"a&b", "a&amp;b", "<![CDATA[a&b]]>"},
-        {L"12345678'", "12345678&apos;", "<![CDATA[12345678']]>"},
-        {L"123456789012345>", "123456789012345&gt;", "<![CDATA[123456789012345>]]>"},
-        {L"]]>", "]]&gt;", "<![CDATA[]]]]><![CDATA[>]]>"},
-        {L"x]]>y", "x]]&gt;y", "<![CDATA[x]]]]><![CDATA[>y]]>"},
-        {L"]]]>]]>]>", "]]]&gt;]]&gt;]&gt;", "<![CDATA[]]]]]><![CDATA[>]]]]><![CDATA[>]>]]>"},
-        {L"]]", "]]", "]]"},
-        {L" a\r\n\tb ", " a\r\n\tb ", " a\r\n\tb "},
-        {L"$%#;=:?", "$%#;=:?", "$%#;=:?"},
-        {L"\xE9\x4E00\x126\x13C\x2C3E", "\xC3\xA9\xE4\xB8\x80\xC4\xA6\xC4\xBC\xE2\xB0\xBE",
-         "\xC3\xA9\xE4\xB8\x80\xC4\xA6\xC4\xBC\xE2\xB0\xBE"},
-    };
-    for (std::size_t i = 0; i < std::size(kRows); ++i) {
-        CPXMLObject element = Named(L"e");
-        ASSERT_TRUE(element.AddAttribute(L"a", kRows[i].text));
-        EXPECT_EQ(Utf8(element), std::string("<e a=\"") + kRows[i].value + "\"/>") << i;
-        EXPECT_EQ(Utf8(WithData(kRows[i].text)), std::string("<e>") + kRows[i].data + "</e>") << i;
-    }
+    CPXMLObject element = WithData(L"]]]>]]>]> &<>\"'\r\n\xE9\x4E00");
+    ASSERT_TRUE(element.AddAttribute(L"a", L"&<>\"' ]]> 123456789012345>"));
+    EXPECT_EQ(Utf8(element), "<e a=\"&amp;&lt;&gt;&quot;&apos; ]]&gt; 123456789012345&gt;\">"
+                             "<![CDATA[]]]]]><![CDATA[>]]]]><![CDATA[>]> &<>\"'\r\n\xC3\xA9\xE4\xB8\x80]]></e>");
 }
 
 TEST(XmlWrite, SurrogatesAreNotCombinedIntended) {
-    const struct {
-        const wchar_t* text;
-        const char* written;
-    } kRows[] = {{L"\xD83D\xDE00", "\x01"},
-                 {L"a\xD840\xDC00z", "a\x01z"},
-                 {L"\xD87D\xDE00", "\x01"},
-                 {L"\xD83D\xFFFF", "\x01"},
-                 {L"\xD83D\xDBFFz", "\x01z"}};
-    for (const auto& row : kRows) EXPECT_EQ(Utf8(WithData(row.text)), std::string("<e>") + row.written + "</e>");
+    for (const wchar_t* pair : {L"\xD83D\xDE00", L"\xD87D\xDE00", L"\xD83D\xFFFF", L"\xD83D\xDBFF"})
+        EXPECT_EQ(Utf8(WithData(pair)), "<e>\x01</e>");
     EXPECT_EQ(Utf8(WithData(L"a\xD800\xDC00")), std::string("<e>a\0</e>", 9)) << "low ten bits zero in both";
 
     CPPlainMemory out;
@@ -124,21 +95,6 @@ TEST(XmlWrite, SurrogatesAreNotCombinedIntended) {
     EXPECT_TRUE(beyond.Write(out, XMLEncodingUTF16Raw, false)) << "units are not looked at";
 }
 
-TEST(XmlWrite, Encodings) {
-    const std::string expected = InUnits("<?xml version=\"1.0\" encoding=\"UTF-16\"?>"
-                                         "<root a=\"1\"><inner><leaf/><data>text</data></inner></root>") +
-                                 std::string(2, 0);
-    CPPlainMemory out;
-    for (auto encoding : {XMLEncodingUTF16, XMLEncodingUTF16Raw}) {
-        EXPECT_TRUE(Sample().Write(out, encoding, false));
-        EXPECT_EQ(Bytes(out), expected);
-    }
-    EXPECT_TRUE(Sample().Write(out, XMLEncodingAutomatic, false));
-    EXPECT_EQ(Bytes(out).substr(0, 38), kUtf8Declaration);
-    EXPECT_FALSE(Sample().Write(out, static_cast<eXMLEncoding>(4), false));
-    EXPECT_EQ(out.GetSize(), 0u);
-}
-
 TEST(XmlWrite, UnwritableTreesIntended) {
     EXPECT_EQ(Utf8(CPXMLObject()), "failed");
     CPXMLObject mixed = WithData(L"text");
@@ -152,22 +108,6 @@ TEST(XmlWrite, UnwritableTreesIntended) {
     EXPECT_EQ(Utf8(emptied, true), "\r\n<e>\r\n</e>\r\n");
 }
 
-TEST(XmlWrite, IndentationOfAnyDepth) {
-    for (int depth : {30, 31, 32, 33, 34, 63, 64, 65, 66, 97, 130}) {
-        CPXMLObject element = Named(L"d");
-        std::string expected;
-        for (int level = 0; level <= depth; ++level)
-            expected += "\r\n" + std::string(level * 2u, ' ') + (level < depth ? "<d>" : "<d/>");
-        for (int level = depth; level-- > 0;) {
-            expected += "\r\n" + std::string(level * 2u, ' ') + "</d>";
-            CPXMLObject above = Named(L"d");
-            EXPECT_TRUE(above.Add(element));
-            element = above;
-        }
-        EXPECT_EQ(Utf8(element, true), expected + "\r\n");
-    }
-}
-
 TEST(XmlWrite, FilesAreReplacedOrDeleted) {
     ScratchFolder folder;
     const WideText path = folder / L"tree.xml";
@@ -178,7 +118,7 @@ TEST(XmlWrite, FilesAreReplacedOrDeleted) {
     EXPECT_TRUE(Sample().Write(path, XMLEncodingAutomatic, true));
     EXPECT_EQ(Contents(path), kUtf8Declaration + Utf8(Sample(), true)) << "without the zero";
     EXPECT_TRUE(Sample().Write(path, XMLEncodingUTF16, false));
-    EXPECT_EQ(Contents(path).size(), 2u * 97u);
+    EXPECT_EQ(Contents(path), InUnits("<?xml version=\"1.0\" encoding=\"UTF-16\"?>" + Utf8(Sample())));
 
     EXPECT_FALSE(mixed.Write(path, XMLEncodingUTF8, false));
     EXPECT_EQ(Contents(path), "no file");
@@ -187,11 +127,6 @@ TEST(XmlWrite, FilesAreReplacedOrDeleted) {
     EXPECT_EQ(Contents(path), "no file") << "what stood there is lost";
     EXPECT_FALSE(Sample().Write(static_cast<const wchar_t*>(nullptr), XMLEncodingUTF8, false));
     EXPECT_FALSE(Sample().Write(folder.Path(), XMLEncodingUTF8, false));
-
-    CPXMLObject large = Named(L"large"); // several buffers
-    for (int i = 0; i < 5000; ++i) ASSERT_TRUE(large.AddTag(L"child", L"text"));
-    EXPECT_TRUE(large.Write(path, XMLEncodingUTF8, false));
-    EXPECT_TRUE(Contents(path) == kUtf8Declaration + Utf8(large));
 }
 
 TEST(XmlWrite, FailingAllocationsLeaveNothing) {

@@ -189,38 +189,30 @@ public:
         std::size_t n;
         const CPXMLObject* slots = e.GetElements(n);
         const CPXMLObject* from = start == kNone || !slots ? nullptr : slots + start;
-        switch (operation) {
-        case 0:
-            return {e.SetName(pooled), naive::SetName(m, name)};
-        case 1:
-            return {e.Rename(pooled), m && naive::IsGood(name) && (m->name = name, true)};
-        case 2:
-            return {e.AddAttribute(pooled, value), naive::AddAttribute(m, name, text)};
-        case 3:
-            return {e.SetAttribute(pooled, value), naive::SetAttribute(m, name, text)};
-        case 4:
-            return {e.DeleteAttribute(pooled), naive::DeleteAttribute(m, name)};
-        case 5:
-            return {e.MergeAttributes(child, index & 1), naive::Merge(m, modelChild, index & 1)};
-        case 6:
+        if (operation == 0) return {e.SetName(pooled), naive::SetName(m, name)};
+        if (operation == 1) return {e.Rename(pooled), m && naive::IsGood(name) && (m->name = name, true)};
+        if (operation == 2) return {e.AddAttribute(pooled, value), naive::AddAttribute(m, name, text)};
+        if (operation == 3) return {e.SetAttribute(pooled, value), naive::SetAttribute(m, name, text)};
+        if (operation == 4) return {e.DeleteAttribute(pooled), naive::DeleteAttribute(m, name)};
+        if (operation == 5) return {e.MergeAttributes(child, index & 1), naive::Merge(m, modelChild, index & 1)};
+        if (operation == 6) {
             e = child, m = modelChild;
             return {};
-        case 7:
+        }
+        if (operation == 7) {
             e.Reset();
             if (m) *m = Element{m->name, 0, {}, {}, {}};
             return {};
-        case 8:
-            return {e.Add(child).sIndex(), naive::Add(m, modelChild)};
-        case 9:
-            return {e.CAdd(child), naive::CAdd(m, modelChild)};
-        case 10:
-            return {e.Insert(child, index).sIndex(), naive::Insert(m, modelChild, index)};
-        case 11: {
+        }
+        if (operation == 8) return {e.Add(child).sIndex(), naive::Add(m, modelChild)};
+        if (operation == 9) return {e.CAdd(child), naive::CAdd(m, modelChild)};
+        if (operation == 10) return {e.Insert(child, index).sIndex(), naive::Insert(m, modelChild, index)};
+        if (operation == 11) {
             const bool placed = naive::IsNamed(m) && !naive::IsDefault(modelChild) && index < count;
             if (placed) m->children[index] = modelChild;
             return {e.Replace(child, index), placed};
         }
-        case 12: {
+        if (operation == 12) {
             const CPXMLObject foreign(index < n ? slots[index] : CPXMLObject());
             const std::size_t at = !naive::IsNamed(m) ? 0
                                    : index < count    ? naive::SlotWith(m, m->children[index])
@@ -228,7 +220,7 @@ public:
             if (naive::IsNamed(m) && at != kNone) m->children[at] = modelChild;
             return {e.Replace(child, &foreign).sIndex(), at};
         }
-        case 13: {
+        if (operation == 13) {
             const CPXMLObject old(index < n ? slots[index] : CPXMLObject());
             std::size_t at = kNone;
             if (naive::IsNamed(m) && !naive::IsDefault(modelChild) && index < count)
@@ -236,44 +228,37 @@ public:
             if (at != kNone) m->children[at] = modelChild;
             return {e.Replace(child, old).sIndex(), at};
         }
-        case 14: {
+        if (operation == 14) {
             const bool emptied = naive::DeleteData(m) && naive::DeleteElements(m);
             return {e.Set(child), emptied && naive::Add(m, modelChild) != kNone};
         }
-        case 15:
+        if (operation == 15)
             return {e.AddTag(pooled, value).sIndex(),
                     naive::IsNamed(m) && naive::IsGood(name) ? naive::Add(m, naive::Tag(name, text)) : kNone};
-        case 16: {
+        if (operation == 16) {
             const bool placed =
                 naive::IsNamed(m) && naive::IsGood(name) && naive::DeleteData(m) && naive::DeleteElements(m);
             return {e.SetTag(pooled, value).sIndex(), placed ? naive::Add(m, naive::Tag(name, text)) : kNone};
         }
-        case 17:
-            return {e.Delete(index), naive::DeleteAt(m, index)};
-        case 18:
+        if (operation == 17) return {e.Delete(index), naive::DeleteAt(m, index)};
+        if (operation == 18)
             return {e.Delete(child), naive::IsNamed(m) && naive::DeleteAt(m, naive::SlotWith(m, modelChild))};
-        case 19:
-            return {index < n && e.Delete(slots + index), index < n && naive::DeleteAt(m, index)};
-        case 20:
-            return {e.DeleteElements(), naive::DeleteElements(m)};
-        case 21:
-            return {e.DeleteData(), naive::DeleteData(m)};
-        case 22:
-            return {e.Add(value), naive::AddText(m, text)};
-        case 23:
+        if (operation == 19) return {index < n && e.Delete(slots + index), index < n && naive::DeleteAt(m, index)};
+        if (operation == 20) return {e.DeleteElements(), naive::DeleteElements(m)};
+        if (operation == 21) return {e.DeleteData(), naive::DeleteData(m)};
+        if (operation == 22) return {e.Add(value), naive::AddText(m, text)};
+        if (operation == 23)
             return {e.Set(value), naive::DeleteData(m) && naive::DeleteElements(m) && naive::AddText(m, text)};
-        case 24: {
+        if (operation == 24) {
             if (m) m = std::make_shared<Element>(*m);
             const CPXMLObject shared(e); // so that it is copied even when it was alone
             return {e.clone(), true};
         }
-        case 25:
+        if (operation == 25)
             return {Slot(slots, e.FindNextElement(pooled, from)),
                     from && start >= n ? kNone : naive::FindNext(m, name, from ? start : kNone)};
-        default:
-            return {Slot(slots, e.FindPrevElement(pooled, from)),
-                    from && start >= n ? kNone : naive::FindPrev(m, name, from ? start : kNone)};
-        }
+        return {Slot(slots, e.FindPrevElement(pooled, from)),
+                from && start >= n ? kNone : naive::FindPrev(m, name, from ? start : kNone)};
     }
 
     // Whether all handles are as they should be.

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <optional>
+#include <sstream>
 #include <string>
 #include <TAVO/xml.h>
 #include <utility>
@@ -453,29 +454,17 @@ private:
     // --- the message ---
 
     std::u16string Message(const Error& error) const {
-        static const char* const kTexts[] = {"Bad file",
-                                             "End of file",
-                                             "Open comment",
-                                             "Open string",
-                                             "Open enclosure",
-                                             "Invalid tag",
-                                             "Bad attribute",
-                                             "Bad escape",
-                                             "External replacement",
-                                             "Open CDATA section",
-                                             "Bad data terminator",
-                                             "Version != 1.0",
-                                             "Unsupported encoding specified",
-                                             "Bad character encoding",
-                                             "Bad termination tag",
-                                             "Mixed content",
-                                             "Illegal character",
-                                             "Root element missing",
-                                             "DOM error"};
+        std::istringstream texts(
+            "Bad file|End of file|Open comment|Open string|Open enclosure|Invalid tag|Bad attribute|"
+            "Bad escape|External replacement|Open CDATA section|Bad data terminator|"
+            "Version != 1.0|Unsupported encoding specified|Bad character encoding|"
+            "Bad termination tag|Mixed content|Illegal character|Root element missing|DOM error");
+        std::string text;
+        for (unsigned code = 0; code <= error.code; ++code) std::getline(texts, text, '|');
         std::size_t line = 1;
         for (std::size_t i = 0; i < error.offset; ++i) line += At(i) == '\n';
         std::string header("[");
-        header.append(kTexts[error.code]).append(", Line ").append(std::to_string(line));
+        header.append(text).append(", Line ").append(std::to_string(line));
         header.append(", Offset ").append(std::to_string(error.offset)).append("]");
         std::u16string message(header.begin(), header.end());
         std::size_t at = 0;

@@ -38,20 +38,18 @@ inline std::string BytesOf(const std::u16string& units, bool swapped = false) {
     return bytes;
 }
 
-inline Reading OpenUtf8(const std::string& text) {
+template <class... Arguments> Reading OpenText(Arguments... arguments) {
     TAVO::XML::CXMLDoc document;
-    const bool opened = document.OpenDocText(reinterpret_cast<const unsigned char*>(text.c_str()));
+    const bool opened = document.OpenDocText(arguments...);
     const Reading reading = ReadingOf(document);
     EXPECT_EQ(opened, reading.code == 128);
     return reading;
 }
-
+inline Reading OpenUtf8(const std::string& text) {
+    return OpenText(reinterpret_cast<const unsigned char*>(text.c_str()));
+}
 inline Reading OpenUtf16(const std::u16string& text) {
-    TAVO::XML::CXMLDoc document;
-    const bool opened = document.OpenDocText(reinterpret_cast<const unsigned short*>(text.c_str()));
-    const Reading reading = ReadingOf(document);
-    EXPECT_EQ(opened, reading.code == 128);
-    return reading;
+    return OpenText(reinterpret_cast<const unsigned short*>(text.c_str()));
 }
 
 // Raw bytes, right before an inaccessible page; they must not change.
@@ -59,10 +57,7 @@ inline Reading OpenRaw(const std::string& bytes) {
     static const GuardedMemory memory;
     if (bytes.size() > GuardedMemory::kSize) throw std::length_error("too long for guarded memory");
     char* const place = memory.Place(bytes.data(), bytes.size());
-    TAVO::XML::CXMLDoc document;
-    const bool opened = document.OpenDocText(place, bytes.size());
-    const Reading reading = ReadingOf(document);
-    EXPECT_EQ(opened, reading.code == 128);
+    const Reading reading = OpenText(static_cast<void*>(place), static_cast<unsigned long long>(bytes.size()));
     EXPECT_EQ(std::string(place, bytes.size()), bytes) << "the caller's bytes were written";
     return reading;
 }
