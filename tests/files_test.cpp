@@ -60,13 +60,15 @@ TEST_F(FileOpen, FollowsTheTableOfOptions) {
     }
 }
 
-TEST_F(FileOpen, RefusesNullEmptyOpenAndFolders) {
+TEST_F(FileOpen, RefusesNullEmptyOpenAndFoldersAndOnlyReads) {
     Put(path, "x");
     for (const wchar_t* wrong : {static_cast<const wchar_t*>(nullptr), L"", static_cast<const wchar_t*>(folder.Path())})
         EXPECT_FALSE(file.Open(wrong, FileAccessRead, OpenFileExisting) ||
                      file.Open(wrong, FileAccessWrite, OpenFileCreate));
     ASSERT_TRUE(file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting));
     EXPECT_FALSE(file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting)) << "already open";
+    EXPECT_FALSE(file.Write("y", 1, &done) || file.SetEOF() || file.Flush()) << "opened for reading";
+    EXPECT_EQ(done, 0u);
     EXPECT_EQ(file.GetSize(), 1u) << "and still is";
 }
 
@@ -155,21 +157,12 @@ TEST_F(File, PositionsStayInRange) {
     EXPECT_EQ(file.GetSize(), 3u);
 }
 
-TEST_F(File, OpenedForReadingChangesNothing) {
-    Put(path, "abc");
-    ASSERT_TRUE(file.Open(path, FileAccessRead, OpenFileExisting));
-    EXPECT_FALSE(file.Write("x", 1, &done) || file.SetEOF() || file.Flush());
-    EXPECT_EQ(done, 0u);
-    EXPECT_EQ(file.GetSize(), 3u);
-}
-
 TEST_F(File, CrossesFourGiB) {
     constexpr std::size_t k4GiB = std::size_t{1} << 32;
     char buffer[8] = {};
     ASSERT_TRUE(file.Open(path, FileAccessWrite, OpenFileCreate) && file.SetPointer(k4GiB - 2));
     EXPECT_TRUE(file.Write("edge", 4, nullptr));
-    EXPECT_EQ(file.GetPointer(), k4GiB + 2);
-    EXPECT_EQ(file.GetSize(), k4GiB + 2);
+    EXPECT_TRUE(file.GetPointer() == k4GiB + 2 && file.GetSize() == k4GiB + 2);
     EXPECT_TRUE(file.MovePointer(-4) && file.Read(buffer, 8, &done));
     EXPECT_EQ(std::string(buffer, done), "edge");
     EXPECT_TRUE(file.MovePointer(-static_cast<long long>(k4GiB)));
@@ -222,8 +215,7 @@ TEST_F(FileActions, TellFilesFromFolders) {
     const WideText dir = folder / L"dir", missing = folder / L"x";
     Put(path, "");
     EXPECT_TRUE(_CreateDir(dir));
-    EXPECT_FALSE(_CreateDir(dir) || _CreateDir(path)) << "exists";
-    EXPECT_FALSE(_CreateDir(missing + L"/y")) << "one level only";
+    EXPECT_FALSE(_CreateDir(dir) || _CreateDir(path) || _CreateDir(missing + L"/y")) << "one level only";
     EXPECT_TRUE(_TestFileExists(path) && _TestDirExists(dir) && _TestDirExists(dir + L"/") && _TestDirExists(L"."));
     EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(path) || _DeleteFile(dir));
     EXPECT_FALSE(_TestFileExists(missing) || _TestDirExists(missing) || _DeleteFile(missing));

@@ -4,6 +4,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <functional>
 #include <TAVO/threading.h>
 #include <thread>
 #include <vector>
@@ -13,23 +14,19 @@ using TAVO::ulong32;
 
 namespace {
 
-// Whether another thread gets in; it leaves at once.
-template <class Lock> bool LetsIn(const Lock& lock, ulong32 wait = 0) {
-    bool taken = false;
-    std::thread([&] {
-        taken = lock.TryEnter(wait);
-        if (taken) lock.Leave();
-    }).join();
-    return taken;
+// What another thread finds.
+bool Elsewhere(const std::function<bool()>& question) {
+    bool answer = false;
+    std::thread([&] { answer = question(); }).join();
+    return answer;
 }
 
+// Whether another thread gets in; it leaves at once.
+template <class Lock> bool LetsIn(const Lock& lock, ulong32 wait = 0) {
+    return Elsewhere([&] { return lock.TryEnter(wait) && (lock.Leave(), true); });
+}
 bool LetsRead(const CPRWInterlock& lock, ulong32 wait = 0) {
-    bool taken = false;
-    std::thread([&] {
-        taken = lock.TryEnterRead(wait);
-        if (taken) lock.LeaveRead();
-    }).join();
-    return taken;
+    return Elsewhere([&] { return lock.TryEnterRead(wait) && (lock.LeaveRead(), true); });
 }
 
 template <class Lock> class AnyLock : public testing::Test {};
