@@ -9,6 +9,7 @@
 #include <string>
 #include <TAVO/develop.h>
 #include <TAVO/math.h>
+#include <utility>
 #include <vector>
 
 using namespace TAVO;
@@ -42,13 +43,8 @@ struct Reference {
 };
 
 Wide Gcd(Wide x, Wide y) {
-    if (x == 0) return y;
-    for (;;) {
-        y %= x;
-        if (y == 0) return x;
-        x %= y;
-        if (x == 0) return y;
-    }
+    while (x != 0) y = std::exchange(x, y % x);
+    return y;
 }
 Wide Abs(Wide x) { return x < 0 ? -x : x; }
 Wide Low32(Wide x) { return static_cast<long32>(static_cast<ulong32>(x)); }

