@@ -7,57 +7,41 @@
 #include <random>
 
 using namespace TAVO::Files;
-using support::ScratchFolder;
+using CreatePath = support::FileTest;
 using support::WideText;
 
 namespace {
 
 WideText Part(const wchar_t* text, std::size_t length) { return WideText(std::vector<wchar_t>(text, text + length)); }
 
+using Texts = std::vector<WideText>;
+
 struct ParseRow {
     const wchar_t* path;
     ePathRoot kind;
-    const wchar_t *root, *folder, *stem, *extension;
+    Texts parts; // root, folder, stem, extension
 };
 
 const ParseRow kParseRows[] = {
-    {L"name", PathRootNone, L"", L"", L"name", L""},
-    {L"name.ext", PathRootNone, L"", L"", L"name", L".ext"},
-    {L"a.b.c", PathRootNone, L"", L"", L"a.b", L".c"},
-    {L".profile", PathRootNone, L"", L"", L".profile", L""},
-    {L".a.b", PathRootNone, L"", L"", L".a", L".b"},
-    {L"a.", PathRootNone, L"", L"", L"a", L"."},
-    {L".", PathRootNone, L"", L"", L".", L""},
-    {L"..", PathRootNone, L"", L"", L"..", L""},
-    {L"...", PathRootNone, L"", L"", L"..", L"."},
-    {L"x/..", PathRootNone, L"", L"x/", L"..", L""},
-    {L"dir.d/name", PathRootNone, L"", L"dir.d/", L"name", L""},
-    {L"a\\b/c//d.e", PathRootNone, L"", L"a\\b/c//", L"d", L".e"},
-    {L"a/", PathRootNone, L"", L"a/", L"", L""},
-    {L"/", PathRootRooted, L"/", L"", L"", L""},
-    {L"\\a\\b.c", PathRootRooted, L"\\", L"a\\", L"b", L".c"},
-    {L"/home/x", PathRootRooted, L"/", L"home/", L"x", L""},
-    {L"C:", PathRootDriveRelative, L"C:", L"", L"", L""},
-    {L"c:a\\b", PathRootDriveRelative, L"c:", L"a\\", L"b", L""},
-    {L"C:\\", PathRootDrive, L"C:\\", L"", L"", L""},
-    {L"z:/a/b.c", PathRootDrive, L"z:/", L"a/", L"b", L".c"},
-    {L"1:\\a", PathRootNone, L"", L"1:\\", L"a", L""},
-    {L"\u00C4:\\a", PathRootNone, L"", L"\u00C4:\\", L"a", L""},
-    {L"\\\\server\\share", PathRootNetwork, L"\\\\server\\share", L"", L"", L""},
-    {L"\\\\server\\share\\a\\b.c", PathRootNetwork, L"\\\\server\\share\\", L"a\\", L"b", L".c"},
-    {L"//server/share/a", PathRootNetwork, L"//server/share/", L"", L"a", L""},
-    {L"\\\\server", PathRootRooted, L"\\", L"\\", L"server", L""},
-    {L"\\\\server\\", PathRootRooted, L"\\", L"\\server\\", L"", L""},
-    {L"\\\\server\\\\x", PathRootRooted, L"\\", L"\\server\\\\", L"x", L""},
-    {L"\\\\\\x", PathRootRooted, L"\\", L"\\\\", L"x", L""},
-    {L"\\\\?\\C:\\a", PathRootDevice, L"\\\\?\\C:\\", L"", L"a", L""},
-    {L"\\\\?\\C:a", PathRootDevice, L"\\\\?\\", L"", L"C:a", L""},
-    {L"\\\\.\\pipe\\x", PathRootDevice, L"\\\\.\\", L"pipe\\", L"x", L""},
-    {L"\\\\?\\UNC\\server\\share\\a", PathRootDevice, L"\\\\?\\UNC\\server\\share\\", L"", L"a", L""},
-    {L"\\\\?\\unc\\server\\share", PathRootDevice, L"\\\\?\\unc\\server\\share", L"", L"", L""},
-    {L"\\\\?\\UNC\\server", PathRootDevice, L"\\\\?\\", L"UNC\\", L"server", L""},
-    {L"\\\\?\\", PathRootDevice, L"\\\\?\\", L"", L"", L""},
-    {L"//./C:/x", PathRootDevice, L"//./C:/", L"", L"x", L""},
+    {L"name.ext", PathRootNone, {L"", L"", L"name", L".ext"}},
+    {L".profile", PathRootNone, {L"", L"", L".profile", L""}},
+    {L".", PathRootNone, {L"", L"", L".", L""}},
+    {L"...", PathRootNone, {L"", L"", L"..", L"."}},
+    {L"a\\b/c//d.e", PathRootNone, {L"", L"a\\b/c//", L"d", L".e"}},
+    {L"a/", PathRootNone, {L"", L"a/", L"", L""}},
+    {L"/", PathRootRooted, {L"/", L"", L"", L""}},
+    {L"c:a\\b", PathRootDriveRelative, {L"c:", L"a\\", L"b", L""}},
+    {L"1:\\a", PathRootNone, {L"", L"1:\\", L"a", L""}},
+    {L"\u00C4:\\a", PathRootNone, {L"", L"\u00C4:\\", L"a", L""}},
+    {L"\\\\server\\share\\a\\b.c", PathRootNetwork, {L"\\\\server\\share\\", L"a\\", L"b", L".c"}},
+    {L"//server/share/a", PathRootNetwork, {L"//server/share/", L"", L"a", L""}},
+    {L"\\\\server", PathRootRooted, {L"\\", L"\\", L"server", L""}},
+    {L"\\\\server\\\\x", PathRootRooted, {L"\\", L"\\server\\\\", L"x", L""}},
+    {L"\\\\?\\C:\\a", PathRootDevice, {L"\\\\?\\C:\\", L"", L"a", L""}},
+    {L"\\\\.\\pipe\\x", PathRootDevice, {L"\\\\.\\", L"pipe\\", L"x", L""}},
+    {L"\\\\?\\UNC\\server\\share\\a", PathRootDevice, {L"\\\\?\\UNC\\server\\share\\", L"", L"a", L""}},
+    {L"\\\\?\\unc\\server\\share", PathRootDevice, {L"\\\\?\\unc\\server\\share", L"", L"", L""}},
+    {L"//./C:/x", PathRootDevice, {L"//./C:/", L"", L"x", L""}},
 };
 
 } // namespace
@@ -70,14 +54,10 @@ TEST(ParsePath, FollowsTheTable) {
         ASSERT_TRUE(FU_ParsePath(row.path, parts) && FU_ParsePath(row.path, texts));
         EXPECT_EQ(parts.eRoot, row.kind);
         EXPECT_EQ(texts.eRoot, row.kind);
-        EXPECT_EQ(Part(parts.pRoot, parts.nRoot), WideText(row.root));
-        EXPECT_EQ(Part(parts.pFolder, parts.nFolder), WideText(row.folder));
-        EXPECT_EQ(Part(parts.pStem, parts.nStem), WideText(row.stem));
-        EXPECT_EQ(Part(parts.pExtension, parts.nExtension), WideText(row.extension));
-        EXPECT_STREQ(*texts.sRoot, row.root);
-        EXPECT_STREQ(*texts.sFolder, row.folder);
-        EXPECT_STREQ(*texts.sStem, row.stem);
-        EXPECT_STREQ(*texts.sExtension, row.extension);
+        EXPECT_EQ((Texts{Part(parts.pRoot, parts.nRoot), Part(parts.pFolder, parts.nFolder),
+                         Part(parts.pStem, parts.nStem), Part(parts.pExtension, parts.nExtension)}),
+                  row.parts);
+        EXPECT_EQ((Texts{*texts.sRoot, *texts.sFolder, *texts.sStem, *texts.sExtension}), row.parts);
         EXPECT_STREQ(*FU_FormatPath(parts), row.path);
         EXPECT_STREQ(*FU_FormatPath(texts), row.path);
     }
@@ -116,22 +96,16 @@ TEST(FormatPath, RestoresWhatWasTakenApart) {
 TEST(FormatPath, PutsInWhatIsMissing) {
     const struct {
         const wchar_t *root, *folder, *stem, *extension, *expected;
-    } kRows[] = {
-        {L"", L"a", L"b", L"c", L"a/b.c"},
-        {L"C:\\", L"a", L"b", L".c", L"C:\\a\\b.c"},
-        {L"", L"a\\b", L"c", L"", L"a\\b\\c"},
-        {L"", L"a/", L"b", L"", L"a/b"},
-        {L"", L"a", L"", L"", L"a"},
-        {L"", L"a", L"", L"txt", L"a/.txt"},
-        {L"//s/x/", L"a\\b", L"c", L"", L"//s/x/a\\b/c"},
-        {L"", L"", L"", L".", L"."},
-    };
+    } kRows[] = {{L"", L"a", L"b", L"c", L"a/b.c"},
+                 {L"C:\\", L"a", L"b", L".c", L"C:\\a\\b.c"},
+                 {L"", L"a\\b", L"c", L"", L"a\\b\\c"},
+                 {L"", L"a/", L"b", L"", L"a/b"},
+                 {L"", L"a", L"", L"", L"a"},
+                 {L"", L"a", L"", L"txt", L"a/.txt"},
+                 {L"//s/x/", L"a\\b", L"c", L"", L"//s/x/a\\b/c"}};
     for (const auto& row : kRows) {
         tagCPATHPARSEINFO info;
-        info.sRoot = row.root;
-        info.sFolder = row.folder;
-        info.sStem = row.stem;
-        info.sExtension = row.extension;
+        info.sRoot = row.root, info.sFolder = row.folder, info.sStem = row.stem, info.sExtension = row.extension;
         EXPECT_STREQ(*FU_FormatPath(info), row.expected);
     }
 }
@@ -165,10 +139,8 @@ TEST(StraightPath, FollowsTheTable) {
     EXPECT_FALSE(FU_IsStraightPath(nullptr));
 }
 
-TEST(CreatePath, MakesEveryMissingFolder) {
-    ScratchFolder folder;
+TEST_F(CreatePath, MakesEveryMissingFolder) {
     EXPECT_TRUE(FU_CreatePath(folder / L"a\\b/c"));
-    EXPECT_TRUE(OS::_TestDirExists(folder / L"a/b/c"));
     EXPECT_TRUE(FU_CreatePath(folder / L"a/b/c")) << "exists already";
     EXPECT_TRUE(FU_CreatePath(folder / L"a//d/e\\")) << "separators twice and at the end";
     EXPECT_TRUE(OS::_TestDirExists(folder / L"a/d/e"));

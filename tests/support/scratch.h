@@ -2,6 +2,7 @@
 // Wide paths and a folder of its own for tests that touch the file system.
 
 #include <algorithm>
+#include <filesystem>
 #include <gtest/gtest.h>
 #include <string>
 #include <TAVO/core.h>
@@ -21,8 +22,7 @@ public:
     operator const wchar_t*() const { return m_units.data(); }
     std::size_t Length() const { return m_units.size() - 1; }
     WideText operator+(const WideText& other) const {
-        auto units = m_units;
-        units.pop_back();
+        std::vector<wchar_t> units(m_units.begin(), m_units.end() - 1);
         units.insert(units.end(), other.m_units.begin(), other.m_units.end() - 1);
         return WideText(units);
     }
@@ -49,46 +49,36 @@ inline std::vector<WideText> List(const wchar_t* folder, const wchar_t* pattern 
 // An empty folder beside the test program; goes with everything in it.
 class ScratchFolder {
 public:
-    ScratchFolder() : m_path(Widen("scratch_" + std::to_string(TAVO::Core::OS::GetTimeNow()) + "_" + Number())) {
-        EXPECT_TRUE(TAVO::Files::FU_CreatePath(m_path));
+    ScratchFolder() { EXPECT_TRUE(TAVO::Files::FU_CreatePath(m_path)); }
+    ~ScratchFolder() {
+        std::error_code failed;
+        std::filesystem::remove_all(std::u16string(&m_path[0], &m_path[0] + m_path.Length()), failed);
+        EXPECT_FALSE(failed) << failed.message();
     }
-    ~ScratchFolder() { Remove(m_path); }
 
     const WideText& Path() const { return m_path; }
     WideText operator/(const wchar_t* name) const { return m_path + L"/" + name; }
 
 private:
-    static std::string Number() {
-        static int number = 0;
-        return std::to_string(++number);
-    }
-    static void Remove(const WideText& folder);
-
-    WideText m_path;
+    inline static int g_number = 0;
+    WideText m_path =
+        Widen("scratch_" + std::to_string(TAVO::Core::OS::GetTimeNow()) + "_" + std::to_string(++g_number));
 };
-
-// Removes an empty folder; each platform's tests bring their own.
-void RemoveEmptyFolder(const wchar_t* path);
-
-inline void ScratchFolder::Remove(const WideText& folder) {
-    for (const auto& name : List(folder)) {
-        const WideText path = folder + L"/" + name;
-        if (TAVO::Files::OS::_TestDirExists(path))
-            Remove(path);
-        else
-            TAVO::Files::OS::_DeleteFile(path);
-    }
-    RemoveEmptyFolder(folder);
-}
 
 // Makes a file with the given bytes.
 inline void Put(const wchar_t* path, const std::string& bytes) {
     using namespace TAVO::Files::OS;
     CFile file;
-    TAVO::ulong32 done = 0;
     ASSERT_TRUE(file.Open(path, FileAccessWrite, OpenFileCreate | OpenFileTruncate));
-    ASSERT_TRUE(file.Write(bytes.data(), static_cast<TAVO::ulong32>(bytes.size()), &done));
-    ASSERT_EQ(done, bytes.size());
+    ASSERT_TRUE(file.Write(bytes.data(), static_cast<TAVO::ulong32>(bytes.size()), nullptr));
 }
+
+// A test with a folder, a path in it where no file is yet, and what it takes to use one.
+struct FileTest : testing::Test {
+    ScratchFolder folder;
+    const WideText path = folder / L"file";
+    TAVO::Files::OS::CFile file;
+    TAVO::ulong32 done = 7;
+};
 
 } // namespace support

@@ -30,6 +30,9 @@ inline unsigned KindsThatOpen(const wchar_t* path) {
     return mask;
 }
 
+// The same, asked by another process.
+unsigned KindsThatOpenElsewhere(const wchar_t* path);
+
 inline unsigned KindsThatMayMeet(unsigned held) {
     unsigned mask = 0;
     for (unsigned kind = 0; kind < kSharingKinds; ++kind) mask |= MayMeet(held, kind) ? 1u << kind : 0;

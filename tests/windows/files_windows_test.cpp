@@ -3,26 +3,19 @@
 #include "support/scratch.h"
 #include "support/sharing.h"
 
-#include <algorithm>
 #include <windows.h>
 
 using namespace TAVO::Files::OS;
-using support::Put;
-using support::ScratchFolder;
-using support::WideText;
+using FileActions = support::FileTest;
 
-void support::RemoveEmptyFolder(const wchar_t* path) { RemoveDirectoryW(path); }
-
-// Run by the test below as a process of its own.
+// Run by KindsThatOpenElsewhere as a process of its own.
 TEST(FileSharingChild, DISABLED_OpensEveryKind) {
     wchar_t path[MAX_PATH];
     ASSERT_NE(GetEnvironmentVariableW(L"TAVO_SHARED_FILE", path, MAX_PATH), 0u);
     TerminateProcess(GetCurrentProcess(), support::KindsThatOpen(path));
 }
 
-namespace {
-
-DWORD RunChild(const wchar_t* sharedFile) {
+unsigned support::KindsThatOpenElsewhere(const wchar_t* sharedFile) {
     SetEnvironmentVariableW(L"TAVO_SHARED_FILE", sharedFile);
     wchar_t program[MAX_PATH];
     GetModuleFileNameW(nullptr, program, MAX_PATH);
@@ -39,24 +32,8 @@ DWORD RunChild(const wchar_t* sharedFile) {
     return code;
 }
 
-} // namespace
-
-TEST(FileSharing, All64PairsAnswerInAnotherProcess) {
-    ScratchFolder folder;
-    const WideText path = folder / L"file";
-    Put(path, "x");
-    for (unsigned kind = 0; kind < support::kSharingKinds; ++kind) {
-        CFile first;
-        ASSERT_TRUE(support::OpenAsKind(first, path, kind)) << kind;
-        EXPECT_EQ(RunChild(path), support::KindsThatMayMeet(kind)) << kind;
-    }
-}
-
-TEST(FileActions, LeaveOpenAndReadOnlyFilesAlone) {
-    ScratchFolder folder;
-    const WideText path = folder / L"file";
-    Put(path, "x");
-    CFile file;
+TEST_F(FileActions, LeaveOpenAndReadOnlyFilesAlone) {
+    support::Put(path, "x");
     ASSERT_TRUE(file.Open(path, FileAccessRead, OpenFileExisting));
     EXPECT_FALSE(_DeleteFile(path));
     file.Close();
