@@ -4,6 +4,7 @@
 #include "support/heapwatch.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <gtest/gtest.h>
 #include <random>
@@ -18,8 +19,8 @@ namespace {
 constexpr std::size_t kHuge = ~std::size_t{0};
 
 // What payloads were asked to do.
-int g_cloned, g_finalized;
-std::size_t g_finalizedBytes;
+std::atomic<int> g_cloned, g_finalized;
+std::atomic<std::size_t> g_finalizedBytes;
 
 void CreateNothing(void*, std::size_t) {}
 void CloneCounted(void* target, const void* source, std::size_t bytes) {
@@ -64,7 +65,7 @@ constexpr ConstantBlock kVeryStatic{{-7, 16, 8, &kCounted}, "static payload."};
 
 class ObjectMemory : public testing::Test {
 protected:
-    void SetUp() override { g_cloned = g_finalized = 0; }
+    void SetUp() override { g_cloned = 0, g_finalized = 0; }
     support::Assertions m_assertions;
 };
 
