@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <chrono>
 #include <gtest/gtest.h>
 #include <optional>
 #include <string>
@@ -380,7 +381,9 @@ TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
 TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
     std::atomic<bool> stop{false};
     std::thread sweeper([&] {
-        while (!stop) CStringPool::Collect(1), CStringPool::GetSize();
+        // With pauses: the lock makes no promise of turns, and a loop without any could keep the others out for long.
+        for (; !stop; std::this_thread::sleep_for(std::chrono::milliseconds(1)))
+            CStringPool::Collect(1), CStringPool::GetSize();
     });
     std::vector<std::thread> threads;
     std::atomic<int> wrong{0};
