@@ -6,6 +6,8 @@
 // and a sleeper that arrives just then would be missed; so whoever is about to sleep says so and then makes all
 // processors pass a barrier. After that, either the holder sees the sleeper or the sleeper sees the lock free. Where
 // the system offers no such barrier, leaving pays for one.
+//
+// The lock makes no promise of turns: a thread that takes it again and again without a pause can keep sleepers waiting.
 
 #include "platform/platform.h"
 #include "simd.h"
