@@ -1,20 +1,16 @@
 // Locks over the primitives of Boost.Thread: ownership, re-entrance, time-outs. Their exceptions end here.
 
-#include "diagnostics.h"
-#include "platform/platform.h"
+#include "threadblocks.h"
 
 #include <atomic>
 #include <boost/thread/mutex.hpp>
 #include <boost/thread/shared_mutex.hpp>
 #include <chrono>
-#include <new>
 #include <TAVO/threading.h>
 
 namespace TAVO::Threading {
 
 namespace {
-
-using Buffers::tagCPOMEMHEADER;
 
 struct MutexState {
     boost::timed_mutex mutex;
@@ -35,33 +31,6 @@ struct InterlockState {
     std::atomic<std::uint16_t> nestedReads{0};
     std::atomic<std::uint16_t> nestedWrites{0};
 };
-
-// --- blocks ---------------------------------------------------------------------------------------------------------
-
-template <class State> void Create(void* payload, std::size_t) {
-    static_assert(alignof(State) <= 16, "blocks are aligned to 16");
-    new (payload) State;
-}
-
-template <class State> void Finalize(void* payload, std::size_t) { static_cast<State*>(payload)->~State(); }
-
-void* NoInterface(void*, const _acfUID&) { return nullptr; }
-
-// A lock cannot be copied: every copy of a handle is the same lock.
-template <class State>
-constexpr Buffers::tagCPOVTABL kLockTable = {Create<State>, nullptr, Finalize<State>, NoInterface};
-
-// Builds the lock in a new block (null passes); null when the system has no lock to give.
-tagCPOMEMHEADER* Built(tagCPOMEMHEADER* block) noexcept {
-    if (!block) return nullptr;
-    try {
-        block->pVTbl->create(block + 1, block->sUsed);
-        return block;
-    } catch (...) {
-        Core::OS::_ffree(block);
-        return nullptr;
-    }
-}
 
 // --- waiting --------------------------------------------------------------------------------------------------------
 
@@ -86,19 +55,6 @@ SystemClock::time_point DeadlineIn(ulong32 ms) {
     return SystemClock::now() + SystemClock::duration(kTicksPerMillisecond * ms);
 }
 
-// Takes the lock however often the primitive fails (it has no memory, or too many wait already).
-template <class Take> void TakeSurely(Take take) noexcept {
-    for (;;) {
-        try {
-            take();
-            return;
-        } catch (...) {
-            diagnostics::IllegalCodePoint("Threading: the system failed to take a lock");
-            Platform::SleepMilliseconds(1);
-        }
-    }
-}
-
 template <class Take> bool TakeOrFail(Take take) noexcept {
     try {
         return take();
@@ -109,7 +65,7 @@ template <class Take> bool TakeOrFail(Take take) noexcept {
 
 template <class Mutex> bool TakeWithin(Mutex& mutex, ulong32 ms) noexcept {
     if (ms == WaitForever) {
-        TakeSurely([&] { mutex.lock(); });
+        detail::TakeSurely([&] { mutex.lock(); });
         return true;
     }
     // A timed attempt of a writer would hold new readers back for a moment, which one that does not wait must not do.
@@ -119,7 +75,7 @@ template <class Mutex> bool TakeWithin(Mutex& mutex, ulong32 ms) noexcept {
 
 bool TakeSharedWithin(boost::shared_mutex& mutex, ulong32 ms) noexcept {
     if (ms == WaitForever) {
-        TakeSurely([&] { mutex.lock_shared(); });
+        detail::TakeSurely([&] { mutex.lock_shared(); });
         return true;
     }
     if (ms == 0) return TakeOrFail([&] { return mutex.try_lock_shared(); });
@@ -160,33 +116,31 @@ bool Unnest(std::atomic<std::uint16_t>& count) {
     return true;
 }
 
-template <class State> State* StateOf(void* payload) { return static_cast<State*>(payload); }
-
 } // namespace
 
 // --- CPMutex --------------------------------------------------------------------------------------------------------
 
-const Buffers::tagCPOVTABL CPMutex::_vtbl = kLockTable<MutexState>;
+const Buffers::tagCPOVTABL CPMutex::_vtbl = detail::kTable<MutexState>;
 
-CPMutex::CPMutex() noexcept : CPObjectMemory(Built(NewBlock(sizeof(MutexState), sizeof(MutexState), &_vtbl))) {}
+CPMutex::CPMutex() noexcept : CPObjectMemory(detail::Built(NewBlock(sizeof(MutexState), sizeof(MutexState), &_vtbl))) {}
 
 void CPMutex::Enter() const noexcept { TryEnter(WaitForever); }
 
 bool CPMutex::TryEnter(ulong32 ms) const noexcept {
-    auto* state = StateOf<MutexState>(Payload());
+    auto* state = detail::StateOf<MutexState>(Payload());
     return state && TakeWithin(state->mutex, ms);
 }
 
 void CPMutex::Leave() const noexcept {
-    if (auto* state = StateOf<MutexState>(Payload())) state->mutex.unlock();
+    if (auto* state = detail::StateOf<MutexState>(Payload())) state->mutex.unlock();
 }
 
 // --- CPCriticalSection ----------------------------------------------------------------------------------------------
 
-const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = kLockTable<CriticalSectionState>;
+const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = detail::kTable<CriticalSectionState>;
 
 CPCriticalSection::CPCriticalSection() noexcept
-    : CPObjectMemory(Built(NewBlock(sizeof(CriticalSectionState), sizeof(CriticalSectionState), &_vtbl))) {}
+    : CPObjectMemory(detail::Built(NewBlock(sizeof(CriticalSectionState), sizeof(CriticalSectionState), &_vtbl))) {}
 
 namespace {
 
@@ -197,7 +151,7 @@ void Own(CriticalSectionState& state, std::uint32_t self) {
 
 // Out of line, so that the owner's way in stays without a frame.
 TAVO_NOINLINE void TakeOwnership(CriticalSectionState& state, std::uint32_t self) noexcept {
-    TakeSurely([&] { state.mutex.lock(); });
+    detail::TakeSurely([&] { state.mutex.lock(); });
     Own(state, self);
 }
 
@@ -210,7 +164,7 @@ TAVO_NOINLINE bool TakeOwnershipWithin(CriticalSectionState& state, std::uint32_
 } // namespace
 
 void CPCriticalSection::Enter() const noexcept {
-    auto* state = StateOf<CriticalSectionState>(Payload());
+    auto* state = detail::StateOf<CriticalSectionState>(Payload());
     if (!state) return;
     const std::uint32_t self = Platform::GetThreadId();
     if (IsHeldBy(state->owner, self)) return StepUp(state->count);
@@ -218,7 +172,7 @@ void CPCriticalSection::Enter() const noexcept {
 }
 
 bool CPCriticalSection::TryEnter(ulong32 ms) const noexcept {
-    auto* state = StateOf<CriticalSectionState>(Payload());
+    auto* state = detail::StateOf<CriticalSectionState>(Payload());
     if (!state) return false;
     const std::uint32_t self = Platform::GetThreadId();
     if (!IsHeldBy(state->owner, self)) return TakeOwnershipWithin(*state, self, ms);
@@ -227,7 +181,7 @@ bool CPCriticalSection::TryEnter(ulong32 ms) const noexcept {
 }
 
 void CPCriticalSection::Leave() const noexcept {
-    auto* state = StateOf<CriticalSectionState>(Payload());
+    auto* state = detail::StateOf<CriticalSectionState>(Payload());
     if (!state || StepDown(state->count) != 0) return;
     state->owner.store(0, std::memory_order_relaxed);
     state->mutex.unlock();
@@ -235,13 +189,13 @@ void CPCriticalSection::Leave() const noexcept {
 
 // --- CPRWInterlock --------------------------------------------------------------------------------------------------
 
-const Buffers::tagCPOVTABL CPRWInterlock::_vtbl = kLockTable<InterlockState>;
+const Buffers::tagCPOVTABL CPRWInterlock::_vtbl = detail::kTable<InterlockState>;
 
 CPRWInterlock::CPRWInterlock() noexcept
-    : CPObjectMemory(Built(NewBlock(sizeof(InterlockState), sizeof(InterlockState), &_vtbl))) {}
+    : CPObjectMemory(detail::Built(NewBlock(sizeof(InterlockState), sizeof(InterlockState), &_vtbl))) {}
 
 void CPRWInterlock::Enter() const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state) return;
     const std::uint32_t self = Platform::GetThreadId();
     if (IsHeldBy(state->writer, self)) return Nest(state->nestedWrites);
@@ -250,14 +204,14 @@ void CPRWInterlock::Enter() const noexcept {
 }
 
 void CPRWInterlock::EnterRead() const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state) return;
     if (IsHeldBy(state->writer, Platform::GetThreadId())) return Nest(state->nestedReads);
     TakeSharedWithin(state->mutex, WaitForever);
 }
 
 bool CPRWInterlock::TryEnter(ulong32 ms) const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state) return false;
     const std::uint32_t self = Platform::GetThreadId();
     if (IsHeldBy(state->writer, self)) return TryNest(state->nestedWrites);
@@ -267,21 +221,21 @@ bool CPRWInterlock::TryEnter(ulong32 ms) const noexcept {
 }
 
 bool CPRWInterlock::TryEnterRead(ulong32 ms) const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state) return false;
     if (IsHeldBy(state->writer, Platform::GetThreadId())) return TryNest(state->nestedReads);
     return TakeSharedWithin(state->mutex, ms);
 }
 
 void CPRWInterlock::Leave() const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state || Unnest(state->nestedWrites)) return;
     state->writer.store(0, std::memory_order_relaxed);
     state->mutex.unlock();
 }
 
 void CPRWInterlock::LeaveRead() const noexcept {
-    auto* state = StateOf<InterlockState>(Payload());
+    auto* state = detail::StateOf<InterlockState>(Payload());
     if (!state || Unnest(state->nestedReads)) return;
     state->mutex.unlock_shared();
 }

@@ -22,6 +22,9 @@ enum Identity {
     Mutex,
     CriticalSection,
     RWInterlock,
+    Event,
+    MultipleEvent,
+    Thread,
     TextOfTrue,
     TextOfFalse,
     TextOfEmpty,
@@ -40,6 +43,9 @@ constexpr const char* kNames[] = {
     "CPMutex",
     "CPCriticalSection",
     "CPRWInterlock",
+    "CPEvent",
+    "CPMultipleEvent",
+    "CPThread",
     "ptrue",
     "pfalse",
     "pempty",
@@ -82,6 +88,9 @@ const Table g_atLoad = {{
     &TAVO::Threading::CPMutex::_vtbl,
     &TAVO::Threading::CPCriticalSection::_vtbl,
     &TAVO::Threading::CPRWInterlock::_vtbl,
+    &TAVO::Threading::CPEvent::_vtbl,
+    &TAVO::Threading::CPMultipleEvent::_vtbl,
+    &TAVO::Threading::CPThread::_vtbl,
     Text(CPPoolString::ptrue),
     Text(CPPoolString::pfalse),
     Text(CPPoolString::pempty),
@@ -103,6 +112,9 @@ Table ByFunctions() {
         Address(Threading::CPMutex::GetTypeID()),
         Address(Threading::CPCriticalSection::GetTypeID()),
         Address(Threading::CPRWInterlock::GetTypeID()),
+        Address(Threading::CPEvent::GetTypeID()),
+        Address(Threading::CPMultipleEvent::GetTypeID()),
+        Address(Threading::CPThread::GetTypeID()),
         Text(CPPoolString(true)),
         Text(CPPoolString(false)),
         Text(CPPoolString(L"")),
@@ -113,6 +125,17 @@ Table ByFunctions() {
 
 /// The type of a block, as it stands in its header.
 const void* TypeOf(const CPObjectMemory& block) { return Address(block.GetTypeID()); }
+
+// Runs nothing.
+struct Nothing {
+    static constexpr _acfUID uid = {1, 2, 3, {4, 5, 6, 7, 8, 9, 10, 11}};
+    void Run(unsigned long long) {}
+};
+
+struct RunningThread : TAVO::Threading::CPThread {
+    RunningThread() { Execute(TAVO::Threading::CThreadWrapper<Nothing>::Create(), 0); }
+    ~RunningThread() { Wait(TAVO::Threading::WaitForever); } // before a plug-in with its code goes
+};
 
 Table OfValues() {
     using namespace TAVO;
@@ -133,6 +156,9 @@ Table OfValues() {
         TypeOf(Threading::CPMutex()),
         TypeOf(Threading::CPCriticalSection()),
         TypeOf(Threading::CPRWInterlock()),
+        TypeOf(Threading::CPEvent(true)),
+        TypeOf(Threading::CPMultipleEvent()),
+        TypeOf(RunningThread()),
         Text(String::CStringPool::GetStringRefi(L"TRUE")),
         Text(String::CStringPool::GetStringRefi(L"False")),
         Text(String::CStringPool::GetStringRefn(L"text", 0)),

@@ -13,9 +13,9 @@
 #include <link.h>
 #include <pthread.h>
 #include <sched.h>
+#include <sys/syscall.h>
 #include <sys/uio.h>
 #include <time.h>
-#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace TAVO::Platform {
@@ -528,6 +528,7 @@ constinit thread_local std::uint32_t t_id = 0; // declared with its access model
 namespace {
 
 TAVO_THREAD_FIELD int t_priority = 0;
+TAVO_THREAD_FIELD bool t_own = false;
 TAVO_THREAD_FIELD void* t_releaseScope = nullptr;
 
 } // namespace
@@ -544,6 +545,9 @@ TAVO_NOINLINE std::uint32_t TakeThreadId() noexcept {
 
 int GetThreadPriority() noexcept { return t_priority; }
 void SetThreadPriority(int priority) noexcept { t_priority = priority; }
+
+void MarkOwnThread() noexcept { t_own = true; }
+bool IsOwnThread() noexcept { return t_own; }
 
 void* GetReleaseScope() noexcept { return t_releaseScope; }
 void SetReleaseScope(void* scope) noexcept { t_releaseScope = scope; }

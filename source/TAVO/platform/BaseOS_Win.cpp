@@ -165,6 +165,9 @@ int GetThreadPriority() noexcept {
 
 void SetThreadPriority(int priority) noexcept { ::SetThreadPriority(GetCurrentThread(), priority); }
 
+void MarkOwnThread() noexcept {}
+bool IsOwnThread() noexcept { return true; }
+
 namespace {
 
 // The slot of the release scope. Taken by whoever needs it first, since static constructors of others may be earlier

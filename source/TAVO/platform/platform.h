@@ -91,6 +91,11 @@ inline std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_
 int GetThreadPriority() noexcept;
 void SetThreadPriority(int priority) noexcept;
 
+// Whether the library started the calling thread, which says so itself. Only there may an interruption be let out.
+// Windows: true, since Boost is part of the library there and knows no other threads to interrupt.
+void MarkOwnThread() noexcept;
+bool IsOwnThread() noexcept;
+
 // One pointer per thread, null at first: the thread's current release scope (object memory). Where the system has no
 // slot left, it stays null.
 void* GetReleaseScope() noexcept;

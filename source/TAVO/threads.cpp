@@ -1,0 +1,137 @@
+// Threads over those of Boost.Thread, and what the calling thread may ask for itself.
+
+#include "blocks.h"
+#include "threadblocks.h"
+
+#include <boost/thread/thread_only.hpp>
+#include <optional>
+#include <TAVO/threading.h>
+
+namespace TAVO::Threading {
+
+namespace {
+
+using Buffers::Block;
+using Buffers::CPObjectMemory;
+using SteadyClock = boost::chrono::steady_clock;
+
+SteadyClock::time_point DeadlineIn(ulong32 ms) { return SteadyClock::now() + boost::chrono::milliseconds(ms); }
+
+struct ThreadState {
+    // The last handle may go on the thread itself, which cannot be joined there: never wait here.
+    ~ThreadState() { thread.detach(); }
+
+    bool IsCurrent() const { return thread.get_id() == boost::this_thread::get_id(); }
+
+    boost::thread thread; // joinable until it was waited for or given up
+};
+
+// What runs on the new thread: it keeps the object, and knows where its interface lies.
+class _cThreadFunctor {
+public:
+    _cThreadFunctor(const CPObjectMemory& object, std::size_t position, unsigned long long parameter)
+        : m_object(object), m_position(position), m_parameter(parameter) {}
+
+    void operator()() noexcept {
+        Platform::MarkOwnThread();
+        const CPObjectMemory object(std::move(m_object)); // goes with the run, while handles of the thread may stay
+        try {
+            reinterpret_cast<IThreadExecute*>(Block::PayloadOf<char>(object) + m_position)->Run(m_parameter);
+        } catch (...) { // an interruption, too: the thread ends here either way
+        }
+    }
+
+private:
+    CPObjectMemory m_object;
+    std::size_t m_position;
+    unsigned long long m_parameter;
+};
+
+// An interruption that the library did not ask for is not let out: it belongs to the host's own use of Boost.
+class OnlyOwnInterruptions {
+public:
+    OnlyOwnInterruptions() {
+        if (!Platform::IsOwnThread()) m_none.emplace();
+    }
+
+private:
+    std::optional<boost::this_thread::disable_interruption> m_none;
+};
+
+} // namespace
+
+const Buffers::tagCPOVTABL CPThread::_vtbl = detail::kTable<ThreadState>;
+
+bool CPThread::Execute(const CPObjectMemory& object, unsigned long long parameter) noexcept {
+    if (m_pMH) return false;
+    const std::size_t position = queryinterface(object, acfTypeOf<IThreadExecute>::uid);
+    if (position == Buffers::NotFound) return false;
+    m_pMH = detail::Built(NewBlock(sizeof(ThreadState), sizeof(ThreadState), &_vtbl));
+    if (!m_pMH) return false;
+    try {
+        detail::StateOf<ThreadState>(Payload())->thread = boost::thread(_cThreadFunctor(object, position, parameter));
+        return true;
+    } catch (...) {
+        free();
+        return false;
+    }
+}
+
+unsigned long long CPThread::Wait(ulong32 ms) {
+    auto* state = detail::StateOf<ThreadState>(Payload());
+    if (!state) return WaitNoState;
+    if (state->IsCurrent()) return WaitTimedOut;
+    const OnlyOwnInterruptions rule;
+    if (ms == WaitForever)
+        state->thread.join();
+    else if (!state->thread.try_join_until(DeadlineIn(ms)))
+        return WaitTimedOut;
+    free();
+    return 0;
+}
+
+bool CPThread::Terminate() noexcept {
+    constexpr ulong32 kPatience = 5000;
+    auto* state = detail::StateOf<ThreadState>(Payload());
+    if (!state) return true;
+    bool ended = true;
+    if (state->thread.joinable()) {
+        state->thread.interrupt();
+        const boost::this_thread::disable_interruption theHandleMustBeReleased;
+        ended = !state->IsCurrent() && state->thread.try_join_until(DeadlineIn(kPatience));
+        if (!ended) state->thread.detach();
+    }
+    free();
+    return ended;
+}
+
+namespace CurrentThread {
+
+void sleep(ulong32 ms) {
+    if (ms == 0) return;
+    const OnlyOwnInterruptions rule;
+    boost::this_thread::sleep_until(DeadlineIn(ms));
+}
+
+namespace OS {
+
+void SetThreadPriority(eThreadPriority priority) noexcept {
+    constexpr int kIdle = -15, kLowest = -2, kNormal = 0, kHighest = 2, kTimeCritical = 15;
+    constexpr int kLevels[] = {kIdle, kLowest, kNormal, kHighest, kTimeCritical};
+    const bool known = priority >= ThreadPriorityIdle && priority <= ThreadPriorityTimeCritical;
+    Platform::SetThreadPriority(known ? kLevels[priority - ThreadPriorityIdle] : kNormal);
+}
+
+eThreadPriority GetThreadPriority() noexcept {
+    const int priority = Platform::GetThreadPriority();
+    if (priority == 0) return ThreadPriorityNormal;
+    // Intended: one step above or below normal reads as high or low, which would be set as two steps. A textbook would
+    // give back what it can set; hosts compare with the five levels.
+    if (priority > 0) return priority <= 2 ? ThreadPriorityHigh : ThreadPriorityTimeCritical;
+    return priority >= -2 ? ThreadPriorityLow : ThreadPriorityIdle;
+}
+
+} // namespace OS
+} // namespace CurrentThread
+
+} // namespace TAVO::Threading
