@@ -18,12 +18,14 @@ using SteadyClock = boost::chrono::steady_clock;
 SteadyClock::time_point DeadlineIn(ulong32 ms) { return SteadyClock::now() + boost::chrono::milliseconds(ms); }
 
 struct ThreadState {
-    // The last handle may go on the thread itself, which cannot be joined there: never wait here.
+    // Intended: a thread whose last handle goes runs on by itself. A textbook would wait for it or end the process; but
+    // the last handle may go on the thread itself, and hosts start threads that they never look after.
     ~ThreadState() { thread.detach(); }
 
     bool IsCurrent() const { return thread.get_id() == boost::this_thread::get_id(); }
 
-    boost::thread thread; // joinable until it was waited for or given up
+    boost::thread thread; // joinable until it was waited for or left to itself
+    bool left = false;
 };
 
 // What runs on the new thread: it keeps the object, and knows where its interface lies.
@@ -34,11 +36,12 @@ public:
 
     void operator()() noexcept {
         Platform::MarkOwnThread();
-        const CPObjectMemory object(std::move(m_object)); // goes with the run, while handles of the thread may stay
         try {
-            reinterpret_cast<IThreadExecute*>(Block::PayloadOf<char>(object) + m_position)->Run(m_parameter);
+            reinterpret_cast<IThreadExecute*>(Block::PayloadOf<char>(m_object) + m_position)->Run(m_parameter);
         } catch (...) { // an interruption, too: the thread ends here either way
         }
+        const boost::this_thread::disable_interruption theRunIsOver; // it is no matter of the object's destructor
+        m_object.free();                                             // handles of the thread may stay
     }
 
 private:
@@ -57,6 +60,34 @@ public:
 private:
     std::optional<boost::this_thread::disable_interruption> m_none;
 };
+
+// Calls what a thread of ours may be interrupted in; nothing else gets out, and counts as false.
+template <class Call> bool Interruptibly(Call call) {
+    const OnlyOwnInterruptions rule;
+    try {
+        return call();
+    } catch (const boost::thread_interrupted&) {
+        throw;
+    } catch (...) {
+        return false;
+    }
+}
+
+bool JoinWithin(boost::thread& thread, ulong32 ms) {
+    if (ms != WaitForever) return thread.try_join_until(DeadlineIn(ms));
+    thread.join();
+    return true;
+}
+
+bool EndsWithin(boost::thread& thread, ulong32 ms) noexcept {
+    const boost::this_thread::disable_interruption theHandleMustBeReleased;
+    try {
+        thread.interrupt();
+        return thread.get_id() != boost::this_thread::get_id() && JoinWithin(thread, ms);
+    } catch (...) {
+        return false;
+    }
+}
 
 } // namespace
 
@@ -80,12 +111,9 @@ bool CPThread::Execute(const CPObjectMemory& object, unsigned long long paramete
 unsigned long long CPThread::Wait(ulong32 ms) {
     auto* state = detail::StateOf<ThreadState>(Payload());
     if (!state) return WaitNoState;
-    if (state->IsCurrent()) return WaitTimedOut;
-    const OnlyOwnInterruptions rule;
-    if (ms == WaitForever)
-        state->thread.join();
-    else if (!state->thread.try_join_until(DeadlineIn(ms)))
-        return WaitTimedOut;
+    if (state->left || state->IsCurrent()) return WaitTimedOut;
+    // Where another handle has waited already there is nothing left to join.
+    if (state->thread.joinable() && !Interruptibly([&] { return JoinWithin(state->thread, ms); })) return WaitTimedOut;
     free();
     return 0;
 }
@@ -94,13 +122,11 @@ bool CPThread::Terminate() noexcept {
     constexpr ulong32 kPatience = 5000;
     auto* state = detail::StateOf<ThreadState>(Payload());
     if (!state) return true;
-    bool ended = true;
-    if (state->thread.joinable()) {
-        state->thread.interrupt();
-        const boost::this_thread::disable_interruption theHandleMustBeReleased;
-        ended = !state->IsCurrent() && state->thread.try_join_until(DeadlineIn(kPatience));
-        if (!ended) state->thread.detach();
+    if (state->thread.joinable() && !EndsWithin(state->thread, kPatience)) {
+        state->thread.detach();
+        state->left = true;
     }
+    const bool ended = !state->left;
     free();
     return ended;
 }
@@ -109,8 +135,10 @@ namespace CurrentThread {
 
 void sleep(ulong32 ms) {
     if (ms == 0) return;
-    const OnlyOwnInterruptions rule;
-    boost::this_thread::sleep_until(DeadlineIn(ms));
+    Interruptibly([until = DeadlineIn(ms)] {
+        boost::this_thread::sleep_until(until);
+        return true;
+    });
 }
 
 namespace OS {
