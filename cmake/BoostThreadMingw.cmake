@@ -15,5 +15,5 @@ target_include_directories(boost_thread SYSTEM PUBLIC "${TAVO_BOOST_INCLUDE}")
 target_compile_definitions(boost_thread
   PUBLIC BOOST_THREAD_USE_LIB BOOST_CHRONO_HEADER_ONLY BOOST_ALL_NO_LIB
   PRIVATE BOOST_THREAD_BUILD_LIB)
-target_compile_options(boost_thread PRIVATE -w)
+target_compile_options(boost_thread PRIVATE -w -fno-threadsafe-statics)
 add_library(Boost::thread ALIAS boost_thread)

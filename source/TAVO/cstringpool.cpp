@@ -7,7 +7,9 @@
 #include "pooltables.h"
 #include "transcoding.h"
 
+#include <atomic>
 #include <cstring>
+#include <mutex>
 #include <new>
 
 namespace TAVO::String {
@@ -38,10 +40,19 @@ struct Pool {
 // Built at load or at first use, whichever is earlier, in storage that no destructor touches: static objects of hosts
 // and plug-ins may use the pool from their constructors and destructors.
 alignas(Pool) unsigned char g_storage[sizeof(Pool)];
+constinit std::atomic<Pool*> g_pool{nullptr};
+
+// Not a local static: the compiler's guard for one takes a thread slot of the process that an unload does not return.
+TAVO_NOINLINE Pool& BuildPool() noexcept {
+    static constinit Platform::Mutex g_building;
+    const std::lock_guard lock(g_building);
+    if (!g_pool) g_pool = ::new (static_cast<void*>(g_storage)) Pool;
+    return *g_pool;
+}
 
 Pool& ThePool() noexcept {
-    static Pool* const pool = ::new (static_cast<void*>(g_storage)) Pool;
-    return *pool;
+    Pool* pool = g_pool.load(std::memory_order_acquire);
+    return TAVO_LIKELY(pool != nullptr) ? *pool : BuildPool();
 }
 
 // Raises what a table found wrong, now that the lock is left: an assertion may show a box, which pumps messages.
