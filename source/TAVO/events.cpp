@@ -4,7 +4,6 @@
 
 #include "blocks.h"
 #include "platform/heap.h"
-#include "simd.h"
 #include "threadblocks.h"
 
 #include <boost/thread/condition_variable.hpp>
@@ -31,18 +30,8 @@ Deadline DeadlineIn(ulong32 ms) {
 
 class Waiter {
 public:
-    enum class Claim { Refused, Awake, Asleep };
-
-    // For whoever sets an event: the wait ends with `index`. After Awake the waiter may be gone at once; after Asleep
-    // it stays until Wake.
-    Claim TryClaim(std::uint64_t index) noexcept {
-        std::uint64_t word = m_word.load(std::memory_order_relaxed);
-        while (word == kAwake || word == kAsleep)
-            if (m_word.compare_exchange_weak(word, index, std::memory_order_acq_rel))
-                return word == kAsleep ? Claim::Asleep : Claim::Awake;
-        return Claim::Refused;
-    }
-
+    // For whoever sets an event: the wait ends with `index`; Wake must follow. False when it has an end already.
+    bool TryClaim(std::uint64_t index) noexcept { return TryEnd(index); }
     void Wake() noexcept {
         boost::unique_lock<boost::mutex> lock(m_mutex, boost::defer_lock);
         detail::TakeSurely([&] { lock.lock(); });
@@ -50,23 +39,13 @@ public:
         m_wake.notify_one(); // under the lock: with its end the waiter may go
     }
 
-    // For the waiter itself: from here on nobody can claim it. False when somebody has.
-    bool Close() noexcept {
-        std::uint64_t word = m_word.load(std::memory_order_relaxed);
-        while (word == kAwake || word == kAsleep)
-            if (m_word.compare_exchange_weak(word, kClosed, std::memory_order_acq_rel)) return true;
-        return false;
-    }
-    // Takes Close back.
-    void Open() noexcept { m_word.store(kAwake, std::memory_order_relaxed); }
+    // For the waiter itself: from here on nobody can claim it. False when somebody has, whom Sleep must wait for.
+    bool Close() noexcept { return TryEnd(kClosed); }
 
-    // Returns claimed, or closed when the time is over or the thread was interrupted.
+    // Returns claimed and woken, or closed when the time is over or the thread was interrupted.
     void Sleep(const Deadline& deadline) noexcept {
-        if (Watch()) return;
         boost::unique_lock<boost::mutex> lock(m_mutex, boost::defer_lock);
         detail::TakeSurely([&] { lock.lock(); });
-        std::uint64_t word = kAwake;
-        if (!m_word.compare_exchange_strong(word, kAsleep, std::memory_order_acq_rel)) return;
         while (!m_woken) {
             const bool over = deadline && SteadyClock::now() >= *deadline;
             if ((over || m_interrupted) && Close()) return;
@@ -82,16 +61,11 @@ public:
     bool IsInterrupted() const noexcept { return m_interrupted; }
 
 private:
-    static constexpr std::uint64_t kAwake = ~0ULL, kAsleep = ~0ULL - 1, kClosed = ~0ULL - 2; // anything else: an index
+    static constexpr std::uint64_t kOpen = ~0ULL, kClosed = ~0ULL - 1; // anything else: an index
 
-    // Hand-overs are quick: looks for a while before the system is asked. True when claimed.
-    bool Watch() const noexcept {
-        constexpr int kLooks = 200;
-        for (int look = 0; look < kLooks; ++look) {
-            if (m_word.load(std::memory_order_acquire) != kAwake) return true;
-            Simd::Pause();
-        }
-        return false;
+    bool TryEnd(std::uint64_t how) noexcept {
+        std::uint64_t word = kOpen;
+        return m_word.compare_exchange_strong(word, how, std::memory_order_acq_rel);
     }
 
     // Until something may have changed. What was interrupted once is not disturbed again: the end is near.
@@ -112,7 +86,7 @@ private:
         }
     }
 
-    std::atomic<std::uint64_t> m_word{kAwake};
+    std::atomic<std::uint64_t> m_word{kOpen};
     bool m_interrupted = false;
     bool m_woken = false; // under m_mutex
     boost::mutex m_mutex;
@@ -189,32 +163,31 @@ private:
     }
 
     TAVO_NOINLINE void SetAwaited() noexcept {
-        Place* sleepers = nullptr;
+        Place* woken = nullptr;
         {
             const std::lock_guard lock(m_mutex);
             if (manual) m_word.exchange(kSet, std::memory_order_acq_rel); // first: whoever is let go must find it set
-            const bool used = LetGo(&sleepers);
+            const bool used = LetGo(&woken);
             if (!manual) m_word.exchange(m_first ? kAwaited : used ? kIdle : kSet, std::memory_order_acq_rel);
         }
         // Each stays where it is until it is woken, and its place with it.
-        while (sleepers) std::exchange(sleepers, sleepers->next)->waiter->Wake();
+        while (woken) std::exchange(woken, woken->next)->waiter->Wake();
     }
 
-    // Claims the first waiter that can be claimed, all of a manual event; true when there was one. Those who sleep are
-    // chained to `sleepers`.
-    bool LetGo(Place** sleepers) noexcept {
-        bool used = false;
-        while (m_first && (manual || !used)) {
+    // Claims the first waiter that can be claimed, all of a manual event; true when there was one. They are chained to
+    // `claimed`.
+    bool LetGo(Place** claimed) noexcept {
+        bool any = false;
+        while (m_first && (manual || !any)) {
             Place& place = *m_first;
-            Remove(place); // before the claim: afterwards the place may be gone
-            const Waiter::Claim claim = place.waiter->TryClaim(place.index);
-            used |= claim != Waiter::Claim::Refused;
-            if (claim != Waiter::Claim::Asleep) continue;
+            Remove(place);
+            if (!place.waiter->TryClaim(place.index)) continue; // it ended otherwise and is about to leave
+            any = true;
             place.next = nullptr;
-            *sleepers = &place;
-            sleepers = &place.next;
+            *claimed = &place;
+            claimed = &place.next;
         }
-        return used;
+        return any;
     }
 
     std::atomic<std::uint32_t> m_word{kIdle};
@@ -272,12 +245,12 @@ std::uint64_t WaitQueued(Places& places, const Deadline& deadline, bool& interru
     for (;;) {
         Waiter waiter;
         std::uint64_t index = WaitTimedOut;
-        const bool slept = QueueAll(places, waiter, index);
-        if (slept) waiter.Sleep(deadline);
+        const bool queued = QueueAll(places, waiter, index);
+        if (queued || waiter.Index() != WaitTimedOut) waiter.Sleep(deadline);
         for (Place& place : places) place.event->Leave(place);
         if (index == WaitTimedOut) index = waiter.Index();
         interrupted = waiter.IsInterrupted();
-        if (slept || index != WaitTimedOut) return index;
+        if (queued || index != WaitTimedOut) return index;
     }
 }
 
