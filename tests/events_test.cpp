@@ -126,6 +126,29 @@ TEST(Events, NoSignalIsLostOrUsedTwice) {
     EXPECT_EQ(second.Wait(0), WaitTimedOut);
 }
 
+TEST(Events, TwoSignalsWhileAWaitBeginsAreTwo) {
+    constexpr int kRounds = 1500;
+    constexpr std::size_t kBetween = 300; // makes the beginning long
+    const CPEvent first(false), last(false);
+    const CPMultipleEvent several;
+    EXPECT_TRUE(several.Attach(first));
+    for (std::size_t i = 0; i < kBetween; ++i) EXPECT_TRUE(several.Attach(CPEvent(false)));
+    EXPECT_TRUE(several.Attach(last));
+    std::atomic<int> used{0};
+    Job waiter([&] {
+        while (used < 2 * kRounds && several.Wait(5000) != WaitTimedOut) ++used;
+    });
+    std::mt19937 random(4);
+    for (int round = 1; round <= kRounds && waiter.State() != ThreadEnded; ++round) {
+        for (auto pause = random() % 4000; pause; --pause) std::atomic_signal_fence(std::memory_order_seq_cst);
+        last.Set();
+        first.Set();
+        while (used < 2 * round && waiter.State() != ThreadEnded) std::this_thread::yield();
+    }
+    EXPECT_EQ(waiter.thread.Wait(60000), 0u);
+    EXPECT_EQ(used, 2 * kRounds);
+}
+
 TEST(Events, AManualOneLetsAllPassAndStaysSet) {
     const CPEvent gate(true);
     for (int round = 0; round < 50; ++round) {
