@@ -13,34 +13,28 @@ using support::Wrapper;
 using TAVO::Buffers::CPObjectMemory;
 
 TEST(Threads, RunAnObjectAndLetItGo) {
-    CPThread thread;
-    EXPECT_EQ(thread.Wait(WaitForever), WaitNoState);
-    EXPECT_TRUE(thread.Terminate()) << "there is none";
-    const CPObjectMemory object = Wrapper::Create();
-    EXPECT_EQ(Wrapper::From(object)->GetState(), ThreadNotStarted);
     const CPEvent begun(false), go(false);
-    std::function<void()> body = [&] {
+    EXPECT_EQ(Wrapper::From(Wrapper::Create())->GetState(), ThreadNotStarted);
+    Job job([&] {
         begun.Set();
         go.Wait(WaitForever);
-    };
-    ASSERT_TRUE(thread.Execute(object, reinterpret_cast<std::size_t>(&body)));
-    EXPECT_FALSE(thread.Execute(object, 0)) << "one thread per handle";
+    });
+    const CPThread copy = job.thread;
     EXPECT_EQ(begun.Wait(60000), 0u);
-    EXPECT_EQ(Wrapper::From(object)->GetState(), ThreadRunning);
-    EXPECT_EQ(thread.Wait(0), WaitTimedOut);
-    EXPECT_EQ(object.lockcnt(), 2u);
-    const CPThread copy = thread;
+    EXPECT_EQ(job.State(), ThreadRunning);
+    EXPECT_FALSE(job.thread.Execute(job.object, 0)) << "one thread per handle";
+    EXPECT_EQ(job.thread.Wait(0), WaitTimedOut);
+    EXPECT_EQ(job.object.lockcnt(), 2u);
     go.Set();
-    EXPECT_EQ(thread.Wait(60000), 0u);
-    EXPECT_EQ(thread.key(), 0u);
-    EXPECT_EQ(object.lockcnt(), 1u) << "also while a handle of the thread is left";
+    EXPECT_EQ(job.thread.Wait(60000), 0u);
+    EXPECT_EQ(job.State(), ThreadEnded);
+    EXPECT_EQ(job.object.lockcnt(), 1u) << "also while a handle of the thread is left";
     EXPECT_EQ(CPThread(copy).Wait(0), 0u) << "what has ended has ended for every handle";
     EXPECT_TRUE(CPThread(copy).Terminate());
-    EXPECT_EQ(Wrapper::From(object)->GetState(), ThreadEnded);
-    ASSERT_TRUE(
-        thread.Execute(object, reinterpret_cast<std::size_t>(&(body = [] { throw std::logic_error("thrown"); }))));
-    EXPECT_EQ(thread.Wait(WaitForever), 0u);
-    EXPECT_EQ(Wrapper::From(object)->GetState(), ThreadFailed);
+    EXPECT_TRUE(job.thread.key() == 0 && job.thread.Terminate() && job.thread.Wait(WaitForever) == WaitNoState);
+    Job failing([] { throw std::logic_error("thrown"); });
+    EXPECT_EQ(failing.thread.Wait(WaitForever), 0u);
+    EXPECT_EQ(failing.State(), ThreadFailed);
 }
 
 TEST(Threads, RefuseWhatTheyCannotRun) {
@@ -61,16 +55,15 @@ TEST(Threads, RefuseWhatTheyCannotRun) {
 
 TEST(Threads, AnswerForTheirClassOnly) {
     const CPObjectMemory object = Wrapper::Create();
-    Wrapper* wrapper = Wrapper::From(object);
+    Wrapper* wrapper = Wrapper::From(object); // at the begin of the payload
     IThreadExecute* execute = wrapper;
-    EXPECT_EQ(execute->QueryInterface(support::Call::uid), &wrapper->Object());
-    EXPECT_EQ(execute->QueryInterface(acfTypeOf<IThreadExecute>::uid), nullptr);
-    void* payload = wrapper; // the block begins with it
-    EXPECT_EQ(Wrapper::_vtbl.queryinterface(payload, acfTypeOf<IThreadExecute>::uid), execute);
-    EXPECT_EQ(Wrapper::_vtbl.queryinterface(payload, support::Call::uid), &wrapper->Object());
     _acfUID other = support::Call::uid;
     ++other.Data4[7];
-    EXPECT_EQ(Wrapper::_vtbl.queryinterface(payload, other), nullptr);
+    const auto query = Wrapper::_vtbl.queryinterface;
+    EXPECT_EQ(query(wrapper, acfTypeOf<IThreadExecute>::uid), execute);
+    EXPECT_EQ(execute->QueryInterface(acfTypeOf<IThreadExecute>::uid), nullptr);
+    EXPECT_TRUE(query(wrapper, support::Call::uid) == &wrapper->Object() && !query(wrapper, other));
+    EXPECT_EQ(execute->QueryInterface(support::Call::uid), &wrapper->Object());
     EXPECT_EQ(Wrapper::From(CPEvent(true)), nullptr);
 }
 
@@ -109,63 +102,44 @@ TEST(Threads, EndAtEveryInterruptionPoint) {
 
 TEST(Threads, AreLeftToThemselvesAfterFiveSeconds) {
     std::atomic<bool> go{false};
-    const CPEvent ended(false);
     Job job([&] {
         while (!go) std::this_thread::yield();
-        ended.Set();
     });
     CPThread copy = job.thread;
     const auto start = std::chrono::steady_clock::now();
     EXPECT_FALSE(job.thread.Terminate());
-    const std::chrono::duration<double> taken = std::chrono::steady_clock::now() - start;
-    EXPECT_GE(taken.count(), 4.99);
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(4990));
     EXPECT_EQ(job.thread.key(), 0u);
-    EXPECT_EQ(copy.Wait(0), WaitTimedOut) << "nobody can tell any more";
+    EXPECT_EQ(copy.Wait(WaitForever), WaitTimedOut) << "nobody can tell any more";
     EXPECT_FALSE(copy.Terminate());
     go = true;
-    EXPECT_EQ(ended.Wait(60000), 0u);
-    while (job.object.lockcnt() > 1) std::this_thread::yield();
 }
 
 TEST(Threads, CannotWaitForThemselves) {
     const CPEvent go(false);
-    CPThread thread;
-    unsigned long long waited = 7;
-    bool terminated = true, interrupted = false;
-    std::function<void()> body = [&] {
+    bool interrupted = false;
+    Job job([&] {
         go.Wait(WaitForever); // until the handle is complete
-        CPThread self = thread;
-        waited = self.Wait(WaitForever);
-        terminated = self.Terminate();
-        try {
-            CurrentThread::sleep(100000);
-        } catch (...) {
-            interrupted = true;
-            throw;
-        }
-    };
-    const CPObjectMemory object = Wrapper::Create();
-    ASSERT_TRUE(thread.Execute(object, reinterpret_cast<std::size_t>(&body)));
+        CPThread self = job.thread;
+        EXPECT_EQ(self.Wait(WaitForever), WaitTimedOut);
+        EXPECT_FALSE(self.Terminate());
+        interrupted = true;
+        CurrentThread::sleep(100000);
+        interrupted = false;
+    });
     go.Set();
-    while (object.lockcnt() > 1) std::this_thread::yield(); // it was detached
-    EXPECT_EQ(waited, WaitTimedOut);
-    EXPECT_FALSE(terminated);
+    while (job.object.lockcnt() > 1) std::this_thread::yield(); // it was detached
     EXPECT_TRUE(interrupted);
+    EXPECT_EQ(job.State(), ThreadFailed);
 }
 
 TEST(Threads, RunOnWithoutHandles_Intended) {
     const CPEvent go(false), ended(false);
-    std::function<void()> body = [&] {
+    Job job([&] {
         go.Wait(WaitForever);
         ended.Set();
-    };
-    CPObjectMemory object = Wrapper::Create();
-    {
-        CPThread thread;
-        ASSERT_TRUE(thread.Execute(object, reinterpret_cast<std::size_t>(&body)));
-    }
-    EXPECT_EQ(object.lockcnt(), 2u);
+    });
+    job.thread.free();
     go.Set();
     EXPECT_EQ(ended.Wait(60000), 0u);
-    while (object.lockcnt() > 1) std::this_thread::yield();
 }

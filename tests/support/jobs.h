@@ -3,6 +3,7 @@
 
 #include <functional>
 #include <TAVO/threading.h>
+#include <thread>
 
 namespace support {
 
@@ -12,12 +13,15 @@ struct Call {
 };
 using Wrapper = TAVO::Threading::CThreadWrapper<Call>;
 
-// A thread that runs `body`; must be waited for before it goes.
+// A thread that runs `body`. Waits for its end, also when the thread was left to itself.
 struct Job {
     explicit Job(std::function<void()> work) : body(std::move(work)), object(Wrapper::Create()) {
         thread.Execute(object, reinterpret_cast<std::size_t>(&body));
     }
-    ~Job() { thread.Wait(TAVO::Threading::WaitForever); }
+    ~Job() {
+        thread.Wait(TAVO::Threading::WaitForever);
+        while (object.lockcnt() > 1) std::this_thread::yield();
+    }
     Job(const Job&) = delete;
     Job& operator=(const Job&) = delete;
 
