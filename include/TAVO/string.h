@@ -435,6 +435,13 @@ public:
     static unsigned long long GetSize() noexcept;
     /// The number of entries.
     static unsigned long long GetNItems() noexcept;
+
+    /// Starts the background sweeps alone, which TAVO::AppInit does too: creates the pool's maintenance request and
+    /// registers it; it runs while the maintenance thread does. False when there is one already, so an AppInit of the
+    /// library after this one fails.
+    static bool AppInit() noexcept;
+    /// Stops the background sweeps, waiting for a sweep that runs.
+    static void AppExit() noexcept;
 };
 
 /// Immutable text: a handle of a pool entry, one pointer, never null. The null string is a static entry without text,

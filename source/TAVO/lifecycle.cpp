@@ -2,7 +2,9 @@
 
 #include "lifecycle.h"
 
+#include "maintenance.h"
 #include "poolentry.h"
+#include "poolmaintenance.h"
 
 #include <mutex>
 #include <TAVO/core.h>
@@ -47,13 +49,19 @@ void ReadConfiguration() {
     g_switches.breakOnHResult = Platform::ReadConfigurationInteger(path, kSection, L"BreakOnHRESULT") != 0;
 }
 
-// Takes the library's process-wide objects down, in this one place and order. While the process ends on a system that
-// has killed its other threads by then, nothing is touched.
-struct Unloader {
-    ~Unloader() {
-        if (!IsProcessEnding()) String::pool::Unload();
+// Builds the library's process-wide objects and takes them down, in this one place and order. While the process ends on
+// a system that has killed its other threads by then, nothing is touched; elsewhere a forgotten maintenance thread is
+// given a moment to end, and where it does not, it may go on using everything.
+struct ProcessWide {
+    ProcessWide() { Maintenance::Load(); }
+    ~ProcessWide() {
+        if (IsProcessEnding() || !Maintenance::Unload(kMostMillisecondsToEnd)) return;
+        String::pool::DropMaintenance();
+        String::pool::Unload();
     }
-} g_unloader;
+
+    static constexpr std::uint32_t kMostMillisecondsToEnd = 2000;
+} g_processWide;
 
 } // namespace
 
@@ -93,9 +101,16 @@ bool OnLoad() noexcept {
 void OnProcessEnd() noexcept { g_processEnding = true; }
 bool IsProcessEnding() noexcept { return g_processEnding; }
 
-// The library has no process-wide services so far: upkeep of its own begins and ends here.
-bool StartServices() noexcept { return g_loaded; }
-void StopServices() noexcept {}
+bool StartServices() noexcept {
+    if (!g_loaded) return false; // a load that failed and could not be refused shows here
+    if (Maintenance::IsStopPending()) StopServices();
+    return Maintenance::Start() && String::pool::StartMaintenance();
+}
+
+void StopServices() noexcept {
+    String::pool::StopMaintenance();
+    Maintenance::Stop();
+}
 
 bool CountedServices::Enter() noexcept {
     for (;;) {
@@ -106,8 +121,12 @@ bool CountedServices::Enter() noexcept {
             if (m_count.compare_exchange_weak(count, count + 1)) return true;
             continue;
         }
+        if (m_services.isOwnThread()) {
+            if (m_count.compare_exchange_weak(count, 1)) return false;
+            continue;
+        }
         const std::lock_guard lock(g_lifecycleMutex);
-        if (m_count.compare_exchange_strong(count, 1)) return m_start();
+        if (m_count.compare_exchange_strong(count, 1)) return m_services.start();
     }
 }
 
@@ -120,20 +139,24 @@ void CountedServices::Leave() noexcept {
             if (m_count.compare_exchange_weak(count, count - 1)) return;
             continue;
         }
+        if (m_services.isOwnThread()) {
+            if (m_count.compare_exchange_weak(count, 0)) return m_services.askToStop();
+            continue;
+        }
         const std::lock_guard lock(g_lifecycleMutex);
-        if (m_count.compare_exchange_strong(count, 0)) return m_stop();
+        if (m_count.compare_exchange_strong(count, 0)) return m_services.stop();
     }
 }
 
 namespace {
 
-constinit CountedServices g_services(StartServices, StopServices);
+constinit CountedServices g_services({StartServices, StopServices, Maintenance::IsOwnThread, Maintenance::AskToStop});
 
 } // namespace
 
 bool AppInit() {
     const bool running = g_services.Enter();
-    return running && g_loaded; // a load that failed and could not be refused shows here
+    return running && g_loaded;
 }
 
 void AppExit() { g_services.Leave(); }

@@ -43,12 +43,21 @@ extern Switches g_switches;
 // Held while services start or stop, so that a stop and a start never interleave.
 extern Platform::Mutex g_lifecycleMutex;
 
+// What the counted start and stop work on. A thread of the services' own must not wait for its own end, so for it the
+// stop is only asked for; the next start or stop brings it to its end.
+struct Services {
+    bool (*start)() noexcept;
+    void (*stop)() noexcept;
+    bool (*isOwnThread)() noexcept;
+    void (*askToStop)() noexcept;
+};
+
 // Counts starts and stops: the call that raises the count to 1 starts, the one that brings it back to 0 stops, both
 // under g_lifecycleMutex. Every other call only counts and returns at once, possibly before a start is through. Any
 // thread.
 class CountedServices {
 public:
-    constexpr CountedServices(bool (*start)() noexcept, void (*stop)() noexcept) : m_start(start), m_stop(stop) {}
+    constexpr explicit CountedServices(const Services& services) : m_services(services) {}
 
     // True when the services run or are being started by another call; false when starting failed, the count stays
     // raised.
@@ -57,8 +66,7 @@ public:
 
 private:
     std::atomic<std::uint32_t> m_count{0};
-    bool (*m_start)() noexcept;
-    void (*m_stop)() noexcept;
+    Services m_services;
 };
 
 // Starts the process-wide services in their order; false when one did not start, those before it stay started.

@@ -10,7 +10,8 @@ using namespace TAVO;
 
 TEST(Services, FailedStartStaysCountedAndTheCountWraps_Intended) {
     static int starts, stops;
-    CountedServices services([]() noexcept { return ++starts, false; }, []() noexcept { ++stops; });
+    CountedServices services({[]() noexcept { return ++starts, false; }, []() noexcept { ++stops; },
+                              []() noexcept { return false; }, []() noexcept {}});
     EXPECT_FALSE(services.Enter());
     EXPECT_TRUE(services.Enter()) << "counts on without trying again";
     EXPECT_EQ(starts, 1);
@@ -29,8 +30,9 @@ TEST(Services, FailedStartStaysCountedAndTheCountWraps_Intended) {
 
 TEST(Services, OfThreadsStartAndStopInTurns) {
     static std::atomic<int> running, faults;
-    CountedServices services([]() noexcept { return running++ == 0 ? true : (++faults, true); },
-                             []() noexcept { faults += --running == 0 ? 0 : 1; });
+    CountedServices services({[]() noexcept { return running++ == 0 ? true : (++faults, true); },
+                              []() noexcept { faults += --running == 0 ? 0 : 1; }, []() noexcept { return false; },
+                              []() noexcept {}});
     std::vector<std::thread> threads;
     for (int t = 0; t < 4; ++t)
         threads.emplace_back([&] {
