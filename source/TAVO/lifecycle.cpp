@@ -2,6 +2,7 @@
 
 #include "lifecycle.h"
 
+#include "classregistry.h"
 #include "poolentry.h"
 
 #include <mutex>
@@ -51,7 +52,9 @@ void ReadConfiguration() {
 // has killed its other threads by then, nothing is touched.
 struct Unloader {
     ~Unloader() {
-        if (!IsProcessEnding()) String::pool::Unload();
+        if (IsProcessEnding()) return;
+        ACF::classes::Unload(); // its records hold pooled strings
+        String::pool::Unload();
     }
 } g_unloader;
 
