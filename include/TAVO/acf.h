@@ -2,6 +2,7 @@
 // The component framework: identifiers and their text, wrappers of interface pointers, the base of components, and the
 // factory and classes of the process. The framework's own interfaces stand in acfbase.h.
 
+#include <atomic>
 #include <cstring>
 #include <TAVO/acfbase.h>
 #include <TAVO/config.h>
@@ -90,15 +91,15 @@ public:
     /// Empty.
     CPIACFUnknown() noexcept : m_pointer(Marked(nullptr)) {}
     /// Takes a reference of its own, of the wrapper's type; the caller keeps the one it has. Null gives an empty one.
-    CPIACFUnknown(IACFUnknown* pointer) noexcept;
-    CPIACFUnknown(const CPIACFUnknown& other) noexcept;
+    CPIACFUnknown(IACFUnknown* pointer) noexcept : CPIACFUnknown(pointer, acfTypeOf<IACFUnknown>::uid) {}
+    CPIACFUnknown(const CPIACFUnknown& other) noexcept : CPIACFUnknown(other._getptr()) {}
     /// Takes over the reference where both have the same type; @p other is empty afterwards.
     CPIACFUnknown(CPIACFUnknown&& other) noexcept;
     /// Assignment queries first; then the old reference goes. The type stays this wrapper's.
     CPIACFUnknown& operator=(IACFUnknown* pointer) noexcept;
     CPIACFUnknown& operator=(const CPIACFUnknown& other) noexcept;
     CPIACFUnknown& operator=(CPIACFUnknown&& other) noexcept;
-    virtual ~CPIACFUnknown();
+    virtual ~CPIACFUnknown() { Drop(); }
 
     /// Becomes empty, then releases the reference. A Release that throws raises an assertion.
     virtual void free() noexcept;
@@ -180,7 +181,7 @@ protected:
     enum class Creation { Component, Instance };
 
     /// @p pointer queried for this wrapper's type; null when it is null or lacks it. The reference is the caller's.
-    IACFUnknown* _addRef(IACFUnknown* pointer) const noexcept;
+    IACFUnknown* _addRef(IACFUnknown* pointer) const noexcept { return Query(pointer, GetType()); }
     /// The interface, resolved; null when empty.
     IACFUnknown* _getptr() const noexcept {
         return Word() & 1 ? Held() : Resolve(); // the mark says: checked
@@ -188,7 +189,9 @@ protected:
     /// Takes over @p pointer as it is, without a new reference, and releases the old one.
     void _assign(IACFUnknown* pointer) noexcept;
 
-    /// A derived wrapper's constructors and assignments: the base cannot ask for the type while it is built.
+    /// For derived wrappers, whose type the base cannot ask for while it is built.
+    CPIACFUnknown(IACFUnknown* pointer, const _acfUID& type) noexcept : m_pointer(Marked(Query(pointer, type))) {}
+    /// A derived wrapper's other constructors and assignments.
     void Copy(const CPIACFUnknown& other) noexcept { _assign(_addRef(other._getptr())); }
     void Take(CPIACFUnknown& other) noexcept;
     /// A derived wrapper's creation calls: into a plain wrapper, then queried for the type.
@@ -196,11 +199,32 @@ protected:
     bool CreateTyped(Creation what, const _acfUID& cls) noexcept;
 
 private:
+    static IACFUnknown* Query(IACFUnknown* pointer, const _acfUID& type) noexcept {
+        if (!pointer) return nullptr;
+        try {
+            IACFUnknown* found = nullptr;
+            return pointer->QueryInterface(type, &found) >= 0 ? found : nullptr;
+        } catch (...) {
+            return nullptr;
+        }
+    }
     std::size_t Word() const noexcept { return reinterpret_cast<std::size_t>(m_pointer); }
     IACFUnknown* Held() const noexcept { return reinterpret_cast<IACFUnknown*>(Word() & ~static_cast<std::size_t>(1)); }
     static IACFUnknown* Marked(IACFUnknown* pointer) noexcept {
         return reinterpret_cast<IACFUnknown*>(reinterpret_cast<std::size_t>(pointer) | 1);
     }
+    // What free and the destructor do.
+    void Drop() noexcept {
+        IACFUnknown* const held = Held();
+        if (!held) return;
+        m_pointer = Marked(nullptr); // before the object hears of it: its end may lead back here
+        try {
+            held->Release();
+        } catch (...) {
+            ReportRelease();
+        }
+    }
+    static void ReportRelease() noexcept;
     IACFUnknown* Resolve() const noexcept;
     bool Create(Creation what, const _acfUID& cls, IACFComponentFactory* factory) noexcept;
 
@@ -213,8 +237,8 @@ private:
 class TAVO_API IPACF : public CPIACFUnknown {
 public:
     explicit IPACF(const _acfUID& type) noexcept : m_type(type) {}
-    IPACF(const _acfUID& type, IACFUnknown* pointer) noexcept : m_type(type) { _assign(_addRef(pointer)); }
-    IPACF(const IPACF& other) noexcept : CPIACFUnknown(), m_type(other.m_type) { Copy(other); }
+    IPACF(const _acfUID& type, IACFUnknown* pointer) noexcept : CPIACFUnknown(pointer, type), m_type(type) {}
+    IPACF(const IPACF& other) noexcept : IPACF(other.m_type, other._getptr()) {}
     IPACF(IPACF&& other) noexcept : m_type(other.m_type) { Take(other); }
     /// Takes over the type, too.
     IPACF& operator=(const IPACF& other) noexcept;
@@ -263,8 +287,8 @@ public:
 
 // Outside the class, not inline: the one exported instantiation must hold them all.
 template <class I> CPACI<I>::CPACI() noexcept {}
-template <class I> CPACI<I>::CPACI(IACFUnknown* pointer) noexcept { _assign(_addRef(pointer)); }
-template <class I> CPACI<I>::CPACI(const CPACI& other) noexcept : CPIACFUnknown() { Copy(other); }
+template <class I> CPACI<I>::CPACI(IACFUnknown* pointer) noexcept : CPIACFUnknown(pointer, acfTypeOf<I>::uid) {}
+template <class I> CPACI<I>::CPACI(const CPACI& other) noexcept : CPIACFUnknown(other._getptr(), acfTypeOf<I>::uid) {}
 template <class I> CPACI<I>::CPACI(CPACI&& other) noexcept : CPIACFUnknown() { Take(other); }
 template <class I> CPACI<I>::CPACI(const CPIACFUnknown& other) noexcept : CPIACFUnknown() { Copy(other); }
 template <class I> CPACI<I>& CPACI<I>::operator=(IACFUnknown* pointer) noexcept {
@@ -348,13 +372,24 @@ protected:
     /// IACFComponent.
     virtual IACFUnknown* _queryinterface(const _acfUID& type);
 
-    std::uint32_t _addRef() noexcept;
-    std::uint32_t _release() noexcept;
+    std::uint32_t _addRef() noexcept {
+        // Only who holds a reference may ask, so a count that is 0 stays 0.
+        if (m_count.load(std::memory_order_relaxed) == 0) return 0;
+        return static_cast<std::uint32_t>(m_count.fetch_add(1) + 1);
+    }
+    std::uint32_t _release() noexcept {
+        if (m_count.load(std::memory_order_relaxed) == 0) return 0;
+        const std::int32_t left = m_count.fetch_sub(1) - 1;
+        if (left == 0) End();
+        return static_cast<std::uint32_t>(left);
+    }
     /// The interface with a reference for the caller, or null.
     IACFUnknown* _queryinterfaceadd(const _acfUID& type);
 
 private:
-    std::int32_t m_count; // 0: static, or being destroyed
+    void End() noexcept;
+
+    std::atomic<std::int32_t> m_count; // 0: static, or being destroyed
 };
 
 /// A component of class @p Component with the interfaces @p Interfaces, each one of them known to acfTypeOf:
@@ -383,7 +418,11 @@ public:
     }
 
     acfResult ACF_CALL QueryInterface(const _acfUID& type, IACFUnknown** out) override {
-        return _cACFUnknown::QueryInterface(type, out);
+        IACFUnknown* const found = out ? Find(type) : nullptr;
+        if (!found) return _cACFUnknown::QueryInterface(type, out);
+        _addRef();
+        *out = found;
+        return acfOk;
     }
     std::uint32_t ACF_CALL AddRef() override { return _addRef(); }
     std::uint32_t ACF_CALL Release() override { return _release(); }
@@ -398,12 +437,19 @@ protected:
         self->~Component();
         Core::OS::_ffree(self);
     }
+    /// For interfaces beyond those of the list; call this one for what is not yours.
     IACFUnknown* _queryinterface(const _acfUID& type) override {
-        IACFUnknown* const found[] = {
-            (cacfuid::Same(type, acfTypeOf<Interfaces>::uid) ? static_cast<Interfaces*>(this) : nullptr)...};
-        for (IACFUnknown* one : found)
-            if (one) return one;
-        return _cACFUnknown::_queryinterface(type);
+        IACFUnknown* const found = Find(type);
+        return found ? found : _cACFUnknown::_queryinterface(type);
+    }
+
+private:
+    IACFUnknown* Find(const _acfUID& type) noexcept {
+        IACFUnknown* found = nullptr;
+        const bool answered[] = {
+            (!found && cacfuid::Same(type, acfTypeOf<Interfaces>::uid) && (found = static_cast<Interfaces*>(this)))...};
+        static_cast<void>(answered);
+        return found;
     }
 };
 

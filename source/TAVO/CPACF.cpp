@@ -10,11 +10,6 @@ template class TAVO_TEMPLATE_DEF CPACI<IACFEnumDefinitions>;
 // --- the wrapper of IACFUnknown, and all wrappers' life
 // ----------------------------------------------------------------
 
-CPIACFUnknown::CPIACFUnknown(IACFUnknown* pointer) noexcept
-    : m_pointer(Marked(Query(pointer, acfTypeOf<IACFUnknown>::uid))) {}
-
-CPIACFUnknown::CPIACFUnknown(const CPIACFUnknown& other) noexcept : CPIACFUnknown(other._getptr()) {}
-
 CPIACFUnknown::CPIACFUnknown(CPIACFUnknown&& other) noexcept : m_pointer(Marked(nullptr)) { Take(other); }
 
 CPIACFUnknown& CPIACFUnknown::operator=(IACFUnknown* pointer) noexcept {
@@ -32,17 +27,14 @@ CPIACFUnknown& CPIACFUnknown::operator=(CPIACFUnknown&& other) noexcept {
     return *this;
 }
 
-CPIACFUnknown::~CPIACFUnknown() { CPIACFUnknown::free(); }
-
 void CPIACFUnknown::free() noexcept {
-    IACFUnknown* const held = Held();
-    m_pointer = Marked(nullptr); // before the object hears of it: its end may lead back here
-    if (held && !ReleaseQuietly(held)) diagnostics::IllegalCodePoint("CPIACFUnknown::free exception");
+    Drop();
+    m_pointer = Marked(nullptr); // also for a word of 0
 }
 
-const _acfUID& CPIACFUnknown::GetType() const noexcept { return acfTypeOf<IACFUnknown>::uid; }
+void CPIACFUnknown::ReportRelease() noexcept { diagnostics::IllegalCodePoint("CPIACFUnknown::free exception"); }
 
-IACFUnknown* CPIACFUnknown::_addRef(IACFUnknown* pointer) const noexcept { return Query(pointer, GetType()); }
+const _acfUID& CPIACFUnknown::GetType() const noexcept { return acfTypeOf<IACFUnknown>::uid; }
 
 void CPIACFUnknown::_assign(IACFUnknown* pointer) noexcept {
     IACFUnknown* const old = Held();

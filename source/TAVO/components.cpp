@@ -1,6 +1,5 @@
 // The base of components and of static class factories.
 
-#include <atomic>
 #include <TAVO/acf.h>
 
 namespace TAVO::ACF {
@@ -32,24 +31,11 @@ IACFUnknown* _cACFUnknown::_queryinterfaceadd(const _acfUID& type) {
     return found;
 }
 
-std::uint32_t _cACFUnknown::_addRef() noexcept {
-    const std::atomic_ref<std::int32_t> count(m_count);
-    // Only who holds a reference may ask, so a count that is 0 stays 0.
-    if (count.load(std::memory_order_relaxed) == 0) return 0;
-    return static_cast<std::uint32_t>(count.fetch_add(1) + 1);
-}
-
-std::uint32_t _cACFUnknown::_release() noexcept {
-    const std::atomic_ref<std::int32_t> count(m_count);
-    if (count.load(std::memory_order_relaxed) == 0) return 0;
-    const std::int32_t left = count.fetch_sub(1) - 1;
-    if (left == 0) {
-        try {
-            destroy();
-        } catch (...) {
-        }
+void _cACFUnknown::End() noexcept {
+    try {
+        destroy();
+    } catch (...) {
     }
-    return static_cast<std::uint32_t>(left);
 }
 
 // --- _csFactory ------------------------------------------------------------------------------------------------------

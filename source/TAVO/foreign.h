@@ -5,17 +5,6 @@
 
 namespace TAVO::ACF {
 
-// The interface `type` of the object, with a reference; null when it has none, and for null.
-inline IACFUnknown* Query(IACFUnknown* object, const _acfUID& type) noexcept {
-    if (!object) return nullptr;
-    try {
-        IACFUnknown* found = nullptr;
-        return object->QueryInterface(type, &found) >= 0 ? found : nullptr;
-    } catch (...) {
-        return nullptr;
-    }
-}
-
 inline bool AddRefQuietly(IACFUnknown* object) noexcept {
     try {
         object->AddRef();
