@@ -92,6 +92,7 @@ public:
     CPIACFUnknown() noexcept : m_pointer(Marked(nullptr)) {}
     /// Takes a reference of its own, of the wrapper's type; the caller keeps the one it has. Null gives an empty one.
     CPIACFUnknown(IACFUnknown* pointer) noexcept : CPIACFUnknown(pointer, acfTypeOf<IACFUnknown>::uid) {}
+    /// Copies query, too: one call of QueryInterface each.
     CPIACFUnknown(const CPIACFUnknown& other) noexcept : CPIACFUnknown(other._getptr()) {}
     /// Takes over the reference where both have the same type; @p other is empty afterwards.
     CPIACFUnknown(CPIACFUnknown&& other) noexcept;
@@ -121,7 +122,8 @@ public:
     /// The object's count of references, by its own account; 0 when empty.
     std::uint32_t GetLockCount() const noexcept;
 
-    /// The one shared object of a class, from the factory. Empties the wrapper first.
+    /// The one shared object of a class, from the factory. Empties the wrapper first, so the factory must have another
+    /// holder.
     /// @return whether the wrapper has a pointer. True also, and the wrapper empty, without a factory: look at the
     ///         wrapper, too.
     bool createComponent(const _acfUID& cls, IACFComponentFactory* factory) noexcept;
@@ -149,9 +151,8 @@ public:
 
     /// Enters a class that this library can then create.
     /// @param category  what enumerations select by; null is no category
-    /// @param names     one or more names, separated by ';', the first is the one to show. Mandatory: without names a
-    /// line
-    ///                  is logged and the answer is false.
+    /// @param names     one or more names, separated by ';', the first is the one to show. Mandatory: without names the
+    ///                  answer is false, and the log says so.
     /// @return false also when the class is registered with other values (the first one stays) and without memory. True
     ///         again for the same four values; that needs no second unregistering.
     static bool Factory_RegisterClass(const _acfUID& cls, const _acfUID& category, const String::CPPoolString& names,

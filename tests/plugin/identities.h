@@ -2,6 +2,7 @@
 // The addresses by which the library tells its types and special strings apart, taken in three ways by whichever module
 // includes this: by its static initialisers, by functions at run time, and from values that the library made.
 
+#include <TAVO/acf.h>
 #include <TAVO/buffers.h>
 #include <TAVO/lookup.h>
 #include <TAVO/string.h>
@@ -22,6 +23,7 @@ enum Identity {
     Mutex,
     CriticalSection,
     RWInterlock,
+    WrapperOfEnumerations,
     TextOfTrue,
     TextOfFalse,
     TextOfEmpty,
@@ -40,6 +42,7 @@ constexpr const char* kNames[] = {
     "CPMutex",
     "CPCriticalSection",
     "CPRWInterlock",
+    "CPACI<IACFEnumDefinitions>",
     "ptrue",
     "pfalse",
     "pempty",
@@ -67,10 +70,17 @@ template <class Number> const void* Address(Number id) {
     return reinterpret_cast<const void*>(static_cast<std::size_t>(id));
 }
 
+// The virtual table, which is the class where modules meet.
+inline const void* VirtualTable(const TAVO::ACF::CPIACFUnknown& wrapper) {
+    return *reinterpret_cast<const void* const*>(&wrapper);
+}
+using EnumWrapper = TAVO::ACF::CPACI<IACFEnumDefinitions>;
+
 // Everything below belongs to one module alone, even where the loader could merge it with another's.
 namespace {
 
 const CPPoolString g_interned(L"interned by every module");
+const EnumWrapper g_wrapper;
 
 const Table g_atLoad = {{
     &CPPlainMemory::_vtbl,
@@ -82,6 +92,7 @@ const Table g_atLoad = {{
     &TAVO::Threading::CPMutex::_vtbl,
     &TAVO::Threading::CPCriticalSection::_vtbl,
     &TAVO::Threading::CPRWInterlock::_vtbl,
+    VirtualTable(g_wrapper),
     Text(CPPoolString::ptrue),
     Text(CPPoolString::pfalse),
     Text(CPPoolString::pempty),
@@ -103,6 +114,7 @@ Table ByFunctions() {
         Address(Threading::CPMutex::GetTypeID()),
         Address(Threading::CPCriticalSection::GetTypeID()),
         Address(Threading::CPRWInterlock::GetTypeID()),
+        VirtualTable(EnumWrapper()),
         Text(CPPoolString(true)),
         Text(CPPoolString(false)),
         Text(CPPoolString(L"")),
@@ -133,6 +145,7 @@ Table OfValues() {
         TypeOf(Threading::CPMutex()),
         TypeOf(Threading::CPCriticalSection()),
         TypeOf(Threading::CPRWInterlock()),
+        VirtualTable(EnumWrapper(g_wrapper)),
         Text(String::CStringPool::GetStringRefi(L"TRUE")),
         Text(String::CStringPool::GetStringRefi(L"False")),
         Text(String::CStringPool::GetStringRefn(L"text", 0)),
