@@ -5,199 +5,150 @@
 #include "support/heapwatch.h"
 
 #include <gtest/gtest.h>
-#include <memory>
 
 using namespace TAVO::ACF;
 using support::Assertions;
-using support::Creation;
-using support::FakeFactory;
+using support::Mode;
 using support::Probe;
-using support::Query;
 using support::Texts;
 
 namespace {
 
-const _acfUID kProbe = acfTypeOf<IProbe>::uid;
-const cacfuid kUnknown = acfTypeOf<IACFUnknown>::uid;
+const cacfuid kProbe = acfTypeOf<IProbe>::uid, kUnknown = acfTypeOf<IACFUnknown>::uid;
 const cacfuid kClass("24508B8F-A78E-4243-9E68-71AA029C838A");
 
 std::size_t Word(CPIACFUnknown& wrapper) { return reinterpret_cast<std::size_t>(*wrapper.rec()); }
 
+// A pointer as a creation call leaves it, with a reference.
+void PutRaw(CPIACFUnknown& wrapper, IACFUnknown& object) {
+    *wrapper.rec() = &object;
+    object.AddRef();
+}
+
 // The three kinds of wrapper; each test of their common life runs for all.
-struct Plain : CPIACFUnknown {
-    using CPIACFUnknown::CPIACFUnknown;
-    using CPIACFUnknown::operator=;
-};
 struct Chosen : IPACF {
-    Chosen() : IPACF(kProbe) {}
-    Chosen(IACFUnknown* pointer) : IPACF(kProbe, pointer) {}
+    Chosen(IACFUnknown* pointer = nullptr) : IPACF(kProbe, pointer) {}
     using IPACF::operator=;
 };
 using Typed = CPACI<IProbe>;
-
 template <class Wrapper> struct WrapperOfAnyKind : testing::Test {
     const cacfuid type = Wrapper().GetType();
     Probe probe;
-
     ~WrapperOfAnyKind() override { EXPECT_EQ(probe.references, 1); }
 };
-using Kinds = testing::Types<Plain, Chosen, Typed>;
+using Kinds = testing::Types<CPIACFUnknown, Chosen, Typed>;
 TYPED_TEST_SUITE(WrapperOfAnyKind, Kinds);
 
 } // namespace
 
 TYPED_TEST(WrapperOfAnyKind, OwnsOneReferenceOfItsType) {
     Probe& probe = this->probe;
-    TypeParam empty;
-    EXPECT_FALSE(empty);
-    EXPECT_EQ(Word(empty), 1u);
-    EXPECT_FALSE(TypeParam(static_cast<IACFUnknown*>(nullptr)));
-
-    TypeParam held(&probe);
+    TypeParam empty, held(&probe);
+    EXPECT_TRUE(!empty && Word(empty) == 1);
     EXPECT_EQ(probe.asked, this->type);
-    EXPECT_EQ(probe.references, 2);
-    EXPECT_EQ(Word(held), reinterpret_cast<std::size_t>(static_cast<IACFUnknown*>(&probe)) | 1);
+    EXPECT_EQ(Word(held), reinterpret_cast<std::size_t>(&probe) | 1);
     EXPECT_EQ(held.GetLockCount(), 2u);
-
     TypeParam copy(held);
     EXPECT_TRUE(copy == held && copy != empty);
     EXPECT_EQ(probe.references, 3);
     EXPECT_EQ(probe.queries, 2) << "a copy queries";
     EXPECT_EQ(probe.asked, this->type);
-
     TypeParam moved(std::move(copy));
     EXPECT_TRUE(moved && !copy);
     EXPECT_EQ(probe.references, 3);
     EXPECT_EQ(probe.queries, 2) << "a move does not";
-
     copy = moved;
     moved = *&moved;
     moved = static_cast<TypeParam&&>(*&moved);
     EXPECT_EQ(probe.references, 4);
     copy = std::move(moved);
-    EXPECT_EQ(probe.references, 3);
     copy = &probe;
     EXPECT_EQ(probe.references, 3);
     copy = empty;
     EXPECT_FALSE(copy);
-    copy.free();
     held.free();
-    EXPECT_EQ(probe.references, 1);
     EXPECT_EQ(Word(held), 1u);
     EXPECT_EQ(held.GetLockCount(), 0u);
 }
 
 TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFails) {
     Probe& probe = this->probe;
-    for (const Query query : {Query::Refuses, Query::Throws, Query::AnswersNull}) {
+    for (const Mode query : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
         const TypeParam good(&probe);
-        probe.query = query;
-        EXPECT_FALSE(TypeParam(&probe));
-        EXPECT_FALSE(TypeParam(good));
-        TypeParam assigned;
-        *assigned.rec() = &probe; // a raw pointer without the type goes back, once
-        probe.AddRef();
-        EXPECT_FALSE(assigned);
-        EXPECT_EQ(Word(assigned), 1u);
-        assigned.free();
-        probe.query = Query::Answers;
-        assigned = &probe;
+        TypeParam assigned(&probe), raw;
+        PutRaw(raw, probe);
         probe.query = query;
         assigned = good;
-        EXPECT_FALSE(assigned);
-        probe.query = Query::Answers;
+        EXPECT_FALSE(TypeParam(&probe) || TypeParam(good) || assigned || raw);
+        EXPECT_EQ(Word(raw), 1u) << "released, once";
+        probe.query = Mode::Gives;
     }
 }
 
 TYPED_TEST(WrapperOfAnyKind, IntendedResolvingKeepsWhatWasStored) {
     Probe& probe = this->probe;
     Probe other;
-    probe.query = Query::AnswersOther;
-    probe.other = &other;
-    {
-        TypeParam raw;
-        *raw.rec() = &probe;
-        probe.AddRef();
-        const TypeParam checked(raw); // resolves, then queries what was answered
-        EXPECT_EQ(probe.references, 1);
-        EXPECT_EQ(other.references, 3);
-        EXPECT_EQ(Word(raw), reinterpret_cast<std::size_t>(static_cast<IACFUnknown*>(&probe)) | 1);
-        probe.AddRef(); // the wrapper releases what it stored, not what it queried
-        raw.free();
-        EXPECT_EQ(probe.references, 1);
-        other.Release();
-    }
-    EXPECT_EQ(other.references, 1);
+    probe.given = &other;
+    TypeParam raw;
+    PutRaw(raw, probe);
+    EXPECT_TRUE(raw);
+    EXPECT_EQ(Word(raw), reinterpret_cast<std::size_t>(&probe) | 1);
+    EXPECT_EQ(probe.references, 1);
+    EXPECT_EQ(other.references, 2);
+    probe.AddRef(); // the wrapper will release what it stored, not what it queried
 }
 
 TYPED_TEST(WrapperOfAnyKind, EndsWellWhenReleaseComesBackOrThrows) {
     Probe& probe = this->probe;
     const Assertions kept;
-    {
-        TypeParam held(&probe);
-        probe.onRelease = [&] { held.free(); };
-        held.free();
-        EXPECT_EQ(probe.references, 1);
-        held = &probe;
-        held = TypeParam(&probe);
-        probe.onRelease = nullptr;
-    }
+    TypeParam held(&probe);
+    probe.onRelease = [&] { held.free(); };
+    held.free();
+    EXPECT_EQ(probe.references, 1);
     probe.releaseThrows = true;
-    { const TypeParam held(&probe); }
+    held = &probe;
+    held.free();
     EXPECT_EQ(Assertions::Take(), Texts{"CPIACFUnknown::free exception"});
-    TypeParam assigned(&probe);
-    assigned = TypeParam();
-    EXPECT_EQ(Assertions::Take(), Texts());
-    EXPECT_FALSE(assigned);
-    probe.releaseThrows = false;
+    held = &probe;
+    held = TypeParam();
+    EXPECT_TRUE(!held && Assertions::Take().empty());
 }
 
-TYPED_TEST(WrapperOfAnyKind, CreatesThroughTheFactoryThatIsGiven) {
-    FakeFactory factory;
-    factory.made = &this->probe;
+TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactories) {
+    support::FakeFactory factory;
     const struct {
-        Creation creation;
-        Query query;
+        Mode creation, query;
         bool created, typed;
     } rows[] = {
-        {Creation::Gives, Query::Answers, true, true},    {Creation::Fails, Query::Answers, false, false},
-        {Creation::Throws, Query::Answers, false, false}, {Creation::GivesNull, Query::Answers, false, false},
-        {Creation::Gives, Query::Refuses, true, false}, // a plain wrapper finds out at its first use
+        {Mode::Gives, Mode::Gives, true, true},    {Mode::Refuses, Mode::Gives, false, false},
+        {Mode::Throws, Mode::Gives, false, false}, {Mode::GivesNull, Mode::Gives, false, false},
+        {Mode::Gives, Mode::Refuses, true, false}, // a plain wrapper finds out at its first use
     };
-    const bool isPlain = this->type == kUnknown;
     for (const auto& row : rows) {
         TypeParam wrapper(&this->probe);
         factory.creation = row.creation;
-        this->probe.query = row.query;
-        EXPECT_EQ(wrapper.createComponent(kClass, &factory), isPlain ? row.created : row.typed);
-        EXPECT_EQ(static_cast<bool>(wrapper), row.typed);
-        EXPECT_EQ(wrapper.createInstance(kClass, &factory), isPlain ? row.created : row.typed);
-        EXPECT_EQ(static_cast<bool>(wrapper), row.typed);
-        EXPECT_EQ(factory.askedClass, kClass);
-        EXPECT_EQ(factory.askedType, kUnknown);
-        EXPECT_EQ(this->probe.references, row.typed ? 2 : 1);
-        this->probe.query = Query::Answers;
+        factory.made.query = row.query;
+        const bool answer = this->type == kUnknown ? row.created : row.typed;
+        EXPECT_TRUE(wrapper.createComponent(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
+        EXPECT_TRUE(wrapper.createInstance(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
+        EXPECT_TRUE(factory.askedClass == kClass && factory.askedType == kUnknown);
+        EXPECT_EQ(factory.made.references, row.typed ? 2 : 1);
     }
-    EXPECT_EQ(factory.components, 5);
-    EXPECT_EQ(factory.instances, 5);
+    EXPECT_TRUE(factory.components == 5 && factory.instances == 5);
 
+    factory.creation = factory.made.query = Mode::Gives;
     TypeParam wrapper(&this->probe);
     EXPECT_FALSE(wrapper.createComponent(kClass) || wrapper) << "no factory of the process";
     ASSERT_TRUE(CPIACFUnknown::Factory_Set(&factory));
-    factory.creation = Creation::Gives;
-    EXPECT_TRUE(wrapper.createComponent(kClass) && wrapper);
-    EXPECT_TRUE(wrapper.createInstance(kClass) && wrapper);
-    EXPECT_EQ(factory.references, 2);
+    EXPECT_TRUE(wrapper.createComponent(kClass) && wrapper && wrapper.createInstance(kClass) && wrapper);
     CPIACFUnknown::Factory_Release();
     EXPECT_EQ(factory.references, 1);
 }
 
 TYPED_TEST(WrapperOfAnyKind, IntendedCreationFromNoFactoryIsTrueAndEmpty) {
     TypeParam wrapper(&this->probe);
-    EXPECT_TRUE(wrapper.createComponent(kClass, nullptr));
-    EXPECT_FALSE(wrapper);
-    EXPECT_TRUE(wrapper.createInstance(kClass, nullptr));
-    EXPECT_FALSE(wrapper);
+    EXPECT_TRUE(wrapper.createComponent(kClass, nullptr) && !wrapper);
+    EXPECT_TRUE(wrapper.createInstance(kClass, nullptr) && !wrapper);
 }
 
 TEST(Wrapper, TakesPointersOfOtherKinds) {
@@ -206,22 +157,15 @@ TEST(Wrapper, TakesPointersOfOtherKinds) {
         Typed typed(&probe);
         CPIACFUnknown plain(typed);
         EXPECT_EQ(probe.asked, kUnknown);
+        probe.asked.reset();
         plain = std::move(typed); // another type: queried, and the source lets go
-        EXPECT_EQ(probe.asked, kUnknown);
-        EXPECT_FALSE(typed);
-        EXPECT_EQ(probe.references, 2);
+        EXPECT_TRUE(probe.asked == kUnknown && !typed && probe.references == 2);
         typed = plain;
-        EXPECT_EQ(probe.asked, cacfuid(kProbe));
-        EXPECT_EQ(typed->Answer() + typed.Get()->Answer(), 84);
-
+        EXPECT_TRUE(probe.asked == kProbe && typed->Answer() == 42);
         IPACF chosen(acfTypeOf<IACFClassFactory>::uid, &probe);
         EXPECT_FALSE(chosen);
         chosen = IPACF(kProbe, &probe); // with its type
-        EXPECT_EQ(cacfuid(chosen.GetType()), cacfuid(kProbe));
-        EXPECT_TRUE(chosen == typed);
-        const IPACF copy(chosen);
-        chosen = copy;
-        EXPECT_TRUE(chosen && cacfuid(copy.GetType()) == cacfuid(kProbe));
+        EXPECT_TRUE(kProbe == chosen.GetType() && chosen == typed);
     }
     EXPECT_EQ(probe.references, 1);
 }
@@ -230,21 +174,16 @@ TEST(Wrapper, ComparesAndCountsWithoutResolving) {
     Probe probe;
     {
         CPIACFUnknown raw, checked(&probe), zero;
-        *raw.rec() = &probe;
+        PutRaw(raw, probe);
         *zero.rec() = nullptr;
-        probe.AddRef();
         EXPECT_TRUE(raw == checked && zero == CPIACFUnknown());
         EXPECT_EQ(raw.GetLockCount(), 3u);
         IACFUnknown* out = nullptr;
-        EXPECT_TRUE(raw.QueryRawInterface(&out));
-        EXPECT_EQ(out, &probe);
+        EXPECT_TRUE(raw.QueryRawInterface(&out) && out == &probe && probe.queries == 1);
         out->Release();
-        EXPECT_EQ(probe.queries, 1);
-        EXPECT_FALSE(raw.QueryRawInterface(nullptr));
-        EXPECT_FALSE(zero.QueryRawInterface(&out) || out || zero);
+        EXPECT_FALSE(raw.QueryRawInterface(nullptr) || zero.QueryRawInterface(&out) || out || zero);
         probe.addRefThrows = true;
-        EXPECT_FALSE(checked.QueryRawInterface(&out) || out);
-        EXPECT_EQ(checked.GetLockCount(), 0u);
+        EXPECT_FALSE(checked.QueryRawInterface(&out) || out || checked.GetLockCount());
         probe.addRefThrows = false;
     }
     EXPECT_EQ(probe.references, 1);
@@ -254,26 +193,19 @@ TEST(Wrapper, ComparesAndCountsWithoutResolving) {
 
 namespace {
 
-struct Sink final : CComponent<Sink, IProbe, IACFDefinitionRegistry> {
-    explicit Sink(int* ends, bool throws = false) : m_ends(ends) {
-        if (throws) throw std::runtime_error("no");
+struct Twofold final : CComponent<Twofold, IProbe, IACFClassFactory> {
+    explicit Twofold(int* ends, bool counted = true) : CComponent(counted), m_ends(ends) {
+        if (!ends) throw "no";
     }
-    ~Sink() {
+    ~Twofold() {
         AddRef(), Release(); // as code does that a destructor calls
         ++*m_ends;
     }
     int ACF_CALL Answer() override { return 7; }
-    acfResult ACF_CALL EnumDefinitions(const _acfUID&, IACFEnumDefinitions**) override { return acfFail; }
-    acfResult ACF_CALL FindDefinition(const _acfUID&, IACFDefinition**) override { return acfFail; }
-    acfResult ACF_CALL FindClass(const wchar_t*, _acfUID*) override { return acfFail; }
+    acfResult ACF_CALL CreateInstance(IACFUnknown*, IACFUnknown*, const _acfUID&, IACFUnknown**) override { return 8; }
 
 private:
     int* m_ends;
-};
-
-struct Fixed final : CComponent<Fixed, IProbe> {
-    Fixed() : CComponent(false) {}
-    int ACF_CALL Answer() override { return 1; }
 };
 
 } // namespace
@@ -281,73 +213,67 @@ struct Fixed final : CComponent<Fixed, IProbe> {
 TEST(Component, IsOneObjectBehindAllItsInterfaces) {
     int ends = 0;
     {
-        const CPIACFUnknown made = Sink::Make(&ends);
+        const CPIACFUnknown made = Twofold::Make(&ends);
         ASSERT_TRUE(made);
         EXPECT_EQ(made.GetLockCount(), 1u);
         const CPACI<IProbe> probe(made);
-        const CPACI<IACFDefinitionRegistry> registry(made);
-        const CPACI<IACFComponent> component(registry);
-        ASSERT_TRUE(probe && registry && component);
-        EXPECT_EQ(probe->Answer(), 7);
-        EXPECT_EQ(registry->FindClass(nullptr, nullptr), acfFail);
-        EXPECT_TRUE(CPIACFUnknown(probe) == made && CPIACFUnknown(registry) == made) << "one identity";
+        const CPACI<IACFClassFactory> factory(made);
+        const CPACI<IACFComponent> component(factory);
+        ASSERT_TRUE(probe && factory && component);
+        EXPECT_EQ(probe->Answer() + factory->CreateInstance(nullptr, nullptr, kClass, nullptr), 15);
+        EXPECT_TRUE(CPIACFUnknown(probe) == made && CPIACFUnknown(factory) == made) << "one identity";
         EXPECT_EQ(made.GetLockCount(), 4u);
-        EXPECT_FALSE(CPACI<IACFClassFactory>(made));
-        EXPECT_EQ(registry->QueryInterface(kProbe, nullptr), acfInvalidArgument);
+        EXPECT_FALSE(CPACI<IACFDefinition>(made));
+        EXPECT_EQ(factory->QueryInterface(kProbe, nullptr), acfInvalidArgument);
     }
     EXPECT_EQ(ends, 1);
-    EXPECT_FALSE(Sink::Make(&ends, true));
+    EXPECT_FALSE(Twofold::Make(nullptr));
     support::ForEachFailingAllocation([] {
         int once = 0;
-        const bool there = static_cast<bool>(Sink::Make(&once));
+        const bool there = static_cast<bool>(Twofold::Make(&once));
         EXPECT_EQ(once, there);
     });
 }
 
 TEST(Component, IntendedStaticOnesAreNotCounted) {
-    Fixed fixed;
-    EXPECT_EQ(fixed.AddRef(), 0u);
-    EXPECT_EQ(fixed.Release(), 0u);
+    int ends = 0;
+    Twofold fixed(&ends, false);
+    EXPECT_TRUE(fixed.AddRef() == 0 && fixed.Release() == 0 && ends == 0);
     const CPACI<IProbe> held(static_cast<IProbe*>(&fixed));
-    ASSERT_TRUE(held);
-    EXPECT_EQ(held->Answer(), 1);
+    EXPECT_TRUE(held && held->Answer() == 7);
 }
 
 TEST(ClassFactory, IntendedCountsAndResults) {
     struct Maker final : _csFactory {
-        Creation creation = Creation::Gives;
+        Mode mode = Mode::Gives;
         Probe* probe = nullptr;
         bool Create(const _acfUID& type, IACFUnknown** out) override {
-            if (creation == Creation::Throws) throw std::runtime_error("create");
-            if (creation != Creation::Gives) return creation == Creation::GivesNull;
+            probe->query = mode;
             return probe->QueryInterface(type, out) >= 0;
         }
     } maker;
-    Probe probe, outer;
+    Probe probe;
     maker.probe = &probe;
-    EXPECT_EQ(maker.AddRef(), 2u);
-    EXPECT_EQ(maker.AddRef(), 2u);
-    EXPECT_EQ(maker.Release(), 0u);
+    EXPECT_TRUE(maker.AddRef() == 2 && maker.AddRef() == 2 && maker.Release() == 0);
 
-    IACFUnknown* out = nullptr;
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.QueryInterface(kProbe, nullptr)), 0x80000003u);
-    for (const _acfUID& type : {acfTypeOf<IACFUnknown>::uid, acfTypeOf<IACFClassFactory>::uid}) {
-        EXPECT_EQ(maker.QueryInterface(type, &out), 0);
-        EXPECT_EQ(out, &maker);
-    }
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.QueryInterface(kProbe, &out)), 0x80000004u);
-    EXPECT_EQ(out, nullptr);
+    const auto query = [&](const _acfUID& type, IACFUnknown** out) {
+        return static_cast<std::uint32_t>(maker.QueryInterface(type, out));
+    };
+    IACFUnknown* out = &probe;
+    EXPECT_EQ(query(kProbe, nullptr), 0x80000003u);
+    EXPECT_TRUE(query(kProbe, &out) == 0x80000004u && !out);
+    EXPECT_TRUE(query(kUnknown, &out) == 0 && out == &maker);
+    EXPECT_TRUE(query(acfTypeOf<IACFClassFactory>::uid, &out) == 0 && out == &maker);
 
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.CreateInstance(nullptr, &outer, kProbe, nullptr)), 0x80000003u);
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.CreateInstance(nullptr, &outer, kProbe, &out)), 0x80040110u);
-    EXPECT_EQ(maker.CreateInstance(nullptr, nullptr, kProbe, &out), 0);
-    EXPECT_EQ(out, &probe);
-    out->Release();
-    for (const Creation creation : {Creation::Fails, Creation::Throws, Creation::GivesNull}) {
-        maker.creation = creation;
-        EXPECT_EQ(static_cast<std::uint32_t>(maker.CreateInstance(nullptr, nullptr, kProbe, &out)), 0x80040111u);
-        EXPECT_EQ(out, nullptr);
+    const auto create = [&](IACFUnknown* outer, IACFUnknown** to) {
+        return static_cast<std::uint32_t>(maker.CreateInstance(nullptr, outer, kProbe, to));
+    };
+    EXPECT_EQ(create(&probe, nullptr), 0x80000003u);
+    EXPECT_TRUE(create(&probe, &out) == 0x80040110u && !out);
+    EXPECT_TRUE(create(nullptr, &out) == 0 && out == &probe);
+    for (const Mode mode : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
+        maker.mode = mode;
+        EXPECT_TRUE(create(nullptr, &out) == 0x80040111u && !out);
     }
-    EXPECT_EQ(probe.references, 1);
-    EXPECT_EQ(outer.references, 1);
+    EXPECT_EQ(probe.references, 2);
 }
