@@ -34,8 +34,12 @@ bool CPIACFUnknown::Factory_Set(IACFComponentFactory* factory) noexcept {
     const std::lock_guard guard(g_factory.lock);
     if (!g_factory.factory) {
         if (g_factory.locks != 0) diagnostics::RuntimeAssumptionFailed("g_uFactoryLock == 0");
-        if (!AddRefQuietly(factory)) return false;
-        g_factory.factory = factory;
+        g_factory.factory = factory; // first: its AddRef may come back here
+        if (!AddRefQuietly(factory)) {
+            g_factory.factory = nullptr;
+            g_factory.locks = 0;
+            return false;
+        }
     } else if (g_factory.factory != factory) {
         return false;
     }
