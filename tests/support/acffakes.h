@@ -60,17 +60,16 @@ struct Probe final : Fake<IProbe> {
 struct FakeFactory : Fake<IACFComponentFactory> {
     Probe made;
     Mode creation = Mode::Gives;
-    int components = 0, instances = 0;
+    int components = 0; // asked for, shared ones
     cacfuid askedClass, askedType;
 
     acfResult ACF_CALL CreateComponent(const _acfUID& cls, IACFUnknown* outer, const _acfUID& type,
                                        IACFUnknown** out) override {
-        ++components, --instances;
+        ++components;
         return CreateInstance(cls, outer, type, out);
     }
     acfResult ACF_CALL CreateInstance(const _acfUID& cls, IACFUnknown* outer, const _acfUID& type,
                                       IACFUnknown** out) override {
-        ++instances;
         askedClass = cls;
         askedType = type;
         return made.Give(outer ? Mode::Refuses : creation, out);
