@@ -1,6 +1,6 @@
 #!/bin/sh
 # Builds the tool and takes documents along the whole road: read, look, change, write, read back, measure. Then an edit
-# list of the sample, and timecode.
+# list of the sample, timecode, and a host with plug-ins.
 set -eu
 LC_ALL=C
 export LC_ALL
@@ -60,7 +60,7 @@ build() {
   quietly "$here/tools/setup" $setup
   cd "$here"
   [ -e "build/$preset/build.ninja" ] || quietly cmake --preset "$preset"
-  quietly cmake --build --preset "$preset" --target tavo --target example_edit_list
+  quietly cmake --build --preset "$preset" --target tavo --target example_edit_list --target example_host
   cd "$from"
   say "build/$preset/bin/tavo$exe, linked with the shared library beside it"
   tavo about | indent
@@ -161,10 +161,18 @@ timecode() {
   tavo tc convert 01.00:00.00 --to PAL --retime | indent
 }
 
+components() {
+  title "A host that loads plug-ins, uses their components, and keeps one while an object of it lives"
+  LC_ALL=C.UTF-8 $run "$here/build/$preset/bin/example_host$exe" "$here/build/$preset/bin/plugins" \
+    "$here/examples/data/timeline.xml" > "$work/host.txt" || { cat "$work/host.txt" >&2; fail "the host found a fault"; }
+  tr -d '\r' < "$work/host.txt" | indent
+}
+
 from=$(pwd)
 build
 [ $# -gt 0 ] || set -- "$here/examples/data/timeline.xml"
 count=$#
 for document in "$@"; do road "$document"; done
 timecode
+components
 title "Done: $count $([ "$count" = 1 ] && echo document || echo documents), all as expected"

@@ -741,3 +741,29 @@ TEST(ToolProgress, StaysOutOfFiles) {
     EXPECT_EQ(run.errors, "");
     EXPECT_FALSE(Contains(run.output, "\x1b"));
 }
+
+TEST(ToolId, ParsesFormatsAndMakes) {
+    const std::string id = "15603CD4-AB81-4D6F-B05F-C6BEA760A789", lower = "15603cd4-ab81-4d6f-b05f-c6bea760a789";
+    for (const std::string& text : {id, lower, '{' + id + '}', std::string("15603CD4AB814D6FB05Fc6bea760a789")})
+        ExpectRun(RunTool({"id", "parse", text}), kFine, '"' + text + "\": " + id + '\n', "");
+    const std::pair<std::string, const char*> wrong[] = {
+        {"", "it ends where character 1, a hexadecimal digit, belongs; the library reads the null identifier"},
+        {id.substr(0, 35), "it ends where character 36, a hexadecimal digit, belongs; the library refuses it"},
+        {id + "\xC3\xA9", "character 37 is \"\xC3\xA9\", where the end belongs; the library reads 15603CD4-"},
+        {'{' + id, "it ends where character 38, \"}\", belongs; the library refuses it"},
+        {"15603CD4-AB81-4D6FB05F-C6BEA760A789", "character 19 is \"B\", where \"-\" belongs; the library reads the"},
+    };
+    for (const auto& [text, reason] : wrong) {
+        const Finished run = RunTool({"id", "parse", text});
+        EXPECT_TRUE(run.code == kBadInput && Contains(run.output, ": invalid: " + std::string(reason))) << run.output;
+    }
+    ExpectRun(RunTool({"id", "format", "--json", lower}), kFine,
+              "[\n{\"identifier\":\"" + id + "\",\"lowerCase\":\"" + lower + "\",\"braces\":\"{" + id +
+                  "}\",\"digits\":\"15603CD4AB814D6FB05FC6BEA760A789\",\"initializer\":\"{0x15603CD4, 0xAB81, 0x4D6F, "
+                  "{0xB0, 0x5F, 0xC6, 0xBE, 0xA7, 0x60, 0xA7, 0x89}}\"}\n]\n",
+              "");
+    ExpectRun(RunTool({"id", "format", "x"}), kBadInput, "", "no identifier");
+    const Finished made = RunTool({"id", "new", "--count", "3"});
+    EXPECT_EQ(RunTool({"id", "parse", made.output.substr(74, 36)}).code, kFine);
+    EXPECT_EQ(RunTool({"id", "new", "--count", "0"}).code, kUsage);
+}

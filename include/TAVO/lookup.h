@@ -95,8 +95,8 @@ protected:
     Place Locate(unsigned long long hash, const Buffers::CPObjectMemory& probe) noexcept;
     /// The entry at a place that was found.
     HASHENTRY& At(const Place& place) noexcept;
-    /// Inserts at a place that was not found, taking over the reference. False without memory: item and table are then as
-    /// they were.
+    /// Inserts at a place that was not found, taking over the reference. False without memory: item and table are then
+    /// as they were.
     bool InsertAt(const Place& place, unsigned long long hash, Buffers::CPObjectMemory&& item) noexcept;
     /// Takes the entry at a place that was found out of the table, with its reference.
     Buffers::CPObjectMemory RemoveAt(const Place& place) noexcept;
@@ -113,6 +113,47 @@ private:
     unsigned long long m_buckets;
     unsigned long long m_cursor; // the bucket where the next DisposeTable goes on
     Buffers::CPOMVector m_index; // one handle per bucket; empty until the first insertion
+};
+
+/// The key of objects of type T.
+template <class T> class IHashKey {
+public:
+    virtual unsigned long long GetHash(const T& object) const = 0;
+    /// The order of two objects of equal hash by their keys; 0 when the keys are equal.
+    virtual long32 Compare(const T& first, const T& second) const = 0;
+
+protected:
+    ~IHashKey() = default;
+};
+
+/// A table of objects that know their key. T is a handle of a block: it has the type T::Object, a constructor from
+/// CPObjectMemory, and `static const Object& T::ObjectOf(const CPObjectMemory&)`. H is an IHashKey<T::Object>.
+template <class T, class H> class CPOMKeyTable : public CBaseHashTable {
+public:
+    /// 2^@p uDirectIndexLength buckets.
+    explicit CPOMKeyTable(std::uint32_t uDirectIndexLength = 10) noexcept : CBaseHashTable(uDirectIndexLength) {}
+
+    /// As AddItem: the item that now stands for the key, empty for a refused one or without memory.
+    T Add(const T& item, eHashCollision collision) noexcept { return T(AddItem(HashOf(item), item, collision)); }
+    /// The item whose key is that of @p probe; empty when there is none.
+    T Find(const T& probe) noexcept { return T(FindItem(HashOf(probe), probe)); }
+    /// Removes the item whose key is that of @p probe; false when there is none, true on a table that never held any.
+    bool Delete(const T& probe) noexcept { return DeleteItem(HashOf(probe), probe); }
+    /// Visits every item, in no order that means anything. False when stopped, without a visitor or for an empty table.
+    bool Enum(IBaseHashTableEnum* visitor) noexcept { return EnumTableBy(visitor, 0, false); }
+
+protected:
+    long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override {
+        return m_key.Compare(T::ObjectOf(first), T::ObjectOf(second));
+    }
+
+private:
+    // An empty handle has no key; the table refuses it whatever the hash.
+    unsigned long long HashOf(const T& item) const noexcept {
+        return item.key() ? m_key.GetHash(T::ObjectOf(item)) : 0;
+    }
+
+    H m_key;
 };
 
 } // namespace Lookup

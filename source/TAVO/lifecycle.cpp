@@ -2,6 +2,7 @@
 
 #include "lifecycle.h"
 
+#include "classregistry.h"
 #include "maintenance.h"
 #include "poolentry.h"
 #include "poolmaintenance.h"
@@ -57,6 +58,7 @@ struct ProcessWide {
     ~ProcessWide() {
         if (IsProcessEnding() || !Maintenance::Unload(kMostMillisecondsToEnd)) return;
         String::pool::DropMaintenance();
+        ACF::classes::Unload(); // its records hold pooled strings
         String::pool::Unload();
     }
 

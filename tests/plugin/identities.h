@@ -2,6 +2,7 @@
 // The addresses by which the library tells its types and special strings apart, taken in three ways by whichever module
 // includes this: by its static initialisers, by functions at run time, and from values that the library made.
 
+#include <TAVO/acf.h>
 #include <TAVO/buffers.h>
 #include <TAVO/lookup.h>
 #include <TAVO/string.h>
@@ -25,6 +26,7 @@ enum Identity {
     Event,
     MultipleEvent,
     Thread,
+    WrapperOfEnumerations,
     TextOfTrue,
     TextOfFalse,
     TextOfEmpty,
@@ -46,6 +48,7 @@ constexpr const char* kNames[] = {
     "CPEvent",
     "CPMultipleEvent",
     "CPThread",
+    "CPACI<IACFEnumDefinitions>",
     "ptrue",
     "pfalse",
     "pempty",
@@ -73,10 +76,17 @@ template <class Number> const void* Address(Number id) {
     return reinterpret_cast<const void*>(static_cast<std::size_t>(id));
 }
 
+// The virtual table, which is the class where modules meet.
+inline const void* VirtualTable(const TAVO::ACF::CPIACFUnknown& wrapper) {
+    return *reinterpret_cast<const void* const*>(&wrapper);
+}
+using EnumWrapper = TAVO::ACF::CPACI<IACFEnumDefinitions>;
+
 // Everything below belongs to one module alone, even where the loader could merge it with another's.
 namespace {
 
 const CPPoolString g_interned(L"interned by every module");
+const EnumWrapper g_wrapper;
 
 const Table g_atLoad = {{
     &CPPlainMemory::_vtbl,
@@ -91,6 +101,7 @@ const Table g_atLoad = {{
     &TAVO::Threading::CPEvent::_vtbl,
     &TAVO::Threading::CPMultipleEvent::_vtbl,
     &TAVO::Threading::CPThread::_vtbl,
+    VirtualTable(g_wrapper),
     Text(CPPoolString::ptrue),
     Text(CPPoolString::pfalse),
     Text(CPPoolString::pempty),
@@ -115,6 +126,7 @@ Table ByFunctions() {
         Address(Threading::CPEvent::GetTypeID()),
         Address(Threading::CPMultipleEvent::GetTypeID()),
         Address(Threading::CPThread::GetTypeID()),
+        VirtualTable(EnumWrapper()),
         Text(CPPoolString(true)),
         Text(CPPoolString(false)),
         Text(CPPoolString(L"")),
@@ -159,6 +171,7 @@ Table OfValues() {
         TypeOf(Threading::CPEvent(true)),
         TypeOf(Threading::CPMultipleEvent()),
         TypeOf(RunningThread()),
+        VirtualTable(EnumWrapper(g_wrapper)),
         Text(String::CStringPool::GetStringRefi(L"TRUE")),
         Text(String::CStringPool::GetStringRefi(L"False")),
         Text(String::CStringPool::GetStringRefn(L"text", 0)),

@@ -4,6 +4,7 @@
 #include "platform/heap.h"
 
 #include <atomic>
+#include <TAVO/acf.h>
 #include <TAVO/string.h>
 
 namespace {
@@ -60,6 +61,7 @@ int main(int argc, char** argv) {
     testing::InitGoogleTest(&argc, argv);
     TAVO::Platform::SetHeapObserver(&kObserver);
     TAVO::String::CPPoolString(L"Capital"); // builds the pool's tables, the one for capital letters too; they stay
+    TAVO::ACF::CPIACFUnknown::Factory_UnregisterClass({}); // the same for the lock of the class registry
     SweepPool();
     testing::UnitTest::GetInstance()->listeners().Append(new LeakListener);
     return RUN_ALL_TESTS();

@@ -102,6 +102,19 @@ struct RationalApproxOptions {
 };
 int RationalApprox(const RationalApproxOptions& options);
 
+struct IdNewOptions {
+    unsigned count = 1;
+    bool json = false;
+};
+int IdNew(const IdNewOptions& options);
+
+struct IdTextOptions {
+    std::vector<std::string> texts;
+    bool json = false;
+};
+int IdParse(const IdTextOptions& options);
+int IdFormat(const IdTextOptions& options);
+
 int About();
 
 } // namespace tool

@@ -157,8 +157,29 @@ void AddRationalCommands(CLI::App& rational, Action& action) {
     AddJson(*command, approx.json);
 }
 
+constexpr const char* kIdHelp = "15603CD4-AB81-4D6F-B05F-C6BEA760A789 in any case, in braces, or its digits alone";
+
+void AddIdCommands(CLI::App& id, Action& action) {
+    id.require_subcommand(1);
+
+    auto* command = id.add_subcommand("new", "Makes new identifiers from the system's random numbers");
+    auto& made = Add<IdNewOptions>(*command, action, IdNew);
+    command->add_option("--count", made.count, "how many")->check(CLI::Range(1, 1000000))->capture_default_str();
+    AddJson(*command, made.json);
+
+    const auto addTexts = [&](const char* name, const char* does, int (*run)(const IdTextOptions&)) {
+        auto* reads = id.add_subcommand(name, does);
+        auto& options = Add<IdTextOptions>(*reads, action, run);
+        reads->add_option("TEXT", options.texts, kIdHelp)->required()->type_name("");
+        AddJson(*reads, options.json);
+    };
+    addTexts("parse", "Tells the identifier in each text, or which character is wrong", IdParse);
+    addTexts("format", "Shows the ways to write an identifier", IdFormat);
+}
+
 int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML, and computes timecode, with the library TAVO.\n"
+    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, and makes\n"
+                 "identifiers, with the library TAVO.\n"
                  "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
                  "tavo");
     app.allow_windows_style_options(false); // a name may begin with '/'
@@ -173,6 +194,7 @@ int Run(std::vector<std::string> arguments) {
     command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
+    AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
 
     std::reverse(arguments.begin(), arguments.end()); // the order that the parser wants

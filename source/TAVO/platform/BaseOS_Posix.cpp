@@ -13,6 +13,7 @@
 #include <link.h>
 #include <pthread.h>
 #include <sched.h>
+#include <sys/random.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
 #include <time.h>
@@ -372,6 +373,20 @@ bool ReadCounter(std::int64_t& ticks) noexcept {
     timespec now;
     if (clock_gettime(CLOCK_MONOTONIC, &now) != 0) return false;
     ticks = std::int64_t{now.tv_sec} * 1000000000 + now.tv_nsec;
+    return true;
+}
+
+// --- chance --------------------------------------------------------------------------------------------------------
+
+bool FillRandom(void* target, std::size_t size) noexcept {
+    auto* at = static_cast<unsigned char*>(target);
+    while (size) {
+        const ssize_t got = getrandom(at, size, 0);
+        if (got < 0 && errno == EINTR) continue;
+        if (got <= 0) return false;
+        at += got;
+        size -= static_cast<std::size_t>(got);
+    }
     return true;
 }
 

@@ -1,8 +1,11 @@
 // Windows: process facts, configuration, diagnostics, clocks, code page and threads.
 
+#define _CRT_RAND_S // for rand_s
+
 #include "platform.h"
 
 #include <atomic>
+#include <cstdlib>
 #include <cstring>
 #include <windows.h>
 
@@ -131,6 +134,20 @@ bool ReadCounter(std::int64_t& ticks) noexcept {
     LARGE_INTEGER counter;
     if (!QueryPerformanceCounter(&counter)) return false;
     ticks = counter.QuadPart;
+    return true;
+}
+
+// --- chance --------------------------------------------------------------------------------------------------------
+
+bool FillRandom(void* target, std::size_t size) noexcept {
+    for (auto* at = static_cast<unsigned char*>(target); size;) {
+        unsigned word; // rand_s asks the system's generator, not the C library's
+        if (rand_s(&word) != 0) return false;
+        const std::size_t some = size < sizeof word ? size : sizeof word;
+        std::memcpy(at, &word, some);
+        at += some;
+        size -= some;
+    }
     return true;
 }
 

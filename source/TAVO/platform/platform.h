@@ -61,6 +61,11 @@ std::uint64_t GetProcessMilliseconds() noexcept;
 bool GetCounterFrequency(std::int64_t& ticksPerSecond) noexcept;
 bool ReadCounter(std::int64_t& ticks) noexcept;
 
+// --- chance --------------------------------------------------------------------------------------------------------
+
+// Fills the bytes from the system's generator of unpredictable numbers; false when it gives none.
+bool FillRandom(void* target, std::size_t size) noexcept;
+
 // --- code page -----------------------------------------------------------------------------------------------------
 
 // The call protocol of MultiByteToWideChar and WideCharToMultiByte with the ANSI code page: length -1 (any negative

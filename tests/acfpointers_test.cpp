@@ -1,0 +1,279 @@
+// Wrappers of interface pointers, and the bases of components, over fakes that count.
+
+#include "support/acffakes.h"
+#include "support/assertions.h"
+#include "support/heapwatch.h"
+
+#include <gtest/gtest.h>
+
+using namespace TAVO::ACF;
+using support::Assertions;
+using support::Mode;
+using support::Probe;
+using support::Texts;
+
+namespace {
+
+const cacfuid kProbe = acfTypeOf<IProbe>::uid, kUnknown = acfTypeOf<IACFUnknown>::uid;
+const cacfuid kClass("24508B8F-A78E-4243-9E68-71AA029C838A");
+
+std::size_t Word(CPIACFUnknown& wrapper) { return reinterpret_cast<std::size_t>(*wrapper.rec()); }
+
+// A pointer as a creation call leaves it, with a reference.
+void PutRaw(CPIACFUnknown& wrapper, IACFUnknown& object) {
+    *wrapper.rec() = &object;
+    object.AddRef();
+}
+
+// The three kinds of wrapper; each test of their common life runs for all.
+struct Chosen : IPACF {
+    Chosen(IACFUnknown* pointer = nullptr) : IPACF(kProbe, pointer) {}
+    using IPACF::operator=;
+};
+using Typed = CPACI<IProbe>;
+template <class Wrapper> struct WrapperOfAnyKind : testing::Test {
+    const cacfuid type = Wrapper().GetType();
+    Probe probe;
+    ~WrapperOfAnyKind() override { EXPECT_EQ(probe.references, 1); }
+};
+using Kinds = testing::Types<CPIACFUnknown, Chosen, Typed>;
+TYPED_TEST_SUITE(WrapperOfAnyKind, Kinds);
+
+} // namespace
+
+TYPED_TEST(WrapperOfAnyKind, OwnsOneReferenceOfItsType) {
+    Probe& probe = this->probe;
+    TypeParam empty, held(&probe);
+    EXPECT_TRUE(!empty && Word(empty) == 1);
+    EXPECT_EQ(probe.asked, this->type);
+    EXPECT_EQ(Word(held), reinterpret_cast<std::size_t>(&probe) | 1);
+    EXPECT_EQ(held.GetLockCount(), 2u);
+    TypeParam copy(held);
+    EXPECT_TRUE(copy == held && copy != empty);
+    EXPECT_EQ(probe.references, 3);
+    EXPECT_EQ(probe.queries, 2) << "a copy queries";
+    EXPECT_EQ(probe.asked, this->type);
+    TypeParam moved(std::move(copy));
+    EXPECT_TRUE(moved && !copy);
+    EXPECT_EQ(probe.references, 3);
+    EXPECT_EQ(probe.queries, 2) << "a move does not";
+    copy = moved;
+    moved = *&moved;
+    moved = static_cast<TypeParam&&>(*&moved);
+    EXPECT_EQ(probe.references, 4);
+    copy = std::move(moved);
+    copy = &probe;
+    EXPECT_EQ(probe.references, 3);
+    copy = empty;
+    EXPECT_FALSE(copy);
+    held.free();
+    EXPECT_EQ(Word(held), 1u);
+    EXPECT_EQ(held.GetLockCount(), 0u);
+}
+
+TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFails) {
+    Probe& probe = this->probe;
+    for (const Mode query : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
+        const TypeParam good(&probe);
+        TypeParam assigned(&probe), raw;
+        PutRaw(raw, probe);
+        probe.query = query;
+        assigned = good;
+        EXPECT_FALSE(TypeParam(&probe) || TypeParam(good) || assigned || raw);
+        EXPECT_EQ(Word(raw), 1u) << "released, once";
+        probe.query = Mode::Gives;
+    }
+}
+
+TYPED_TEST(WrapperOfAnyKind, IntendedResolvingKeepsWhatWasStored) {
+    Probe& probe = this->probe;
+    Probe other;
+    probe.given = &other;
+    TypeParam raw;
+    PutRaw(raw, probe);
+    EXPECT_TRUE(raw);
+    EXPECT_EQ(Word(raw), reinterpret_cast<std::size_t>(&probe) | 1);
+    EXPECT_EQ(probe.references, 1);
+    EXPECT_EQ(other.references, 2);
+    probe.AddRef(); // the wrapper will release what it stored, not what it queried
+}
+
+TYPED_TEST(WrapperOfAnyKind, EndsWellWhenReleaseComesBackOrThrows) {
+    Probe& probe = this->probe;
+    const Assertions kept;
+    TypeParam held(&probe);
+    probe.onRelease = [&] { held.free(); };
+    held.free();
+    EXPECT_EQ(probe.references, 1);
+    probe.releaseThrows = true;
+    held = &probe;
+    held.free();
+    EXPECT_EQ(Assertions::Take(), Texts{"CPIACFUnknown::free exception"});
+    held = &probe;
+    held = TypeParam();
+    EXPECT_TRUE(!held && Assertions::Take().empty());
+}
+
+TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactories) {
+    support::FakeFactory factory;
+    const struct {
+        Mode creation, query;
+        bool created, typed;
+    } rows[] = {
+        {Mode::Gives, Mode::Gives, true, true},    {Mode::Refuses, Mode::Gives, false, false},
+        {Mode::Throws, Mode::Gives, false, false}, {Mode::GivesNull, Mode::Gives, false, false},
+        {Mode::Gives, Mode::Refuses, true, false}, // a plain wrapper finds out at its first use
+    };
+    for (const auto& row : rows) {
+        TypeParam wrapper(&this->probe);
+        factory.creation = row.creation;
+        factory.made.query = row.query;
+        const bool answer = this->type == kUnknown ? row.created : row.typed;
+        EXPECT_TRUE(wrapper.createComponent(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
+        EXPECT_TRUE(wrapper.createInstance(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
+        EXPECT_TRUE(factory.askedClass == kClass && factory.askedType == kUnknown);
+        EXPECT_EQ(factory.made.references, row.typed ? 2 : 1);
+    }
+    EXPECT_EQ(factory.components, 5) << "half of them";
+
+    factory.creation = factory.made.query = Mode::Gives;
+    TypeParam wrapper(&this->probe);
+    EXPECT_FALSE(wrapper.createComponent(kClass) || wrapper) << "no factory of the process";
+    ASSERT_TRUE(CPIACFUnknown::Factory_Set(&factory));
+    EXPECT_TRUE(wrapper.createComponent(kClass) && wrapper && wrapper.createInstance(kClass) && wrapper);
+    CPIACFUnknown::Factory_Release();
+    EXPECT_EQ(factory.references, 1);
+}
+
+TYPED_TEST(WrapperOfAnyKind, IntendedCreationFromNoFactoryIsTrueAndEmpty) {
+    TypeParam wrapper(&this->probe);
+    EXPECT_TRUE(wrapper.createComponent(kClass, nullptr) && !wrapper);
+    EXPECT_TRUE(wrapper.createInstance(kClass, nullptr) && !wrapper);
+}
+
+TEST(Wrapper, TakesPointersOfOtherKinds) {
+    Probe probe;
+    {
+        Typed typed(&probe);
+        CPIACFUnknown plain(typed);
+        EXPECT_EQ(probe.asked, kUnknown);
+        probe.asked.reset();
+        plain = std::move(typed); // another type: queried, and the source lets go
+        EXPECT_TRUE(probe.asked == kUnknown && !typed && probe.references == 2);
+        typed = plain;
+        EXPECT_TRUE(probe.asked == kProbe && typed->Answer() == 42);
+        IPACF chosen(acfTypeOf<IACFClassFactory>::uid, &probe);
+        EXPECT_FALSE(chosen);
+        chosen = IPACF(kProbe, &probe); // with its type
+        EXPECT_TRUE(kProbe == chosen.GetType() && chosen == typed);
+    }
+    EXPECT_EQ(probe.references, 1);
+}
+
+TEST(Wrapper, ComparesAndCountsWithoutResolving) {
+    Probe probe;
+    {
+        CPIACFUnknown raw, checked(&probe), zero;
+        PutRaw(raw, probe);
+        *zero.rec() = nullptr;
+        EXPECT_TRUE(raw == checked && zero == CPIACFUnknown());
+        EXPECT_EQ(raw.GetLockCount(), 3u);
+        IACFUnknown* out = nullptr;
+        EXPECT_TRUE(raw.QueryRawInterface(&out) && out == &probe && probe.queries == 1);
+        out->Release();
+        EXPECT_FALSE(raw.QueryRawInterface(nullptr) || zero.QueryRawInterface(&out) || out || zero);
+        probe.addRefThrows = true;
+        EXPECT_FALSE(checked.QueryRawInterface(&out) || out || checked.GetLockCount());
+        probe.addRefThrows = false;
+    }
+    EXPECT_EQ(probe.references, 1);
+}
+
+// --- components ------------------------------------------------------------------------------------------------------
+
+namespace {
+
+struct Twofold final : CComponent<Twofold, IProbe, IACFClassFactory> {
+    explicit Twofold(int* ends, bool counted = true) : CComponent(counted), m_ends(ends) {
+        if (!ends) throw "no";
+    }
+    ~Twofold() {
+        AddRef(), Release(); // as code does that a destructor calls
+        ++*m_ends;
+    }
+    int ACF_CALL Answer() override { return 7; }
+    acfResult ACF_CALL CreateInstance(IACFUnknown*, IACFUnknown*, const _acfUID&, IACFUnknown**) override { return 8; }
+
+private:
+    int* m_ends;
+};
+
+} // namespace
+
+TEST(Component, IsOneObjectBehindAllItsInterfaces) {
+    int ends = 0;
+    {
+        const CPIACFUnknown made = Twofold::Make(&ends);
+        ASSERT_TRUE(made);
+        EXPECT_EQ(made.GetLockCount(), 1u);
+        const CPACI<IProbe> probe(made);
+        const CPACI<IACFClassFactory> factory(made);
+        const CPACI<IACFComponent> component(factory);
+        ASSERT_TRUE(probe && factory && component);
+        EXPECT_EQ(probe->Answer() + factory->CreateInstance(nullptr, nullptr, kClass, nullptr), 15);
+        EXPECT_TRUE(CPIACFUnknown(probe) == made && CPIACFUnknown(factory) == made) << "one identity";
+        EXPECT_EQ(made.GetLockCount(), 4u);
+        EXPECT_FALSE(CPACI<IACFDefinition>(made));
+        EXPECT_EQ(factory->QueryInterface(kProbe, nullptr), acfInvalidArgument);
+    }
+    EXPECT_EQ(ends, 1);
+    EXPECT_FALSE(Twofold::Make(nullptr));
+    support::ForEachFailingAllocation([] {
+        int once = 0;
+        const bool there = static_cast<bool>(Twofold::Make(&once));
+        EXPECT_EQ(once, there);
+    });
+}
+
+TEST(Component, IntendedStaticOnesAreNotCounted) {
+    int ends = 0;
+    Twofold fixed(&ends, false);
+    EXPECT_TRUE(fixed.AddRef() == 0 && fixed.Release() == 0 && ends == 0);
+    const CPACI<IProbe> held(static_cast<IProbe*>(&fixed));
+    EXPECT_TRUE(held && held->Answer() == 7);
+}
+
+TEST(ClassFactory, IntendedCountsAndResults) {
+    struct Maker final : _csFactory {
+        Mode mode = Mode::Gives;
+        Probe* probe = nullptr;
+        bool Create(const _acfUID& type, IACFUnknown** out) override {
+            probe->query = mode;
+            return probe->QueryInterface(type, out) >= 0;
+        }
+    } maker;
+    Probe probe;
+    maker.probe = &probe;
+    EXPECT_TRUE(maker.AddRef() == 2 && maker.AddRef() == 2 && maker.Release() == 0);
+
+    const auto query = [&](const _acfUID& type, IACFUnknown** out) {
+        return static_cast<std::uint32_t>(maker.QueryInterface(type, out));
+    };
+    IACFUnknown* out = &probe;
+    EXPECT_EQ(query(kProbe, nullptr), 0x80000003u);
+    EXPECT_TRUE(query(kProbe, &out) == 0x80000004u && !out);
+    EXPECT_TRUE(query(kUnknown, &out) == 0 && out == &maker);
+    EXPECT_TRUE(query(acfTypeOf<IACFClassFactory>::uid, &out) == 0 && out == &maker);
+
+    const auto create = [&](IACFUnknown* outer, IACFUnknown** to) {
+        return static_cast<std::uint32_t>(maker.CreateInstance(nullptr, outer, kProbe, to));
+    };
+    EXPECT_EQ(create(&probe, nullptr), 0x80000003u);
+    EXPECT_TRUE(create(&probe, &out) == 0x80040110u && !out);
+    EXPECT_TRUE(create(nullptr, &out) == 0 && out == &probe);
+    for (const Mode mode : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
+        maker.mode = mode;
+        EXPECT_TRUE(create(nullptr, &out) == 0x80040111u && !out);
+    }
+    EXPECT_EQ(probe.references, 2);
+}
