@@ -252,7 +252,7 @@ int main(int argc, char** argv) {
         Expect(CPIACFUnknown::Factory_Set(factory.Get()), "the factory can be set");
 
         Plugins plugins = LoadFolder(CACFWChar(argv[1]), factory.Get());
-        Expect(plugins.size() == 2, "both plug-ins were loaded");
+        Expect(plugins.size() == 3, "all plug-ins were loaded");
         UseTools(root);
 
         // A plug-in with an object in use stays.
