@@ -14,26 +14,24 @@ namespace {
 constexpr ulong32 InverseOf(ulong32 divisor) { return (1u << 20) / divisor + 1; }
 constexpr ulong32 Over(ulong32 dividend, ulong32 inverse) { return dividend * inverse >> 20; }
 
-// What composing and breaking down need of a system, computed once.
-struct Layout {
-    unsigned long long day;
-    ulong32 dropped, frame, straddle;
-    ulong32 overFrame, overBlock; // inverses
-    bool isPlain;                 // neither skips labels nor has frames that straddle seconds
-};
-constexpr auto kLayouts = [] {
-    std::array<Layout, kSystemCount> layouts{};
-    for (ulong32 code = 0; code < kSystemCount; ++code) {
-        const System& s = kSystems[code];
-        layouts[code] = {s.Day(),
-                         s.Dropped(),
-                         s.frame,
-                         s.Straddle(),
-                         InverseOf(s.frame),
-                         InverseOf(s.drop.block),
-                         !s.IsDrop() && s.Straddle() == 0};
-    }
-    return layouts;
+// The header's facts are those of the table.
+constexpr bool IsComposedRight(ulong32 code) {
+    const System& s = kSystems[code];
+    const tagCOMPOSE& c = kCompose[code];
+    if (c.day != s.Day() || c.frame != s.frame || c.straddle != s.Straddle()) return false;
+    if (!s.IsDrop()) return c.block == 0;
+    return c.block == InverseOf(s.drop.block) && c.frame << c.skipped == s.Dropped();
+}
+static_assert([] {
+    for (ulong32 code = 0; code < kSystemCount; ++code)
+        if (!IsComposedRight(code)) return false;
+    return std::size(kCompose) == kSystemCount;
+}());
+
+constexpr auto kOverFrame = [] {
+    std::array<ulong32, kSystemCount> inverses{};
+    for (ulong32 code = 0; code < kSystemCount; ++code) inverses[code] = InverseOf(kSystems[code].frame);
+    return inverses;
 }();
 
 struct Fields {
@@ -56,33 +54,24 @@ template <DropRule rule, bool isHalved> inline Fields SplitDrop(unsigned long lo
     const unsigned long long days = magnitude / s.Day();
     const auto r = static_cast<ulong32>(magnitude - days * s.Day());
     const ulong32 fine = isHalved ? r % rule.unit : 0;
-    const ulong32 hh = (r - fine) / s.Hour();
-    const ulong32 inHour = r - fine - hh * s.Hour();
-    ulong32 mm = inHour / (s.Minute() + s.Dropped() / rule.block); // by the average minute of a block
-    const ulong32 inMinute = inHour - mm / rule.block * s.Dropped() - mm * s.Minute();
+    // Blocks divide hours, so that hours are whole numbers of average minutes, and need not be known for the rest.
+    ulong32 minutes = (r - fine) / (s.Minute() + s.Dropped() / rule.block);
+    const ulong32 inMinute = r - fine - minutes / rule.block * s.Dropped() - minutes * s.Minute();
     ulong32 ss = inMinute / kSecond;
     ulong32 ff = inMinute % kSecond / rule.unit;
-    if (ff < 2 && ss == 0 && mm % rule.block != 0) { // a skipped label: the estimate came a minute too far
+    if (ff < 2 && ss == 0 && minutes % rule.block != 0) { // a skipped label: the estimate came a minute too far
         // Intended: always the minute's last frame, so that a position between frame starts may show its neighbour.
-        --mm;
+        --minutes;
         ss = 59;
         ff = kSecond / rule.unit - 1;
     }
-    return {isHalved ? 2 * ff + (fine != 0) : ff, ss, mm, hh, days};
+    const ulong32 hh = minutes / 60;
+    return {isHalved ? 2 * ff + (fine != 0) : ff, ss, minutes - hh * 60, hh, days};
 }
 
 constexpr unsigned long long Magnitude(long long count) noexcept {
     const auto bits = static_cast<unsigned long long>(count);
     return count < 0 ? 0 - bits : bits;
-}
-
-inline unsigned long long Join(const Layout& l, const Fields& f) noexcept {
-    constexpr ulong32 day = 24 * 3600 * kSecond;
-    const ulong32 minutes = f.hh * 60 + f.mm;
-    const ulong32 inDay = (minutes * 60 + f.ss) * kSecond + f.ff * l.frame;
-    if (l.isPlain) return f.days * day + inDay;
-    if (l.dropped != 0) return f.days * l.day + inDay - (minutes - Over(minutes, l.overBlock)) * l.dropped;
-    return f.days * day + inDay + (f.ss & 1) * l.straddle;
 }
 
 // A label that a drop-frame system skips.
@@ -105,17 +94,20 @@ template <class Fields> inline void TCINFO::Set(const Fields& f, bool negative) 
     m_dd = SignedDays(f.days, negative);
 }
 
-TCINFO::TCINFO(long long count, ulong32 sys) noexcept : m_sys(Normalize(sys)) {
-    if (TAVO_UNLIKELY(m_sys & (kInvalid | kUnassigned))) {
-        m_ff = m_ss = m_mm = m_hh = 0;
-        m_dd = 0;
-        return;
+TCINFO::TCINFO(long long count, ulong32 sys) noexcept : m_sys(sys) {
+    if (TAVO_UNLIKELY(sys >= kSystemCount)) {
+        m_sys = Normalize(sys);
+        if (m_sys & (kInvalid | kUnassigned)) {
+            m_ff = m_ss = m_mm = m_hh = 0;
+            m_dd = 0;
+            return;
+        }
     }
-    if (kSystems[CodeOf(m_sys)].IsDrop()) {
+    const ulong32 code = CodeOf(sys);
+    if (kCompose[code].block == 0)
+        Set(SplitPlain(Magnitude(count), kOverFrame[code]), count < 0);
+    else
         BreakDownDropFrame(count);
-        return;
-    }
-    Set(SplitPlain(Magnitude(count), kLayouts[CodeOf(m_sys)].overFrame), count < 0);
 }
 
 // By itself, so that the plain systems need not save its registers.
@@ -154,14 +146,6 @@ TCINFO::TCINFO(long32 hh, ulong32 mm, ulong32 ss, ulong32 ff, ulong32 sys) noexc
 TCINFO& TCINFO::Clip() noexcept {
     m_dd = m_dd < 0 ? -1 : 0;
     return *this;
-}
-
-TCINFO::operator long long() const noexcept {
-    if (IsFlagged(m_sys)) return 0;
-    const bool negative = m_dd < 0;
-    const auto days = static_cast<unsigned long long>(negative ? -1 - m_dd : m_dd);
-    const unsigned long long magnitude = Join(kLayouts[m_sys], {m_ff, m_ss, m_mm, m_hh, days});
-    return static_cast<long long>(negative ? 0 - magnitude : magnitude);
 }
 
 // Intended: the division is unsigned, so that a negative position gives the low half of a huge quotient where a
