@@ -381,7 +381,7 @@ TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
 TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
     std::atomic<bool> stop{false};
     std::thread sweeper([&] {
-        // With pauses: the lock makes no promise of turns, and a loop without any could keep the others out for long.
+        // With pauses: beside a loop without any, the others get their turns some milliseconds apart.
         for (; !stop; std::this_thread::sleep_for(std::chrono::milliseconds(1)))
             CStringPool::Collect(1), CStringPool::GetSize();
     });
