@@ -46,6 +46,13 @@ public:
         m_state = Simd::Xor(Moved<256>(m_state), Simd::Xor(Moved<128>(first), second));
     }
 
+    // Appends four times sixteen bytes.
+    TAVO_MULTIPLIES void Add(Simd::Block first, Simd::Block second, Simd::Block third, Simd::Block fourth) {
+        const Simd::Block later =
+            Simd::Xor(Simd::Xor(Moved<384>(first), Moved<256>(second)), Simd::Xor(Moved<128>(third), fourth));
+        m_state = Simd::Xor(Moved<512>(m_state), later);
+    }
+
     TAVO_MULTIPLIES std::uint64_t Checksum() const {
         using namespace Simd;
         // Times x^64, which is the room for the checksum; then the remainder, by Barrett's method. The high words

@@ -160,7 +160,15 @@ TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key
         folder.AddLower(Shuffle(lowered(next, capitals), low));
         i += 8;
     }
-    for (; i < count; i += kBlock) {
+    for (; count - i >= 2 * kBlock; i += 2 * kBlock) {
+        const Block a = Load(text + i), b = Load(text + i + kBlock);
+        const Block capitalsA = letters(a), capitalsB = letters(b);
+        const Block lowerA = lowered(a, capitalsA), lowerB = lowered(b, capitalsB);
+        folder.Add(Mask(Or(capitalsA, capitalsB)) != 0, Shuffle(a, low), Shuffle(a, high), Shuffle(b, low),
+                   Shuffle(b, high));
+        folder.AddLower(Shuffle(lowerA, low), Shuffle(lowerA, high), Shuffle(lowerB, low), Shuffle(lowerB, high));
+    }
+    if (i < count) {
         const Block bytes = Load(text + i), capitals = letters(bytes);
         const Block lower = lowered(bytes, capitals);
         folder.Add(Mask(capitals) != 0, Shuffle(bytes, low), Shuffle(bytes, high));
