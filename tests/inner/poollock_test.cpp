@@ -46,6 +46,37 @@ TEST(PoolLock, ExcludesWhileFavouritesComeAndGo) {
     EXPECT_EQ(entries, expected);
 }
 
+// The instant in which a favour ends, on many locks: a favourite in full run, and another that cuts in.
+TEST(PoolLock, ExcludesWhenAFavourEnds) {
+    struct Shared {
+        Lock lock;
+        std::atomic<int> inside{0}, progress{0};
+        int overlaps = 0;
+        void Pass() {
+            lock.Enter();
+            overlaps += inside.load(std::memory_order_relaxed) != 0;
+            inside.store(1, std::memory_order_relaxed);
+            for (int i = 0; i < 4; ++i) overlaps += inside.load(std::memory_order_relaxed) != 1;
+            inside.store(0, std::memory_order_relaxed);
+            lock.Leave();
+        }
+    };
+    std::vector<Shared> shared(1000);
+    std::thread favourite([&] {
+        for (Shared& each : shared)
+            for (int i = 0; i < 5000; ++i) each.Pass(), each.progress.store(i, std::memory_order_relaxed);
+    });
+    int overlaps = 0;
+    for (Shared& each : shared) {
+        while (each.progress.load(std::memory_order_relaxed) < 4200) {
+        }
+        for (int i = 0; i < 10; ++i) each.Pass();
+    }
+    favourite.join();
+    for (const Shared& each : shared) overlaps += each.overlaps;
+    EXPECT_EQ(overlaps, 0);
+}
+
 // A favourite that stays in keeps others waiting, and TryEnter from waiting, as any holder does.
 TEST(PoolLock, WaitsForAFavouriteThatIsIn) {
     Lock lock;
