@@ -82,7 +82,7 @@ struct HostFactory : FakeFactory {
     } registry;
 
     acfResult ACF_CALL QueryInterface(const _acfUID& type, IACFUnknown** out) override {
-        if (!cacfuid::Same(type, acfTypeOf<IACFDefinitionRegistry>::uid)) return Fake::QueryInterface(type, out);
+        if (!acfIsSame(type, acfTypeOf<IACFDefinitionRegistry>::uid)) return Fake::QueryInterface(type, out);
         return registry.QueryInterface(type, out);
     }
 };

@@ -283,6 +283,32 @@ TEST(PoolSweep, InInstalmentsReachesEveryBucket) {
     EXPECT_LE(CStringPool::GetNItems(), items - 5000);
 }
 
+// Thousands of texts that are asked for again and again, half of which go: what the pool remembers of them must go too.
+TEST(PoolSweep, ForgetsWhatWasAskedForOften) {
+    constexpr int kTexts = 6000;
+    Sweep(2);
+    const auto items = CStringPool::GetNItems();
+    const auto without = support::LiveBlocks();
+    {
+        std::vector<CPPoolString> texts;
+        for (int i = 0; i < kTexts; ++i) texts.emplace_back(i + 8000000);
+        for (int round = 0; round < 2; ++round)
+            for (int i = 0; i < kTexts; ++i) ASSERT_EQ(CPPoolString(i + 8000000), texts[static_cast<std::size_t>(i)]);
+        for (std::size_t i = 0; i < kTexts; i += 2) texts[i].free();
+        Sweep(2);
+        EXPECT_EQ(CStringPool::GetNItems(), items + kTexts / 2);
+        for (int i = 0; i < kTexts; ++i) {
+            const CPPoolString again(i + 8000000);
+            ASSERT_EQ(std::to_string(i + 8000000),
+                      reinterpret_cast<const char*>(static_cast<const unsigned char*>(again)));
+            ASSERT_TRUE(i % 2 == 0 || again == texts[static_cast<std::size_t>(i)]) << i;
+        }
+        EXPECT_TRUE(CStringPool::Verify());
+    }
+    Sweep(2);
+    EXPECT_TRUE(CStringPool::GetNItems() == items && support::LiveBlocks() == without);
+}
+
 // --- submitters ------------------------------------------------------------------------------------------------------
 
 struct Submitter : IStringSubmitter {
@@ -381,7 +407,7 @@ TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
 TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
     std::atomic<bool> stop{false};
     std::thread sweeper([&] {
-        // With pauses: the lock makes no promise of turns, and a loop without any could keep the others out for long.
+        // With pauses: beside a loop without any, the others get their turns some milliseconds apart.
         for (; !stop; std::this_thread::sleep_for(std::chrono::milliseconds(1)))
             CStringPool::Collect(1), CStringPool::GetSize();
     });

@@ -47,22 +47,16 @@ public:
     operator String::CACFWChar() const;
     String::CANSIChar ANSI() const;
 
-    bool operator==(const cacfuid& other) const noexcept { return Same(m_uid, other.m_uid); }
+    bool operator==(const cacfuid& other) const noexcept { return acfIsSame(m_uid, other.m_uid); }
     bool operator!=(const cacfuid& other) const noexcept { return !(*this == other); }
     /// Whether any byte is not zero.
-    explicit operator bool() const noexcept { return !Same(m_uid, _acfUID{}); }
+    explicit operator bool() const noexcept { return !acfIsSame(m_uid, _acfUID{}); }
 
     /// Becomes the null identifier.
     void reset() noexcept { m_uid = {}; }
     _acfUID& rec() noexcept { return m_uid; }
     const _acfUID& rec() const noexcept { return m_uid; }
     operator const _acfUID&() const noexcept { return m_uid; }
-
-    /// Whether two identifiers are the same 16 bytes. Identifiers of interfaces are compared so, never by address: each
-    /// module may have its own copy of them.
-    static bool Same(const _acfUID& first, const _acfUID& second) noexcept {
-        return std::memcmp(&first, &second, sizeof(_acfUID)) == 0;
-    }
 
 private:
     _acfUID m_uid;
@@ -448,7 +442,7 @@ private:
     IACFUnknown* Find(const _acfUID& type) noexcept {
         IACFUnknown* found = nullptr;
         const bool answered[] = {
-            (!found && cacfuid::Same(type, acfTypeOf<Interfaces>::uid) && (found = static_cast<Interfaces*>(this)))...};
+            (!found && acfIsSame(type, acfTypeOf<Interfaces>::uid) && (found = static_cast<Interfaces*>(this)))...};
         static_cast<void>(answered);
         return found;
     }

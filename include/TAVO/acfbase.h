@@ -9,6 +9,7 @@
 // gets.
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 
 #if defined(_WIN32)
 #define ACF_CALL __stdcall // the one convention of x86-64; named for the reader
@@ -33,6 +34,11 @@ struct _acfUID {
     std::uint8_t Data4[8];
 };
 static_assert(sizeof(_acfUID) == 16 && alignof(_acfUID) == 4, "identifiers are exchanged as 16 raw bytes");
+
+// Whether two identifiers are the same 16 bytes; never compared by address, since modules may have copies of their own.
+inline bool acfIsSame(_acfUID const& first, _acfUID const& second) {
+    return std::memcmp(&first, &second, sizeof(_acfUID)) == 0;
+}
 
 // Result code: negative is failure.
 using acfResult = std::int32_t;

@@ -5,7 +5,6 @@
 // and goes on until nothing is due; then it sleeps at idle priority until the next one is. Every pass in which a
 // request was due and another one was chosen raises its priority by one, so that everyone's turn comes.
 
-#include <cstring>
 #include <new>
 #include <TAVO/buffers.h>
 
@@ -95,7 +94,7 @@ public:
 private:
     static void Finalize(void* payload, std::size_t) { static_cast<T*>(payload)->~T(); }
     static void* QueryInterface(void* payload, const _acfUID& type) {
-        const bool known = std::memcmp(&type, &acfTypeOf<IMaintenanceRequest>::uid, sizeof(type)) == 0;
+        const bool known = acfIsSame(type, acfTypeOf<IMaintenanceRequest>::uid);
         return known ? static_cast<IMaintenanceRequest*>(static_cast<T*>(payload)) : nullptr;
     }
 };

@@ -176,17 +176,6 @@ template <> struct acfTypeOf<TAVO::Threading::IThreadExecute> {
 namespace TAVO {
 namespace Threading {
 
-namespace detail {
-
-inline bool IsSame(const _acfUID& a, const _acfUID& b) noexcept {
-    if (a.Data1 != b.Data1 || a.Data2 != b.Data2 || a.Data3 != b.Data3) return false;
-    for (int i = 0; i < 8; ++i)
-        if (a.Data4[i] != b.Data4[i]) return false;
-    return true;
-}
-
-} // namespace detail
-
 /// Makes a class something that a thread can run. T must have a default constructor, an operation
 /// `void Run(unsigned long long parameter)` and its class identifier, `static constexpr _acfUID uid`.
 /// Each module has its own type of block for T: one that another module created is not recognised by From.
@@ -216,7 +205,7 @@ public:
     }
     unsigned int GetState() override { return m_state; }
     /// The T for its class identifier; null for any other.
-    void* QueryInterface(_acfUID const& type) override { return detail::IsSame(type, T::uid) ? &m_object : nullptr; }
+    void* QueryInterface(_acfUID const& type) override { return acfIsSame(type, T::uid) ? &m_object : nullptr; }
 
 private:
     // Lifts the protection of the block; adds nothing.
@@ -243,7 +232,7 @@ private:
     static void Finalize(void* payload, std::size_t) { static_cast<CThreadWrapper*>(payload)->~CThreadWrapper(); }
     static void* Query(void* payload, const _acfUID& type) {
         auto* wrapper = static_cast<CThreadWrapper*>(payload);
-        const bool execute = detail::IsSame(type, acfTypeOf<IThreadExecute>::uid);
+        const bool execute = acfIsSame(type, acfTypeOf<IThreadExecute>::uid);
         return execute ? static_cast<IThreadExecute*>(wrapper) : wrapper->QueryInterface(type);
     }
 

@@ -263,8 +263,8 @@ public:
     // unknown encoding and, but for the raw encoding, text with characters from U+100000 up or half a pair; also
     // without memory. A character above U+FFFF is written as 01 (or 00), but for the raw encoding: it is lost.
     //
-    // Not everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data blanks at
-    // its ends, runs of them and line breaks, unless one of & < > " ' makes it a CDATA section.
+    // Not everything reads back as it was: in attributes the five references (an '&' comes back as "<;"), in data
+    // blanks at its ends, runs of them and line breaks, unless one of & < > " ' makes it a CDATA section.
 
     /// Writes a file. One that exists is replaced at once: when writing fails, it is deleted.
     bool Write(const wchar_t* path, eXMLEncoding encoding, bool pretty) const noexcept;
@@ -318,9 +318,9 @@ public:
 
 private:
     bool Refuse() noexcept;
-    template <class Unit> bool ParseUnits(const Unit* text, std::size_t units) noexcept;
+    template <class Unit> bool ParseUnits(const Unit* text, std::size_t units, bool isAscii = false) noexcept;
     bool ParseUtf16(const void* data, std::size_t most, bool swap) noexcept;
-    bool ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t units) noexcept;
+    bool ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t wideUnits) noexcept;
 
     Buffers::CPPlainMemory m_errorText; // zero-terminated wide text
     unsigned long long m_errorOffset;

@@ -45,7 +45,7 @@ void CPIACFUnknown::_assign(IACFUnknown* pointer) noexcept {
 void CPIACFUnknown::Take(CPIACFUnknown& other) noexcept {
     if (this == &other) return;
     IACFUnknown* const held = other._getptr();
-    if (cacfuid::Same(GetType(), other.GetType())) {
+    if (acfIsSame(GetType(), other.GetType())) {
         other.m_pointer = Marked(nullptr);
         return _assign(held);
     }

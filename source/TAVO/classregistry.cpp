@@ -81,7 +81,7 @@ Probe ProbeFor(const _acfUID& cls) noexcept {
 }
 
 bool SameValues(const SClassRegister& a, const SClassRegister& b) noexcept {
-    return cacfuid::Same(a.category, b.category) && a.names == b.names && a.create == b.create;
+    return acfIsSame(a.category, b.category) && a.names == b.names && a.create == b.create;
 }
 
 bool HasName(const SClassRegister& record, const wchar_t* name, std::size_t units) noexcept {

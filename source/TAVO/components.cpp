@@ -21,7 +21,7 @@ std::uint32_t ACF_CALL _cACFUnknown::Release() { return _release(); }
 
 IACFUnknown* _cACFUnknown::_queryinterface(const _acfUID& type) {
     const bool answered =
-        cacfuid::Same(type, acfTypeOf<IACFUnknown>::uid) || cacfuid::Same(type, acfTypeOf<IACFComponent>::uid);
+        acfIsSame(type, acfTypeOf<IACFUnknown>::uid) || acfIsSame(type, acfTypeOf<IACFComponent>::uid);
     return answered ? this : nullptr;
 }
 
@@ -43,7 +43,7 @@ void _cACFUnknown::End() noexcept {
 acfResult ACF_CALL _csFactory::QueryInterface(const _acfUID& type, IACFUnknown** out) {
     if (!out) return acfInvalidArgument;
     const bool answered =
-        cacfuid::Same(type, acfTypeOf<IACFUnknown>::uid) || cacfuid::Same(type, acfTypeOf<IACFClassFactory>::uid);
+        acfIsSame(type, acfTypeOf<IACFUnknown>::uid) || acfIsSame(type, acfTypeOf<IACFClassFactory>::uid);
     *out = answered ? this : nullptr;
     return answered ? acfOk : acfNoInterface;
 }

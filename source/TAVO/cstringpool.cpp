@@ -80,7 +80,9 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
     if (!block) return nullptr;
     CPObjectMemory entry(Block::Adopt(block));
-    return text.Write(out) && pool.entries.Add(place, std::move(entry)) ? Block::Acquire(block) : nullptr;
+    if (!text.Write(out) || !pool.entries.Add(place, std::move(entry))) return nullptr;
+    block->lRefCnt = 2; // the table's and the caller's; nobody else knows the block before the lock is left
+    return block;
 }
 
 template <class Text> CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
@@ -168,7 +170,7 @@ void ClearTables(Pool& pool) noexcept {
     Develop::_logWrite(acfDebugTrace, L"TAVO", kSource, 0,
                        L"SPool ClearTable: diagnosis done, %u items still referenced", diagnosis.referenced);
     pool.groups.Clear(); // first: it holds entries without counting them
-    pool.entries.ClearTable();
+    pool.entries.Clear();
 }
 
 } // namespace

@@ -102,17 +102,21 @@ constexpr std::size_t kFewUnits = 8;
 class Folder {
 public:
     // One block or two, and the same in lower case; `capitals` tells whether the two differ.
-    template <class... Blocks>
-    TAVO_MULTIPLIES void Add(bool capitals, Blocks... blocks) {
+    template <class... Blocks> TAVO_MULTIPLIES void Add(bool capitals, Blocks... blocks) {
         if (capitals && !m_folded) {
             m_folded = true;
             m_lower = m_exact;
         }
         m_exact.Add(blocks...);
     }
-    template <class... Blocks>
-    TAVO_MULTIPLIES void AddLower(Blocks... blocks) {
+    template <class... Blocks> TAVO_MULTIPLIES void AddLower(Blocks... blocks) {
         if (m_folded) m_lower.Add(blocks...);
+    }
+    // The first block, and the same in lower case.
+    TAVO_MULTIPLIES void Start(bool capitals, Simd::Block exact, Simd::Block lower) {
+        m_exact.Start(exact);
+        m_folded = capitals;
+        if (capitals) m_lower.Start(lower);
     }
     TAVO_MULTIPLIES void Store(Key& key) const {
         key.hash = m_exact.Checksum();
@@ -140,25 +144,33 @@ TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key
     const auto letters = [](Block bytes) TAVO_MULTIPLIES {
         return And(Below8(All8('A' - 1), bytes), Below8(bytes, All8('Z' + 1)));
     };
+    const auto lowered = [](Block bytes, Block capitals)
+                             TAVO_MULTIPLIES { return Or(bytes, And(capitals, All8(0x20))); };
     Folder folder;
-    const auto one = [&](Block bytes) TAVO_MULTIPLIES {
-        const Block capitals = letters(bytes);
-        folder.Add(Mask(capitals) != 0, Shuffle(bytes, low));
-        folder.AddLower(Shuffle(Or(bytes, And(capitals, All8(0x20))), low));
-    };
 
     std::size_t i = count % 8 ? count % 8 : 8;
     std::uint64_t first;
     std::memcpy(&first, text, 8);
-    one(Pair(first << 8 * (8 - i), 0));
+    const Block head = Pair(first << 8 * (8 - i), 0), headCapitals = letters(head);
+    folder.Start(Mask(headCapitals) != 0, Shuffle(head, low), Shuffle(lowered(head, headCapitals), low));
     if ((count - i) % kBlock) {
         std::memcpy(&first, text + i, 8);
-        one(Pair(first, 0));
+        const Block next = Pair(first, 0), capitals = letters(next);
+        folder.Add(Mask(capitals) != 0, Shuffle(next, low));
+        folder.AddLower(Shuffle(lowered(next, capitals), low));
         i += 8;
     }
-    for (; i < count; i += kBlock) {
+    for (; count - i >= 2 * kBlock; i += 2 * kBlock) {
+        const Block a = Load(text + i), b = Load(text + i + kBlock);
+        const Block capitalsA = letters(a), capitalsB = letters(b);
+        const Block lowerA = lowered(a, capitalsA), lowerB = lowered(b, capitalsB);
+        folder.Add(Mask(Or(capitalsA, capitalsB)) != 0, Shuffle(a, low), Shuffle(a, high), Shuffle(b, low),
+                   Shuffle(b, high));
+        folder.AddLower(Shuffle(lowerA, low), Shuffle(lowerA, high), Shuffle(lowerB, low), Shuffle(lowerB, high));
+    }
+    if (i < count) {
         const Block bytes = Load(text + i), capitals = letters(bytes);
-        const Block lower = Or(bytes, And(capitals, All8(0x20)));
+        const Block lower = lowered(bytes, capitals);
         folder.Add(Mask(capitals) != 0, Shuffle(bytes, low), Shuffle(bytes, high));
         folder.AddLower(Shuffle(lower, low), Shuffle(lower, high));
     }

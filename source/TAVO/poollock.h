@@ -7,7 +7,14 @@
 // processors pass a barrier. After that, either the holder sees the sleeper or the sleeper sees the lock free. Where
 // the system offers no such barrier, leaving pays for one.
 //
-// The lock makes no promise of turns: a thread that takes it again and again without a pause can keep sleepers waiting.
+// A thread that takes the lock many times with no other in between becomes its favourite and needs no exchange any
+// more: it writes down that it is in, then looks whether it still is the favourite. Any other thread takes the lock as
+// always, which keeps further ones out, ends the favour and makes all processors pass a barrier. After that, either the
+// favourite sees the end and retreats, or the other sees that it is in and waits for it to leave. Without such a
+// barrier there are no favourites.
+//
+// Whoever comes by while the lock is free may take it ahead of sleepers. But one that has slept for long gets it handed
+// over by a thread that leaves, so a thread that takes it again and again without a pause keeps nobody out for good.
 
 #include "platform/platform.h"
 #include "simd.h"
@@ -15,6 +22,7 @@
 #include <atomic>
 #include <boost/thread/condition_variable.hpp>
 #include <boost/thread/mutex.hpp>
+#include <utility>
 
 namespace TAVO::String::pool {
 
@@ -22,15 +30,28 @@ class Lock {
 public:
     void Enter() noexcept {
         const std::uint32_t self = Platform::GetThreadId();
-        if (IsReentry(self)) return;
+        if (IsReentry(self) || EnterFavoured(self)) return;
         if (TAVO_UNLIKELY(!Take())) Wait();
+        if (TAVO_UNLIKELY(HasRival())) {
+            EndFavour();
+            if (HasRival()) WaitForRival();
+        }
         Own(self);
     }
 
+    // Never waits.
     bool TryEnter() noexcept {
         const std::uint32_t self = Platform::GetThreadId();
-        if (IsReentry(self)) return true;
+        if (IsReentry(self) || EnterFavoured(self)) return true;
         if (!Take()) return false;
+        if (HasRival()) {
+            EndFavour();
+            if (HasRival()) {
+                m_taken.store(false, std::memory_order_release);
+                WakeSleepers();
+                return false;
+            }
+        }
         Own(self);
         return true;
     }
@@ -38,40 +59,88 @@ public:
     void Leave() noexcept {
         if (--m_depth) return;
         m_owner.store(0, std::memory_order_relaxed);
-        m_taken.store(false, std::memory_order_release);
-        if (TAVO_UNLIKELY(HasSleepers())) WakeOne();
+        if (std::exchange(m_ownerTook, false))
+            m_taken.store(false, std::memory_order_release);
+        else
+            m_favouriteIn.store(false, std::memory_order_release);
+        WakeSleepers();
     }
 
 private:
+    // Entries in a row that make a favourite, doubled each time a favour ends: ending one costs as much as some
+    // thousand exchanges.
+    static constexpr std::uint32_t kFirstStreak = 4096, kLongestStreak = 1u << 30;
+
     // Only the owner itself can find its own number there.
     bool IsReentry(std::uint32_t self) noexcept {
         if (m_owner.load(std::memory_order_relaxed) != self) return false;
         ++m_depth;
         return true;
     }
+
+    bool EnterFavoured(std::uint32_t self) noexcept {
+        if (m_favourite.load(std::memory_order_relaxed) != self) return false;
+        m_favouriteIn.store(true, std::memory_order_relaxed);
+        std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
+        if (TAVO_UNLIKELY(m_favourite.load(std::memory_order_acquire) != self)) {
+            m_favouriteIn.store(false, std::memory_order_release);
+            WakeSleepers();
+            return false;
+        }
+        m_owner.store(self, std::memory_order_relaxed);
+        m_depth = 1;
+        return true;
+    }
+
     bool Take() noexcept { return !m_taken.exchange(true, std::memory_order_acquire); }
+
+    // Asked by the one that took the lock: whether a favourite may come in, or is in.
+    bool HasRival() const noexcept {
+        return m_favourite.load(std::memory_order_relaxed) != 0 || m_favouriteIn.load(std::memory_order_acquire);
+    }
+
     void Own(std::uint32_t self) noexcept {
         m_owner.store(self, std::memory_order_relaxed);
         m_depth = 1;
+        m_ownerTook = true;
+        if (m_latest != self) {
+            m_latest = self;
+            m_streak = 0;
+        } else if (TAVO_UNLIKELY(++m_streak >= m_neededStreak) && m_flushes) {
+            m_favourite.store(self, std::memory_order_relaxed);
+        }
     }
 
-    // Whether somebody sleeps who may not have seen the lock free; looks after the store that freed it.
-    bool HasSleepers() noexcept {
-        if (!m_sleepersFlush) return m_sleepers.fetch_add(0) != 0; // a barrier, and one that thread checkers understand
-        std::atomic_signal_fence(std::memory_order_seq_cst);       // the compiler keeps the order
-        return m_sleepers.load(std::memory_order_relaxed) != 0;
+    // After the store that freed the lock: wakes sleepers who may not have seen it free.
+    void WakeSleepers() noexcept {
+        if (m_flushes)
+            std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
+        else
+            m_sleepers.fetch_add(0); // a barrier, and one that thread checkers understand
+        if (TAVO_UNLIKELY(m_sleepers.load(std::memory_order_relaxed) != 0)) Wake();
     }
 
+    struct Sleeper;
+    template <class Ready> void Sleep(boost::condition_variable& condition, Sleeper& self, Ready ready) noexcept;
     TAVO_NOINLINE void Wait() noexcept;
-    TAVO_NOINLINE void WakeOne() noexcept;
+    TAVO_NOINLINE void WaitForRival() noexcept;
+    TAVO_NOINLINE void EndFavour() noexcept;
+    TAVO_NOINLINE void Wake() noexcept;
 
+    const bool m_flushes = Platform::CanFlushProcessors();
     std::atomic<bool> m_taken{false};
-    const bool m_sleepersFlush = Platform::CanFlushProcessors();
-    std::atomic<std::uint32_t> m_owner{0};    // thread id; 0 when free
-    std::uint32_t m_depth = 0;                // the owner's
-    std::atomic<std::uint32_t> m_sleepers{0}; // threads that sleep or are about to
+    std::atomic<bool> m_favouriteIn{false};    // or about to see that it no longer is the favourite
+    std::atomic<std::uint32_t> m_owner{0};     // thread id; 0 when nobody is in
+    std::atomic<std::uint32_t> m_favourite{0}; // thread id; 0: none
+    std::atomic<std::uint32_t> m_sleepers{0};  // threads that sleep or are about to
+    // The owner's.
+    std::uint32_t m_depth = 0;
+    bool m_ownerTook = false; // false for a favourite
+    std::uint32_t m_latest = 0, m_streak = 0, m_neededStreak = kFirstStreak;
+
     boost::mutex m_mutex;
-    boost::condition_variable m_left;
+    boost::condition_variable m_left, m_rivalLeft;
+    Sleeper* m_starved = nullptr; // under the mutex: who gets the lock handed over next
 };
 
 // Holds the lock for a scope.

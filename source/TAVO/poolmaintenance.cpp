@@ -49,7 +49,7 @@ void CStringPoolMaintenance::Run() {
 std::int32_t CStringPoolMaintenance::GetPriority() { return m_lastResult ? -2 : 0; }
 
 void* CStringPoolMaintenance::QueryInterface(const _acfUID& type) {
-    const bool known = std::memcmp(&type, &acfTypeOf<Maintenance::IMaintenanceRequest>::uid, sizeof(type)) == 0;
+    const bool known = acfIsSame(type, acfTypeOf<Maintenance::IMaintenanceRequest>::uid);
     return known ? static_cast<Maintenance::IMaintenanceRequest*>(this) : nullptr;
 }
 

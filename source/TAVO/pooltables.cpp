@@ -189,7 +189,13 @@ bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
     return false;
 }
 
+void CCaseSensitiveHash::Clear() noexcept {
+    m_front.Clear();
+    ClearTable();
+}
+
 void CCaseSensitiveHash::OnDispose(const CPObjectMemory& item) {
+    m_front.Forget(Block::Of(item));
     if (!m_groups.Remove(Block::Of(item))) m_groups.complaint = "Case-insensitive hash entry MUST exists";
 }
 

@@ -3,6 +3,7 @@
 // Threads: the pool's lock is held around every call.
 
 #include "hashtable.h"
+#include "poolfront.h"
 #include "pooltext.h"
 
 namespace TAVO::String {
@@ -17,7 +18,15 @@ public:
     using CBaseHashTable::Place;
 
     // The entry of that text; else null, and `place` tells where it would stand.
-    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place) const {
+    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place) {
+        if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
+        Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
+        if (found) m_front.Remember(found);
+        return found;
+    }
+
+    // The same, but nothing is remembered.
+    template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) const {
         place = Lookup::TableAccess::Locate(
             *this, text.key.hash,
             [&](const Buffers::CPObjectMemory& item) {
@@ -43,6 +52,8 @@ public:
 
     // Enters both tables or none, taking over the reference; false without memory.
     bool Add(const Place& place, Buffers::CPObjectMemory&& entry) noexcept;
+    // Lets everything go.
+    void Clear() noexcept;
 
 private:
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
@@ -50,6 +61,7 @@ private:
     void OnDispose(const Buffers::CPObjectMemory& item) override;
 
     CCaseInsensitiveHash& m_groups;
+    PoolFront m_front;
     std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
 };
 

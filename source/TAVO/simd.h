@@ -96,8 +96,9 @@ inline bool HasShuffle() { return __builtin_cpu_supports("ssse3"); }
 // Byte i of the result is byte index[i]; 0 for an index with the highest bit.
 TAVO_SHUFFLES inline Block Shuffle(Block a, Block index) { return _mm_shuffle_epi8(a, index); }
 
-// Multiplying without carry needs PCLMULQDQ, which comes with Shuffle: functions marked TAVO_MULTIPLIES may call Shuffle
-// and Multiply, and may be called when HasMultiply() is true. Blocks are pairs of 64-bit polynomials, the low one first.
+// Multiplying without carry needs PCLMULQDQ, which comes with Shuffle: functions marked TAVO_MULTIPLIES may call
+// Shuffle and Multiply, and may be called when HasMultiply() is true. Blocks are pairs of 64-bit polynomials, the low
+// one first.
 #if defined(_MSC_VER)
 #define TAVO_MULTIPLIES
 #else
@@ -274,11 +275,14 @@ inline std::size_t CountBits(std::uint64_t x) {
     return static_cast<std::size_t>((((x + (x >> 4)) & 0x0F0F0F0F0F0F0F0F) * 0x0101010101010101) >> 56);
 }
 
-// The index of the first zero unit, at most n.
+// The index of the first zero unit, at most n. With `ascii`: whether nothing above 7F stands before it; false may also
+// mean that something stands just outside the text.
 #if defined(TAVO_SSE2)
-// Only whole aligned blocks that hold a unit of the text are loaded, so no page is touched that the text does not
-// reach; sanitizers, which count bytes and not pages, are kept out.
-template <class Unit> TAVO_NOSANITIZE std::size_t ZeroUnit(const Unit* text, std::size_t n) {
+// Only whole aligned blocks that hold a unit of the text are loaded, or four of them in one cache line, so no page is
+// touched that the text does not reach; sanitizers, which count bytes and not pages, are kept out.
+template <class Unit> TAVO_NOSANITIZE std::size_t ZeroUnit(const Unit* text, std::size_t n, bool* ascii = nullptr) {
+    constexpr std::size_t kLine = 4 * kBlock;
+    if (ascii) *ascii = false;
     const auto address = reinterpret_cast<std::uintptr_t>(text);
     if (TAVO_UNLIKELY(address % sizeof(Unit) != 0)) { // no block holds whole units then
         std::size_t i = 0;
@@ -287,25 +291,49 @@ template <class Unit> TAVO_NOSANITIZE std::size_t ZeroUnit(const Unit* text, std
     }
     if (n == 0) return 0;
     const auto zeroes = [](Block block) {
-        return Mask(sizeof(Unit) == 1 ? Equal8(block, All8(0)) : Equal16(block, All16(0)));
+        return sizeof(Unit) == 1 ? Equal8(block, All8(0)) : Equal16(block, All16(0));
+    };
+    const auto isAscii = [](Block all) {
+        return Mask(Equal16(And(all, All16(sizeof(Unit) == 1 ? 0x8080 : 0xFF80)), All16(0))) == 0xFFFF;
     };
     const std::size_t skipped = address % kBlock;
     const auto* block = reinterpret_cast<const unsigned char*>(text) - skipped;
-    std::uint32_t mask = zeroes(LoadAligned(block)) >> skipped;
+    Block all = LoadAligned(block); // or-ed
+    std::uint32_t mask = Mask(zeroes(all)) >> skipped;
     std::size_t i = 0; // the unit that bit 0 of the mask stands for
     for (std::size_t next = (kBlock - skipped) / sizeof(Unit); !mask; next += kBlock / sizeof(Unit)) {
-        if (next >= n) return n;
+        if (next >= n) {
+            if (ascii) *ascii = isAscii(all);
+            return n;
+        }
         i = next;
         block += kBlock;
-        mask = zeroes(LoadAligned(block));
+        while (reinterpret_cast<std::uintptr_t>(block) % kLine == 0) {
+            const Block a = LoadAligned(block), b = LoadAligned(block + kBlock);
+            const Block c = LoadAligned(block + 2 * kBlock), d = LoadAligned(block + 3 * kBlock);
+            if (Mask(Or(Or(zeroes(a), zeroes(b)), Or(zeroes(c), zeroes(d))))) break;
+            all = Or(all, Or(Or(a, b), Or(c, d)));
+            next += kLine / sizeof(Unit);
+            if (next >= n) {
+                if (ascii) *ascii = isAscii(all);
+                return n;
+            }
+            i = next;
+            block += kLine;
+        }
+        const Block one = LoadAligned(block);
+        all = Or(all, one);
+        mask = Mask(zeroes(one));
     }
+    if (ascii) *ascii = isAscii(all);
     const std::size_t found = i + static_cast<std::size_t>(std::countr_zero(mask)) / sizeof(Unit);
     return found < n ? found : n;
 }
 #else
-template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n) {
+template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n, bool* ascii = nullptr) {
     std::size_t i = 0;
     while (i < n && text[i]) ++i;
+    if (ascii) *ascii = false;
     return i;
 }
 #endif

@@ -438,8 +438,10 @@ template <class Source, class Target, class Convert>
 std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target* target, std::size_t capacity,
                          Convert convert) {
     if (!source) return 0;
-    const std::size_t length = Simd::ZeroUnit(source, sourceLength);
-    const Extent extent = MeasureText(source, length);
+    // Asking for ASCII on the way costs next to nothing for bytes only.
+    bool isAscii = false;
+    const std::size_t length = Simd::ZeroUnit(source, sourceLength, sizeof(Source) == 1 ? &isAscii : nullptr);
+    const Extent extent = isAscii ? Extent{length, length, length} : MeasureText(source, length);
     const std::size_t need = extent.target + 1;
     if (!target) return need;
     if (capacity < need) return 0;

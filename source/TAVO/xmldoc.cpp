@@ -190,12 +190,12 @@ bool CXMLDoc::Refuse() noexcept {
     return false;
 }
 
-template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t units) noexcept {
+template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t units, bool isAscii) noexcept {
     Close();
     if constexpr (sizeof(Unit) == 1) {
         // Intended: where the bad sequence lies is not told, neither by the offset nor by the message, and nothing is
         // logged.
-        if (MeasureUtf8(text, units).ending != Ending::Length) {
+        if (!isAscii && MeasureUtf8(text, units).ending != Ending::Length) {
             m_errorCode = kBadCharacterEncoding;
             m_errorText = StoreText(L"Offset: 0, Illegal UTF8 character");
             return false;
@@ -234,18 +234,23 @@ bool CXMLDoc::OpenDocText(void* data, unsigned long long size) noexcept {
     return data && ParseBytes(static_cast<const unsigned char*>(data), size, size / sizeof(wchar_t));
 }
 
-// `units` of the bytes are the text when it is UTF-16.
-bool CXMLDoc::ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t units) noexcept {
+// `wideUnits` of the bytes are the text when it is UTF-16.
+bool CXMLDoc::ParseBytes(const unsigned char* bytes, std::size_t size, std::size_t wideUnits) noexcept {
     if (size < 4) return false;
-    if (bytes[0] == 0) return IsStart(bytes[1]) && ParseUtf16(bytes, units, true);
-    if (FirstUnit(bytes) == kMark) return FirstUnit(bytes + 2) != 0 && ParseUtf16(bytes, units, false);
-    if (FirstUnit(bytes) == kSwappedMark) return ParseUtf16(bytes, units, true);
-    if (bytes[1] == 0 && IsStart(bytes[0])) return ParseUtf16(bytes, units, false);
-    return ParseUnits(bytes, Simd::ZeroUnit(bytes, size));
+    if (bytes[0] == 0) return IsStart(bytes[1]) && ParseUtf16(bytes, wideUnits, true);
+    if (FirstUnit(bytes) == kMark) return FirstUnit(bytes + 2) != 0 && ParseUtf16(bytes, wideUnits, false);
+    if (FirstUnit(bytes) == kSwappedMark) return ParseUtf16(bytes, wideUnits, true);
+    if (bytes[1] == 0 && IsStart(bytes[0])) return ParseUtf16(bytes, wideUnits, false);
+    bool isAscii;
+    const std::size_t units = Simd::ZeroUnit(bytes, size, &isAscii);
+    return ParseUnits(bytes, units, isAscii);
 }
 
 bool CXMLDoc::OpenDocText(const unsigned char* text) noexcept {
-    return text ? ParseUnits(text, Simd::ZeroUnit(text, SIZE_MAX)) : Refuse();
+    if (!text) return Refuse();
+    bool isAscii;
+    const std::size_t units = Simd::ZeroUnit(text, SIZE_MAX, &isAscii);
+    return ParseUnits(text, units, isAscii);
 }
 
 bool CXMLDoc::OpenDocText(const wchar_t* text) noexcept {

@@ -284,21 +284,35 @@ bool _CFileOut::Finish() {
     return m_file.Close();
 }
 
+namespace {
+constexpr double kMostGrowth = 16;
+} // namespace
+
+bool _CMemOut::Grow(std::size_t capacity) {
+    tagCPOMEMHEADER*& block = Block::RefOf(m_collected);
+    auto* grown = block ? static_cast<tagCPOMEMHEADER*>(Platform::Reallocate(block, sizeof(*block) + capacity))
+                        : Block::NewBlock(capacity, 0, &Buffers::CPPlainMemory::_vtbl);
+    if (!grown) return false;
+    block = grown;
+    block->sAllocated = capacity;
+    return true;
+}
+
 bool _CMemOut::Flush() {
     const std::size_t size = BufferedSize();
     tagCPOMEMHEADER*& block = Block::RefOf(m_collected);
-    const std::size_t used = block ? block->sUsed : 0;
-    if (!block || block->sAllocated - used < size) {
-        // The first block takes just what there is: most texts end with it. The next ones double.
-        const std::size_t capacity = std::max(used + size, used * 2);
-        auto* grown = block ? static_cast<tagCPOMEMHEADER*>(Platform::Reallocate(block, sizeof(*block) + capacity))
-                            : Block::NewBlock(capacity, 0, &Buffers::CPPlainMemory::_vtbl);
-        if (!grown) return false;
-        block = grown;
-        block->sAllocated = capacity;
+    const std::size_t used = block ? block->sUsed : 0, needed = used + size;
+    if (!block || block->sAllocated < needed) {
+        // As much as the whole text will take if it goes on as it began, within reason: moving a large text costs as
+        // much as writing it.
+        const double expected = static_cast<double>(needed) * 1.03 / GetDone();
+        const double most = static_cast<double>(needed) * kMostGrowth;
+        const std::size_t capacity =
+            std::max(std::max(needed, used * 2), static_cast<std::size_t>(std::min(expected, most)));
+        if (!Grow(capacity) && !Grow(needed)) return false;
     }
     std::memcpy(reinterpret_cast<unsigned char*>(block + 1) + used, Buffered(), size);
-    block->sUsed = used + size;
+    block->sUsed = needed;
     EmptyBuffer();
     return true;
 }
@@ -368,6 +382,8 @@ public:
     ~Path() { Platform::Release(m_frames); }
 
     bool IsEmpty() const { return m_count == 0; }
+    const Frame* begin() const { return m_frames; }
+    const Frame* end() const { return m_frames + m_count; }
     Frame& Last() { return m_frames[m_count - 1]; }
     void Pop() { --m_count; }
     bool Push(const Frame& frame) {
@@ -392,9 +408,12 @@ private:
     std::size_t m_capacity = 0;
 };
 
-class ElementWriter {
+class ElementWriter final : _IProgress {
 public:
-    explicit ElementWriter(_CXMLOut& out) : m_out(out) {}
+    explicit ElementWriter(_CXMLOut& out) : m_out(out) { out.SetProgress(this); }
+    ElementWriter(const ElementWriter&) = delete;
+    ElementWriter& operator=(const ElementWriter&) = delete;
+    ~ElementWriter() { m_out.SetProgress(nullptr); }
 
     bool Run(const CPXMLObject& element) {
         if (!Open(element)) return false;
@@ -403,7 +422,7 @@ public:
             Frame& last = m_path.Last();
             if (last.next != last.end) {
                 const CPXMLObject& child = *last.next++;
-                
+
                 if (!Open(child)) return false;
                 continue;
             }
@@ -415,6 +434,20 @@ public:
     }
 
 private:
+    // The children of an element take equal shares of it.
+    double GetDone() const override {
+        double done = 0, share = 1;
+        for (const Frame& frame : m_path) {
+            const auto children = static_cast<double>(Elements::Count(frame.node->elements));
+            const auto left = static_cast<double>(frame.end - frame.next);
+            if (children == 0) break;
+            share /= children;
+            done += share * (children - left - 1); // the next one after that which is being written
+            if (share < 1e-3) break;
+        }
+        return std::max(done, 1e-3);
+    }
+
     static bool IsContainer(const Node& node) { return *static_cast<const wchar_t*>(node.name) == L'<'; }
 
     // Writes an element up to its first child, or all of it when it has none.

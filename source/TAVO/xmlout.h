@@ -20,6 +20,15 @@ public:
     virtual bool Flush() = 0; // hands the buffered bytes to the target
 };
 
+// How much of the work is done.
+class _IProgress {
+public:
+    virtual double GetDone() const = 0; // 0 to 1
+
+protected:
+    ~_IProgress() = default;
+};
+
 // The encoding half of a sink; the target is that of the derived class.
 // Flushing is the only virtual call on the writer's way: per buffer, not per text.
 class _CXMLOut : public _IXMLOut {
@@ -40,6 +49,9 @@ public:
     bool EndLine() final;
     void SetFailed() final { m_failed = true; }
 
+    // Who knows how much of the whole text was written; null: nobody.
+    void SetProgress(const _IProgress* progress) { m_progress = progress; }
+
     bool HasFailed() const { return m_failed; }
 
     // Write without the virtual call.
@@ -56,6 +68,7 @@ protected:
     const unsigned char* Buffered() const { return m_buffer; }
     std::size_t BufferedSize() const { return m_buffer ? kBufferSize - m_free : 0; }
     void EmptyBuffer() { m_free = kBufferSize; }
+    double GetDone() const { return m_progress ? m_progress->GetDone() : 1; }
 
 private:
     template <bool escapes, std::size_t before, std::size_t behind>
@@ -69,6 +82,7 @@ private:
     bool CopyUnits(const wchar_t* text, const wchar_t* end);
     bool PutCharacter(ulong32 character);
 
+    const _IProgress* m_progress = nullptr;
     std::size_t m_level = 0;
     bool m_pretty = false;
     bool m_atLineStart = false; // only ever set when m_pretty is
@@ -106,6 +120,8 @@ public:
     bool Finish(Buffers::CPPlainMemory& out);
 
 private:
+    bool Grow(std::size_t capacity);
+
     Buffers::CPObjectMemory m_collected; // plain memory, used as far as it is filled
 };
 

@@ -219,7 +219,8 @@ __attribute__((init_priority(101))) ScopeSlotOwner g_scopeSlotOwner;
 void* GetReleaseScope() noexcept { return TlsGetValue(GetScopeSlot()); }
 void SetReleaseScope(void* scope) noexcept { TlsSetValue(GetScopeSlot(), scope); }
 
-bool CanFlushProcessors() noexcept { return true; }
+// Wine has the function, but up to version 8 it does nothing.
+bool CanFlushProcessors() noexcept { return !GetProcAddress(GetModuleHandleW(L"ntdll"), "wine_get_version"); }
 void FlushProcessors() noexcept { FlushProcessWriteBuffers(); }
 
 void YieldThread() noexcept { SwitchToThread(); }

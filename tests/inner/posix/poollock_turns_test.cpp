@@ -1,0 +1,57 @@
+// Turns at the pool's lock, on one processor, where the scheduler does as told.
+
+#include "poollock.h"
+
+#include <atomic>
+#include <chrono>
+#include <gtest/gtest.h>
+#include <sched.h>
+#include <thread>
+
+using TAVO::String::pool::Lock;
+
+namespace {
+
+// A thread that leaves the lock only to take it again. The other, of the lowest class, never runs in between, so
+// without being handed the lock over it would wait for ever.
+TEST(PoolLock, IsHandedOverToASleeper) {
+    Lock lock;
+    std::atomic<bool> held{false};
+    std::atomic<int> turns{0};
+    const auto onOneProcessor = [](auto body) {
+        return std::thread([=] {
+            cpu_set_t allowed, one;
+            sched_getaffinity(0, sizeof allowed, &allowed);
+            CPU_ZERO(&one);
+            for (int i = 0; i < CPU_SETSIZE; ++i)
+                if (CPU_ISSET(i, &allowed)) {
+                    CPU_SET(i, &one);
+                    break;
+                }
+            sched_setaffinity(0, sizeof one, &one);
+            body();
+        });
+    };
+    int holds = 0;
+    auto greedy = onOneProcessor([&] {
+        lock.Enter();
+        held = true;
+        for (; turns < 5 && holds < 200; ++holds) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(5));
+            lock.Leave();
+            lock.Enter();
+        }
+        lock.Leave();
+    });
+    while (!held) std::this_thread::yield();
+    auto sleeper = onOneProcessor([&] {
+        const sched_param parameters{};
+        sched_setscheduler(0, SCHED_IDLE, &parameters);
+        for (; turns < 5; ++turns) lock.Enter(), lock.Leave();
+    });
+    greedy.join();
+    sleeper.join();
+    EXPECT_LT(holds, 50);
+}
+
+} // namespace
