@@ -20,6 +20,7 @@ Without a choice: --linux --asan --tsan --windows --clang. Choices run in the or
   --coverage       Linux tests with gcov; prints the lines covered per source file
   --fuzz           every fuzz target for a minute (FUZZ_SECONDS=n changes that)
   --bench          benchmarks beside the peers; BENCH_FILTER=regex picks some
+  --soak SECONDS   a host that works on every processor for that long, then 10,000 times loading and unloading
   --tidy           clang-tidy over the library's sources
   --no-setup       do not look for missing packages first
   --help           this text
@@ -151,6 +152,13 @@ bench() {
   cat "$logs/linux-release.bench.log"
 }
 
+soak() { # <seconds>
+  build linux-release
+  step linux-release soak build/linux-release/bin/tavo_soak "$1"
+  cat "$logs/linux-release.soak.log"
+  step linux-release reload env TAVO_LOAD_CYCLES=10000 build/linux-release/bin/tavo_loading_tests --gtest_filter='*Cycles*'
+}
+
 tidy() {
   step linux-clang configure cmake --preset linux-clang
   step linux-clang tidy sh -c 'find source/TAVO -name "*.cpp" ! -iname "*_win.cpp" | xargs -P "$0" -n 4 \
@@ -160,8 +168,16 @@ tidy() {
 setup=1
 windows=0
 choices=
+seconds=
+awaited=
 for argument; do
+  if [ "$awaited" = 1 ]; then
+    case $argument in '' | *[!0-9]*) echo "test.sh: --soak needs a number of seconds"; exit 2 ;; esac
+    seconds=$argument awaited=
+    continue
+  fi
   case $argument in
+    --soak) choices="$choices --soak" awaited=1 ;;
     --help | -h) usage; exit 0 ;;
     --no-setup) setup=0 ;;
     --windows | --windows-debug) windows=1 choices="$choices $argument" ;;
@@ -169,6 +185,7 @@ for argument; do
     *) echo "test.sh: unknown choice $argument"; usage; exit 2 ;;
   esac
 done
+[ -z "$awaited" ] || { echo "test.sh: --soak needs a number of seconds"; exit 2; }
 if [ -z "$choices" ]; then
   choices="--linux --asan --tsan --windows --clang"
   windows=1
@@ -195,6 +212,7 @@ for choice in $choices; do
     --coverage) coverage ;;
     --fuzz) fuzz ;;
     --bench) bench ;;
+    --soak) soak "$seconds" ;;
     --tidy) tidy ;;
   esac
 done

@@ -52,6 +52,7 @@ int Stat(const StatOptions& options);
 
 struct PoolStatOptions {
     std::vector<std::string> files;
+    unsigned watch = 0; // seconds
 };
 int PoolStat(const PoolStatOptions& options);
 

@@ -192,6 +192,12 @@ int Run(std::vector<std::string> arguments) {
     auto* command = pool->add_subcommand("stat", "Tells what the pool holds before, with and after documents");
     auto& poolStat = Add<PoolStatOptions>(*command, action, PoolStat);
     command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
+    command
+        ->add_option("--watch", poolStat.watch,
+                     "Look once a second how the library sweeps the pool by itself, so many seconds at most (60)")
+        ->type_name("SECONDS")
+        ->expected(0, 1)
+        ->default_str("60");
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);

@@ -6,15 +6,18 @@
 #include "streams.h"
 
 #include <algorithm>
+#include <string>
 #include <TAVO/string.h>
+#include <TAVO/threading.h>
 
 namespace tool {
 
 namespace {
 
+using namespace TAVO;
 using TAVO::String::CStringPool;
 
-constexpr TAVO::ulong32 kSweepBudget = 10000; // milliseconds
+constexpr ulong32 kSweepBudget = 10000; // milliseconds
 
 void PrintPool(const char* moment) {
     const auto entries = CStringPool::GetNItems();
@@ -26,9 +29,26 @@ void PrintPool(const char* moment) {
     Print(line);
 }
 
+// Looks on while the maintenance thread sweeps, until the pool is as it was at the start or the time is over.
+bool Watch(unsigned seconds, unsigned long long entriesAtStart) {
+    Print("watching the library's own sweeps\n");
+    const auto begun = Core::OS::GetTimeNow();
+    for (unsigned second = 1; second <= seconds; ++second) {
+        const auto next = begun + second * 1000ull;
+        for (auto now = begun; (now = Core::OS::GetTimeNow()) < next;)
+            Threading::CurrentThread::sleep(static_cast<ulong32>(next - now));
+        const bool back = CStringPool::GetNItems() <= entriesAtStart;
+        PrintPool(("after " + std::to_string(second) + " s").c_str());
+        std::fflush(stdout);
+        if (back) return true;
+    }
+    return false;
+}
+
 } // namespace
 
 int PoolStat(const PoolStatOptions& options) {
+    const auto entriesAtStart = CStringPool::GetNItems();
     PrintPool("at the start");
     int worst = kFine;
     if (!options.files.empty()) {
@@ -44,11 +64,15 @@ int PoolStat(const PoolStatOptions& options) {
         PrintPool("documents open");
     }
     if (!options.files.empty()) PrintPool("documents closed");
-    // The first sweep finds strings idle, the second lets them go.
-    CStringPool::Collect(kSweepBudget);
-    PrintPool("after one sweep");
-    CStringPool::Collect(kSweepBudget);
-    PrintPool("after two sweeps");
+    if (options.watch) {
+        if (!Watch(options.watch, entriesAtStart)) Print("strings were left when the time was over\n");
+    } else {
+        // The first sweep finds strings idle, the second lets them go.
+        CStringPool::Collect(kSweepBudget);
+        PrintPool("after one sweep");
+        CStringPool::Collect(kSweepBudget);
+        PrintPool("after two sweeps");
+    }
     const bool intact = CStringPool::Verify();
     Print(intact ? "every string matches its key\n" : "the pool is damaged\n");
     return intact ? worst : kBadInput;
