@@ -7,8 +7,7 @@ namespace TAVO::ACF {
 
 template class TAVO_TEMPLATE_DEF CPACI<IACFEnumDefinitions>;
 
-// --- the wrapper of IACFUnknown, and all wrappers' life
-// ----------------------------------------------------------------
+// --- the wrapper of IACFUnknown, and all wrappers' life --------------------------------------------------------------
 
 CPIACFUnknown::CPIACFUnknown(CPIACFUnknown&& other) noexcept : m_pointer(Marked(nullptr)) { Take(other); }
 
@@ -136,8 +135,7 @@ bool CPIACFUnknown::createInstance(const _acfUID& cls) noexcept {
     return created && acquired.Get();
 }
 
-// --- the wrapper whose type is chosen at run time
-// ----------------------------------------------------------------------
+// --- the wrapper whose type is chosen at run time --------------------------------------------------------------------
 
 IPACF::~IPACF() = default;
 

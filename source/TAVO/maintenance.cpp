@@ -190,8 +190,7 @@ bool Join(Registry& registry, ulong32 milliseconds) noexcept {
 
 } // namespace
 
-// --- start and stop
-// ----------------------------------------------------------------------------------------------------
+// --- start and stop --------------------------------------------------------------------------------------------------
 
 void Load() noexcept {
     if (!g_registry) g_registry = ::new (static_cast<void*>(g_storage)) Registry;
@@ -248,8 +247,7 @@ bool IsStopPending() noexcept {
     return registry && registry->running && registry->stopping;
 }
 
-// --- the public names
-// --------------------------------------------------------------------------------------------------
+// --- the public names ------------------------------------------------------------------------------------------------
 
 bool RegisterRequest(const CPObjectMemory& request) noexcept {
     Registry* registry = TheRegistry();
