@@ -58,20 +58,20 @@ using NumberKind =
 struct tagCOMPOSE {
     ulong32 day;
     ulong32 frame;
-    ulong32 skipped;  // labels at the start of a minute, as a power of two
+    ulong32 skipped;  // labels at the start of a minute
     ulong32 block;    // 2^20 / the minutes between two that skip none, rounded up; 0 where labels are not skipped
     ulong32 straddle; // by which odd seconds are late
 };
 constexpr tagCOMPOSE kCompose[] = {
     {103680000, 48, 0, 0, 0},      // PAL
     {103680000, 40, 0, 0, 0},      // NTSC
-    {103576320, 40, 1, 104858, 0}, // NTSC(DF)
+    {103576320, 40, 2, 104858, 0}, // NTSC(DF)
     {103680000, 50, 0, 0, 0},      // FILM
     {103680000, 50, 0, 0, 0},      // HDFILM
-    {103572000, 50, 1, 262145, 0}, // HDFILM(DF)
+    {103572000, 50, 2, 262145, 0}, // HDFILM(DF)
     {103680000, 24, 0, 0, 0},      // HD50
     {103680000, 20, 0, 0, 0},      // HDNTSC
-    {103576320, 20, 2, 104858, 0}, // HDNTSC(DF)
+    {103576320, 20, 4, 104858, 0}, // HDNTSC(DF)
     {103680000, 96, 0, 0, 48},     // PAL(PX)
     {103680000, 80, 0, 0, 0},      // NTSC(PX)
     {103680000, 100, 0, 0, 0},     // FILM(PX)
@@ -122,7 +122,10 @@ public:
     /// The position in base units; 0 when flagged.
     operator long long() const noexcept {
         if (m_sys >= 16) return 0;
-        const unsigned long long magnitude = Compose();
+        const ulong32 inDay = ComposeDay();
+        if (m_dd == 0) return inDay;
+        const auto days = static_cast<unsigned long long>(m_dd < 0 ? -1 - m_dd : m_dd);
+        const unsigned long long magnitude = days * detail::kCompose[m_sys].day + inDay;
         return static_cast<long long>(m_dd < 0 ? 0 - magnitude : magnitude);
     }
     /// The position in fields, rounded down; 0 when flagged. For a negative position it is the low half of an unsigned
@@ -144,18 +147,17 @@ public:
     ulong32 sys() const noexcept { return m_sys; } ///< system word
 
 private:
-    unsigned long long Compose() const noexcept {
+    ulong32 ComposeDay() const noexcept {
         const detail::tagCOMPOSE& system = detail::kCompose[m_sys];
         const ulong32 minutes = m_hh * 60 + m_mm;
         ulong32 inDay = (minutes * 60 + m_ss) * 1200;
         if (system.block != 0) { // every minute skips labels, but for those that begin a block
             const ulong32 skipping = minutes - (minutes * system.block >> 20);
-            inDay += (m_ff - (skipping << system.skipped)) * system.frame;
+            inDay += (m_ff - skipping * system.skipped) * system.frame;
         } else {
             inDay += m_ff * system.frame + (m_ss & 1) * system.straddle;
         }
-        if (m_dd == 0 || m_dd == -1) return inDay;
-        return static_cast<unsigned long long>(m_dd < 0 ? -1 - m_dd : m_dd) * system.day + inDay;
+        return inDay;
     }
 
     void BreakDownDropFrame(long long count) noexcept;

@@ -20,7 +20,7 @@ constexpr bool IsComposedRight(ulong32 code) {
     const tagCOMPOSE& c = kCompose[code];
     if (c.day != s.Day() || c.frame != s.frame || c.straddle != s.Straddle()) return false;
     if (!s.IsDrop()) return c.block == 0;
-    return c.block == InverseOf(s.drop.block) && c.frame << c.skipped == s.Dropped();
+    return c.block == InverseOf(s.drop.block) && c.frame * c.skipped == s.Dropped();
 }
 static_assert([] {
     for (ulong32 code = 0; code < kSystemCount; ++code)
