@@ -8,6 +8,7 @@
 // Threads: different handles of one block may be copied and released at once; one handle object is for one thread at a
 // time. Contents have no lock.
 
+#include <new>
 #include <TAVO/core.h>
 #include <utility>
 
@@ -113,6 +114,20 @@ protected:
     /// A new block outside any handle, count 1; null without memory. Sizes near the end of the address space are
     /// refused.
     static tagCPOMEMHEADER* NewBlock(std::size_t capacity, std::size_t used, const tagCPOVTABL* table) noexcept;
+    /// A new block that holds one T; null without memory, and when its constructor throws.
+    template <class T, class... Arguments>
+    static tagCPOMEMHEADER* NewObject(const tagCPOVTABL* table, Arguments&&... arguments) noexcept {
+        static_assert(alignof(T) <= 16, "blocks are aligned to 16");
+        tagCPOMEMHEADER* block = NewBlock(sizeof(T), sizeof(T), table);
+        if (!block) return nullptr;
+        try {
+            ::new (static_cast<void*>(block + 1)) T(std::forward<Arguments>(arguments)...);
+            return block;
+        } catch (...) {
+            Core::OS::_ffree(block);
+            return nullptr;
+        }
+    }
 
     /// Used bytes; 0 when empty.
     std::size_t GetSize() const noexcept { return m_pMH ? m_pMH->sUsed : 0; }

@@ -5,7 +5,6 @@
 // and goes on until nothing is due; then it sleeps at idle priority until the next one is. Every pass in which a
 // request was due and another one was chosen raises its priority by one, so that everyone's turn comes.
 
-#include <new>
 #include <TAVO/buffers.h>
 
 namespace TAVO {
@@ -71,16 +70,8 @@ namespace Maintenance {
 template <class T> class CPRequest : public Buffers::CPObjectMemory {
 public:
     template <class... Arguments> explicit CPRequest(Arguments&&... arguments) noexcept {
-        static_assert(alignof(T) <= 16, "blocks are aligned to 16");
         static const Buffers::tagCPOVTABL table = {nullptr, nullptr, Finalize, QueryInterface};
-        Buffers::tagCPOMEMHEADER* block = NewBlock(sizeof(T), sizeof(T), &table);
-        if (!block) return;
-        try {
-            ::new (static_cast<void*>(block + 1)) T(std::forward<Arguments>(arguments)...);
-            m_pMH = block;
-        } catch (...) {
-            Core::OS::_ffree(block);
-        }
+        m_pMH = NewObject<T>(&table, std::forward<Arguments>(arguments)...);
     }
     CPRequest(const CPRequest&) noexcept = default;
     CPRequest(CPRequest& other) noexcept : CPRequest(static_cast<const CPRequest&>(other)) {}

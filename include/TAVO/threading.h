@@ -214,18 +214,7 @@ private:
 
         CThreadWrapper* Wrapper() const noexcept { return static_cast<CThreadWrapper*>(Payload()); }
 
-        static Buffers::CPObjectMemory Make() noexcept {
-            static_assert(alignof(CThreadWrapper) <= 16, "blocks are aligned to 16");
-            Buffers::tagCPOMEMHEADER* block = NewBlock(sizeof(CThreadWrapper), sizeof(CThreadWrapper), &_vtbl);
-            if (!block) return {};
-            try {
-                CreateIn(block + 1, sizeof(CThreadWrapper));
-            } catch (...) {
-                Core::OS::_ffree(block);
-                return {};
-            }
-            return Handle(block);
-        }
+        static Buffers::CPObjectMemory Make() noexcept { return Handle(NewObject<CThreadWrapper>(&_vtbl)); }
     };
 
     static void CreateIn(void* payload, std::size_t) { ::new (payload) CThreadWrapper; }
@@ -235,6 +224,8 @@ private:
         const bool execute = acfIsSame(type, acfTypeOf<IThreadExecute>::uid);
         return execute ? static_cast<IThreadExecute*>(wrapper) : wrapper->QueryInterface(type);
     }
+
+    friend class Buffers::CPObjectMemory; // builds it
 
     CThreadWrapper() = default;
     ~CThreadWrapper() = default;

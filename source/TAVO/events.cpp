@@ -293,8 +293,7 @@ EventState* EventIn(const Buffers::CPObjectMemory& handle) { return Block::Paylo
 
 const Buffers::tagCPOVTABL CPEvent::_vtbl = detail::kTable<EventState>;
 
-CPEvent::CPEvent(bool manual) noexcept
-    : CPObjectMemory(detail::Built(NewBlock(sizeof(EventState), sizeof(EventState), &_vtbl))) {
+CPEvent::CPEvent(bool manual) noexcept : CPObjectMemory(NewObject<EventState>(&_vtbl)) {
     if (auto* state = detail::StateOf<EventState>(Payload())) state->manual = manual;
 }
 
@@ -322,8 +321,7 @@ unsigned long long CPEvent::Wait(ulong32 ms) const {
 
 const Buffers::tagCPOVTABL CPMultipleEvent::_vtbl = detail::kTable<MultipleEventState>;
 
-CPMultipleEvent::CPMultipleEvent() noexcept
-    : CPObjectMemory(detail::Built(NewBlock(sizeof(MultipleEventState), sizeof(MultipleEventState), &_vtbl))) {}
+CPMultipleEvent::CPMultipleEvent() noexcept : CPObjectMemory(NewObject<MultipleEventState>(&_vtbl)) {}
 
 bool CPMultipleEvent::Attach(const CPEvent& event) const noexcept {
     auto* state = detail::StateOf<MultipleEventState>(Payload());

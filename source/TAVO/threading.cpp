@@ -122,7 +122,7 @@ bool Unnest(std::atomic<std::uint16_t>& count) {
 
 const Buffers::tagCPOVTABL CPMutex::_vtbl = detail::kTable<MutexState>;
 
-CPMutex::CPMutex() noexcept : CPObjectMemory(detail::Built(NewBlock(sizeof(MutexState), sizeof(MutexState), &_vtbl))) {}
+CPMutex::CPMutex() noexcept : CPObjectMemory(NewObject<MutexState>(&_vtbl)) {}
 
 void CPMutex::Enter() const noexcept { TryEnter(WaitForever); }
 
@@ -139,8 +139,7 @@ void CPMutex::Leave() const noexcept {
 
 const Buffers::tagCPOVTABL CPCriticalSection::_vtbl = detail::kTable<CriticalSectionState>;
 
-CPCriticalSection::CPCriticalSection() noexcept
-    : CPObjectMemory(detail::Built(NewBlock(sizeof(CriticalSectionState), sizeof(CriticalSectionState), &_vtbl))) {}
+CPCriticalSection::CPCriticalSection() noexcept : CPObjectMemory(NewObject<CriticalSectionState>(&_vtbl)) {}
 
 namespace {
 
@@ -191,8 +190,7 @@ void CPCriticalSection::Leave() const noexcept {
 
 const Buffers::tagCPOVTABL CPRWInterlock::_vtbl = detail::kTable<InterlockState>;
 
-CPRWInterlock::CPRWInterlock() noexcept
-    : CPObjectMemory(detail::Built(NewBlock(sizeof(InterlockState), sizeof(InterlockState), &_vtbl))) {}
+CPRWInterlock::CPRWInterlock() noexcept : CPObjectMemory(NewObject<InterlockState>(&_vtbl)) {}
 
 void CPRWInterlock::Enter() const noexcept {
     auto* state = detail::StateOf<InterlockState>(Payload());

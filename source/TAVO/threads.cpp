@@ -97,7 +97,7 @@ bool CPThread::Execute(const CPObjectMemory& object, unsigned long long paramete
     if (m_pMH) return false;
     const std::size_t position = queryinterface(object, acfTypeOf<IThreadExecute>::uid);
     if (position == Buffers::NotFound) return false;
-    m_pMH = detail::Built(NewBlock(sizeof(ThreadState), sizeof(ThreadState), &_vtbl));
+    m_pMH = NewObject<ThreadState>(&_vtbl);
     if (!m_pMH) return false;
     try {
         detail::StateOf<ThreadState>(Payload())->thread = boost::thread(_cThreadFunctor(object, position, parameter));
