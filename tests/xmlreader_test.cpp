@@ -10,36 +10,12 @@ using namespace support;
 
 namespace {
 
-// The text ends at its first zero unit.
-template <class Text> Text UpToZero(const Text& text) {
-    return text.substr(0, text.find(typename Text::value_type(0)));
-}
-
 // In UTF-16 with the pair that a character of UTF-8 becomes: texts that differ in nothing but pairs behind the tenth
 // unit are one entry of the pool.
 std::u16string Wide(const std::string& text) {
     std::u16string units = ToUtf16(text);
     std::replace(units.begin(), units.end(), u'\xD83D', u'\xD87D');
     return units;
-}
-
-void Compare(const std::string& whole) {
-    const std::string text = UpToZero(whole);
-    ASSERT_EQ(OpenUtf8(text), XmlReference::Read(text)) << text;
-    const std::string marked = WithMark(text);
-    if (marked.size() >= 4) {
-        ASSERT_EQ(OpenRaw(marked), XmlReference::Read(marked)) << text;
-    }
-}
-
-void Compare(const std::u16string& whole) {
-    const std::u16string text = UpToZero(whole);
-    ASSERT_EQ(OpenUtf16(text), XmlReference::Read(text)) << Printable(text);
-    if (text.empty()) return;
-    const std::u16string marked = u"\xFEFF" + text;
-    const Reading expected = XmlReference::Read(marked);
-    ASSERT_EQ(OpenRaw(BytesOf(marked)), expected) << Printable(text);
-    ASSERT_EQ(OpenRaw(BytesOf(marked, true)), expected) << Printable(text);
 }
 
 const std::string kDocuments[] = {
