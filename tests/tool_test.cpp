@@ -28,16 +28,7 @@ struct Folder {
     }
 };
 
-std::string Get(const std::string& path) {
-    using namespace TAVO::Files::OS;
-    CFile file;
-    if (!file.Open(support::Widen(path), FileAccessRead | FileAccessShareRead, OpenFileExisting)) return "(no file)";
-    std::string bytes(file.GetSize(), 0);
-    TAVO::ulong32 done = 0;
-    EXPECT_TRUE(file.Read(bytes.data(), static_cast<TAVO::ulong32>(bytes.size()), &done));
-    return bytes;
-}
-
+std::string Get(const std::string& path) { return support::Get(support::Widen(path)); }
 bool Contains(const std::string& text, const std::string& part) { return text.find(part) != text.npos; }
 bool Tells(const std::string& text, const std::string& part) {
     return part.empty() ? text.empty() : Contains(text, part);

@@ -64,14 +64,11 @@ TEST(XmlDocument, IntendedDeclarationsRunToTheFirstBracketOutsideQuotes) {
 
 TEST(XmlDocument, XmlDeclaration) {
     Open({"<?xml?><?xml version='1.0'?><a/><?xml version=\"1.0\" ?> -> a", "<?xml version=' 1.0 '?> -> ",
-          "<?xml version='' encoding='  '?><a/> -> a", "<?xml standalone='yes' x='y'?><a/> -> a",
-          "<?XML version='2'?><a/> -> a", "<?xmla version='2' encoding='z'?><a/> -> a",
-          "<a><?xml version='2' encoding='z'?></a> -> a"});
-    Open({"<?xml encoding='UTF-8'?><a/> -> a", "<?xml encoding='uTf-8'?><a/> -> a"}, Utf8);
-    Fail(6, {"<?xml ^1"});
+          "<?xml version='' encoding='  '?><a/> -> a", "<?XML version='2'?><a/> -> a",
+          "<?xmla version='2' encoding='z'?><a/> -> a", "<a><?xml version='2' encoding='z'?></a> -> a"});
+    Open({"<?xml encoding='uTf-8'?><a/> -> a"}, Utf8);
     Fail(11, {"<a/>^<?xml version='1.1'?>", "^<?xml version='1. 0'?>", " ^<?xml encoding='x' version='2'?>"});
-    Fail(12, {" ^<?xml version='1.0' encoding='ISO-8859-1'?>"});
-    Fail(12, {"^<?xml encoding='UTF-16'?><a/>", "^<?xml encoding='Unicode'?><a/>"}, Utf8);
+    Fail(12, {"^<?xml encoding='UTF-16'?><a/>"}, Utf8);
     for (const char16_t* name : {u"utf-16", u"iso-10646-UCS-2", u"UNICODE"})
         Check(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", kGood, 0, "a");
     for (const char16_t* name : {u"UTF-8", u"UTF-16LE", u"UTF-1", u"UTF-16 x"})
@@ -86,7 +83,7 @@ TEST(XmlDocument, Tags) {
              "<a></a ^b='c'>", "<a></a^/>", "<a></^", "<a>x</^"});
     Fail(5, {"<^>", "<^ a/>", "<a><^1/></a>", "<^\xCC\x81/>", "<^\xF0\x9F\x98\x80/>"});
     Fail(6, {"<a^?>", "<a^\"b\"/>", "<a^\xC2\xA9/>"});
-    Fail(14, {"<a>^</b>", "<a><b>^</a></b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
+    Fail(14, {"<a>^</b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
 }
 
 TEST(XmlDocument, Attributes) {
