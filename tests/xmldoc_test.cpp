@@ -75,26 +75,18 @@ TEST(XmlDocument, XmlDeclaration) {
         Check(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", 12, 0);
 }
 
-TEST(XmlDocument, Tags) {
-    Open({"<a \n/> -> a", "<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b",
-          "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301"});
-    Fail(1, {"<a>^", "<a><b/> ^"});
-    Fail(4, {"<^", "<a><^", "<a>x<^", "<ab^", "<a ^", "<a ^<b/>", "<a/^ >", "<a b='c'/^", "<a></a^", "<a></a ^",
-             "<a></a ^b='c'>", "<a></a^/>", "<a></^", "<a>x</^"});
-    Fail(5, {"<^>", "<^ a/>", "<a><^1/></a>", "<^\xCC\x81/>", "<^\xF0\x9F\x98\x80/>"});
-    Fail(6, {"<a^?>", "<a^\"b\"/>", "<a^\xC2\xA9/>"});
-    Fail(14, {"<a>^</b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
-}
-
-TEST(XmlDocument, Attributes) {
-    Open({"<a b='\"' c=\"'\"/> -> a b='\"' c='''", "<a b='1'c=\"2\"d='3'/> -> a b='1' c='2' d='3'",
-          "<a b \t=\r\n '1' >x</a> -> a b='1':x", "<a b=' 1 \t\r\n 2 '/> -> a b='1 2'",
+TEST(XmlDocument, TagsAndAttributes) {
+    Open({"<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b", "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301",
+          "<a b='\"'c=\"'\"d \t=\r\n ' 1 \t\r\n 2 ' >x</a> -> a b='\"' c=''' d='1 2':x",
           "<a b='<c>]]><!-- x --><![CDATA[y]]>'/> -> a b='<c>]]><!-- x --><![CDATA[y]]>'",
           "<a b='' c='1' d=\" \n\"/> -> a c='1'", "<a b='&#32;'/> -> a b=' '", "<a b='' b='1'/> -> a b='1'"});
-    Fail(3, {"<a b=^'1\"/>", "<a b=^\"", "<a b=^'1 "});
-    Fail(4, {"<a b^", "<a b= ^"});
-    Fail(6, {"<a b='1' ^b=''/>", "<a b='1' c='2' ^b='1'/>", "<a ^='1'/>", "<a b ^'1'/>", "<a b^/>", "<a b= ^1/>",
-             "<a b=^>", "<a b='1'^2/>"});
+    Fail(1, {"<a>^", "<a><b/> ^"});
+    Fail(3, {"<a b=^'1\"/>", "<a b=^\""});
+    Fail(4, {"<^", "<a><^", "<a>x<^", "<ab^", "<a ^<b/>", "<a/^ >", "<a></a^", "<a></a ^b='c'>", "<a></^", "<a b^"});
+    Fail(5, {"<^>", "<^ a/>", "<a><^1/></a>", "<^\xCC\x81/>", "<^\xF0\x9F\x98\x80/>"});
+    Fail(6, {"<a^?>", "<a^\xC2\xA9/>", "<a b='1' ^b=''/>", "<a b='1' c='2' ^b='1'/>", "<a ^='1'/>", "<a b ^'1'/>",
+             "<a b= ^1/>", "<a b='1'^2/>"});
+    Fail(14, {"<a>^</b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
 }
 
 TEST(XmlDocument, ManyAttributesAreComparedByTable) {
@@ -109,17 +101,14 @@ TEST(XmlDocument, ManyAttributesAreComparedByTable) {
 }
 
 TEST(XmlDocument, InstructionsAndSections) {
-    Open({"<?a?><?b c='d' ?><a/><?e?> -> a", "<a><?b?><c/><?d e=\"?>\"?></a> -> a(c)", "<a> <?b?> x</a> -> a:x",
-          "<a>x <?b?> <!-- c --> <?d?></a> -> a:x"});
-    Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a?^", "<?a ^<b/>"});
+    Open({"<a><?b?><c/><?d e=\"?>\"?></a> -> a(c)", "<a>x <?b?> <!-- c --> <?d?></a> -> a:x"});
+    Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a ^<b/>"});
     Fail(5, {"<?^?>", "<?^ a?>"});
-    Fail(6, {"<?a text^?>", "<?a^/>", "<a><?b c='1' ^c='1'?></a>"});
+    Fail(6, {"<?a text^?>", "<a><?b c='1' ^c='1'?></a>"});
     Fail(15, {"<a>x<?b?> ^y</a>", "<a>x<?b?>^<![CDATA[y]]></a>", "<a>x^<b/></a>", "<a><b/>^x</a>", "<a>x<?b?>^</b>"});
 
     Open({"<a><![CDATA[ <&#65; \n ]> ]]></a> -> a: <&#65; \\000A ]> ", "<a>p <![CDATA[ x ]]> q</a> -> a:p  x  q",
-          "<a> <![CDATA[x]]> \n</a> -> a:x", "<a><![CDATA[x]]> \t <![CDATA[y]]></a> -> a:x y",
-          "<a><![CDATA[x]]]]><![CDATA[>y]]></a> -> a:x]]>y", "<a><![CDATA[]]]]></a> -> a:]]",
-          "<a><![CDATA[]]> x</a> -> a:x", "<a><![cdata[x]]></a> -> a"});
+          "<a><![CDATA[x]]]]><![CDATA[>y]]></a> -> a:x]]>y", "<a><![CDATA[]]> x</a> -> a:x"});
     Fail(9, {"<a>^<![CDATA[x]]", "<a>x ^<![CDATA[", "<a>^<![CDATA[]></a>"});
     Fail(10, {"<a>^]]></a>", "<a>x ]^]]></a>"});
 }
