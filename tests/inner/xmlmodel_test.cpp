@@ -144,10 +144,9 @@ public:
     // One random operation on both; what they answered.
     std::pair<std::size_t, std::size_t> Step() {
         static const Text kTexts[] = {u"a", u"b", u"c", u"\x4E00", u"", u"1", u"a b"};
-        m_changed = Below(kHandles);
-        CPXMLObject& e = m_real[m_changed];
-        ElementPtr& m = m_model[m_changed];
-        const std::size_t other = Below(kHandles);
+        const std::size_t changed = Below(kHandles), other = Below(kHandles);
+        CPXMLObject& e = m_real[changed];
+        ElementPtr& m = m_model[changed];
         const CPXMLObject child(m_real[other]);
         const ElementPtr modelChild = m_model[other];
         const Text &name = kTexts[Below(7)], &text = kTexts[Below(7)];
@@ -160,7 +159,6 @@ public:
         if (!mayPlace && operation >= 8 && operation <= 16) return {};
         std::size_t n;
         const CPXMLObject* slots = e.GetElements(n);
-        const CPXMLObject old(index < n ? slots[index] : CPXMLObject());
         const auto find = [&](const CPXMLObject* found) { return found ? std::size_t(found - slots) : kNone; };
         if (operation == 0) return {e.SetName(pooled), naive::SetName(m, name)};
         if (operation == 1) return {e.Rename(pooled), m && naive::IsGood(name) && (m->name = name, true)};
@@ -190,6 +188,7 @@ public:
             return {e.Replace(child, index), placed};
         }
         if (operation <= 13) { // the child in a place, an empty handle, too; or the child that is another
+            const CPXMLObject old(index < n ? slots[index] : CPXMLObject());
             const bool isPlace = operation == 12, isNamed = naive::IsNamed(m);
             const bool placed = isNamed && index < count && (isPlace || !naive::IsDefault(modelChild));
             const std::size_t at = placed ? naive::SlotWith(m, m->children[index]) : kNone;
@@ -238,7 +237,6 @@ private:
 
     unsigned Below(std::size_t limit) { return static_cast<unsigned>(m_random() % limit); }
     std::mt19937 m_random;
-    std::size_t m_changed = 0;
     CPXMLObject m_real[kHandles];
     ElementPtr m_model[kHandles];
 };
