@@ -332,34 +332,43 @@ TEST(ToolTimecode, ReadsCountsWithUnits) {
 
 TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
     const std::string valid = "valid, ", invalid = "invalid: ", none = "unassigned: ";
-    ExpectRows("tc|check|--|", "",
-               {{" 10:00:00:00", kFine, valid + "PAL, 43200000 base units"},
-                {"-10:00:00:00", kFine, valid + "PAL, -43200000 base units"},
-                {"10:00:00:00 {30000/1001}Hz/D", kFine, valid + "NTSC(DF), 43156800 base units"},
-                {"10:00:00:25", kBadInput, invalid + "the frames are 25: PAL counts 00 to 24"},
-                {"10.00,01:12", kBadInput, invalid + "the frames are 12: in an odd second PAL(PX) counts 00 to 11"},
-                {"10.00,00:12", kFine, valid + "PAL(PX)"},
-                {"00.01:00.01", kBadInput, "NTSC(DF) skips this label, the minute begins with frame 02"},
-                {"00:01:00:00 {24000/1001}Hz/D", kBadInput, invalid + "the frames are 00: HDFILM(DF) skips this label"},
-                {"744:00:00:00 {25/1}Hz", kBadInput, invalid + "the hours are 744: they go to 743"},
-                {"10:00:00:00+{25/1}Hz", kBadInput, "the mark \"+\" moves by a span that is too large in PAL"},
-                {"*##:##:##:##", kBadInput, invalid + "this is how an invalid position"},
-                {" --:--:--:--", kBadInput, none + "dashes stand for a position that is not given"},
-                {"", kBadInput, none + "it is empty"},
-                {"x", kBadInput, none + "character 1 is \"x\", where a digit of the hours belongs"},
-                {"10:00:00:\xC3\xA9\x30", kBadInput, "character 10 is \"\xC3\xA9\", where a digit of the frames"},
-                {"10:00:00", kBadInput, none + "it ends after character 8, where a separator behind the seconds"},
-                {"10.00,00.00", kBadInput, none + "no system has the separators \".\", \",\" and \".\""},
-                {"1200", kBadInput, none + "it is a count without fields, and does not tell its system"},
-                {"\xFF", kBadInput, none}, // Windows turns it into a character
-                {std::string(300, '1') + ':', kBadInput, none + "character 3 is \"1\", where a separator behind"},
-                {"10:00:00:00 {25/2}Hz/D", kBadInput, none + "there is no drop frame at the rate 25/2"},
-                {"10:00:00:00\xC3\xA9{25/1}Hz", kFine, valid + "PAL, 43200000 base units"}, // any mark does
-                {"10:00:00:00\xC3\xA9{25\xC3\xA9", kBadInput, "character 16 is \"\xC3\xA9\", where \"/\" within"},
-                {"10:-1:00:00 {25/1}Hz", kBadInput, invalid + "the minutes are 4294967295"},
-                {"99999999999:0:0:0 {25/1}Hz", kBadInput, "the number of the hours does not fit 32 bits"},
-                {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), kBadInput, "47 characters at most, and this one 120"},
-                {"x|10:00:00:00", kBadInput, valid + "PAL"}}); // the code is that of the worst
+    const std::pair<std::string, std::string> rows[] = {
+        {" 10:00:00:00", valid + "PAL, 43200000 base units"},
+        {"-10:00:00:00", valid + "PAL, -43200000 base units"},
+        {"10:00:00:00 {30000/1001}Hz/D", valid + "NTSC(DF), 43156800 base units"},
+        {"10:00:00:25", invalid + "the frames are 25: PAL counts 00 to 24"},
+        {"10.00,01:12", invalid + "the frames are 12: in an odd second PAL(PX) counts 00 to 11"},
+        {"10.00,00:12", valid + "PAL(PX)"},
+        {"00.01:00.01", "NTSC(DF) skips this label, the minute begins with frame 02"},
+        {"00:01:00:00 {24000/1001}Hz/D", invalid + "the frames are 00: HDFILM(DF) skips this label"},
+        {"744:00:00:00 {25/1}Hz", invalid + "the hours are 744: they go to 743"},
+        {"10:00:00:00+{25/1}Hz", "the mark \"+\" moves by a span that is too large in PAL"},
+        {"*##:##:##:##", invalid + "this is how an invalid position"},
+        {" --:--:--:--", none + "dashes stand for a position that is not given"},
+        {"", none + "it is empty"},
+        {"x", none + "character 1 is \"x\", where a digit of the hours belongs"},
+        {"10:00:00:\xC3\xA9\x30", "character 10 is \"\xC3\xA9\", where a digit of the frames"},
+        {"10:00:00", none + "it ends after character 8, where a separator behind the seconds"},
+        {"10.00,00.00", none + "no system has the separators \".\", \",\" and \".\""},
+        {"1200", none + "it is a count without fields, and does not tell its system"},
+        {"\xFF", none}, // Windows turns it into a character
+        {std::string(300, '1') + ':', none + "character 3 is \"1\", where a separator behind"},
+        {"10:00:00:00 {25/2}Hz/D", none + "there is no drop frame at the rate 25/2"},
+        {"10:00:00:00\xC3\xA9{25/1}Hz", valid + "PAL, 43200000 base units"}, // any mark does
+        {"10:00:00:00\xC3\xA9{25\xC3\xA9", "character 16 is \"\xC3\xA9\", where \"/\" within"},
+        {"10:-1:00:00 {25/1}Hz", invalid + "the minutes are 4294967295"},
+        {"99999999999:0:0:0 {25/1}Hz", "the number of the hours does not fit 32 bits"},
+        {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "47 characters at most, and this one 120"},
+    };
+    std::vector<std::string> arguments = {"tc", "check", "--"};
+    for (const auto& row : rows) arguments.push_back(row.first);
+    const Finished run = RunTool(arguments);
+    EXPECT_EQ(run.code, kBadInput) << "the worst of all";
+    std::istringstream lines(run.output);
+    std::string line;
+    for (const auto& [text, words] : rows)
+        EXPECT_TRUE(std::getline(lines, line) && Contains(line, words)) << text << '\n' << line;
+    EXPECT_FALSE(std::getline(lines, line)) << "a line each";
     // With a system: its separators or colons, for drop frame also ';' before the frames.
     ExpectRows("tc|check|--system|", "",
                {{"2|00:01:00:02", kFine, valid + "NTSC(DF), 72000 base units"},
