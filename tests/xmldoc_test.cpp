@@ -11,54 +11,23 @@ namespace {
 constexpr unsigned kGood = 128;
 using Texts = std::initializer_list<const char*>;
 
-// What a text must give; the message is the second reader's business.
-struct Answer {
-    unsigned code;
-    std::size_t offset;
-    std::string outline;
-
-    void Check(const Reading& reading, std::size_t mark, const std::string& text) const {
-        const std::size_t place = code == kGood ? 0 : offset + mark;
-        EXPECT_EQ(reading, (Reading{code, place, outline, reading.message})) << text;
-    }
-};
-
-void CheckUtf8(const std::string& text, const Answer& answer) {
-    answer.Check(OpenUtf8(text), 0, text);
-    EXPECT_EQ(OpenUtf8(text), XmlReference::Read(text)) << text;
-    answer.Check(OpenUtf8(WithMark(text)), 3, text);
-    answer.Check(OpenRaw(WithMark(text)), 3, text);
-    if (text.size() >= 4) answer.Check(OpenRaw(text), 0, text);
-}
-
-void CheckUtf16(const std::u16string& text, const Answer& answer) {
-    const std::u16string marked = u"\xFEFF" + text;
-    const std::string shown = Printable(text);
-    answer.Check(OpenUtf16(text), 0, shown);
-    EXPECT_EQ(OpenUtf16(text), XmlReference::Read(text)) << shown;
-    answer.Check(OpenUtf16(marked), 1, shown);
-    for (bool swapped : {false, true}) {
-        answer.Check(OpenRaw(BytesOf(marked, swapped)), 1, shown);
-        const bool isTold = std::u16string(u"< \t\r\n").find(text[0]) != text.npos;
-        if (isTold && text.size() >= 2) answer.Check(OpenRaw(BytesOf(text, swapped)), 0, shown);
-    }
-    answer.Check(OpenRaw(BytesOf(marked) + "<"), 1, shown + " at an odd address");
-}
-
-// '^' is before the error.
-template <class Text> std::size_t TakeMark(Text& text) {
-    const std::size_t mark = text.find('^');
-    if (mark != text.npos) text.erase(mark, 1);
-    return mark;
+// The second reader must give this, and the parser what it gives.
+template <class Text>
+void Check(const Text& text, unsigned code, std::size_t offset, const std::string& outline = std::string()) {
+    const Reading reading = XmlReference::Read(text);
+    EXPECT_EQ(reading, (Reading{code, offset, outline, reading.message}));
+    Compare(text);
 }
 
 enum Form { Both, Utf8 };
 
+// '^' is before the error.
 void Fail(unsigned code, Texts texts, Form form = Both) {
     for (std::string text : texts) {
-        const std::size_t error = TakeMark(text);
-        CheckUtf8(text, {code, error, ""});
-        if (form == Both) CheckUtf16(ToUtf16(text), {code, ToUtf16(text.substr(0, error)).size(), ""});
+        const std::size_t error = text.find('^');
+        text.erase(error, 1);
+        Check(text, code, error);
+        if (form == Both) Check(ToUtf16(text), code, ToUtf16(text.substr(0, error)).size());
     }
 }
 
@@ -66,9 +35,8 @@ void Fail(unsigned code, Texts texts, Form form = Both) {
 void Open(Texts texts, Form form = Both) {
     for (const std::string row : texts) {
         const std::size_t arrow = row.rfind(" -> ");
-        const std::string text = row.substr(0, arrow), outline = row.substr(arrow + 4);
-        CheckUtf8(text, {kGood, 0, outline});
-        if (form == Both) CheckUtf16(ToUtf16(text), {kGood, 0, outline});
+        Check(row.substr(0, arrow), kGood, 0, row.substr(arrow + 4));
+        if (form == Both) Check(ToUtf16(row.substr(0, arrow)), kGood, 0, row.substr(arrow + 4));
     }
 }
 
@@ -96,40 +64,29 @@ TEST(XmlDocument, IntendedDeclarationsRunToTheFirstBracketOutsideQuotes) {
 
 TEST(XmlDocument, XmlDeclaration) {
     Open({"<?xml?><?xml version='1.0'?><a/><?xml version=\"1.0\" ?> -> a", "<?xml version=' 1.0 '?> -> ",
-          "<?xml version='' encoding='  '?><a/> -> a", "<?xml standalone='yes' x='y'?><a/> -> a",
-          "<?XML version='2'?><a/> -> a", "<?xmla version='2' encoding='z'?><a/> -> a",
-          "<a><?xml version='2' encoding='z'?></a> -> a"});
-    Open({"<?xml encoding='UTF-8'?><a/> -> a", "<?xml encoding='uTf-8'?><a/> -> a"}, Utf8);
-    Fail(6, {"<?xml ^1"});
+          "<?xml version='' encoding='  '?><a/> -> a", "<?XML version='2'?><a/> -> a",
+          "<?xmla version='2' encoding='z'?><a/> -> a", "<a><?xml version='2' encoding='z'?></a> -> a"});
+    Open({"<?xml encoding='uTf-8'?><a/> -> a"}, Utf8);
     Fail(11, {"<a/>^<?xml version='1.1'?>", "^<?xml version='1. 0'?>", " ^<?xml encoding='x' version='2'?>"});
-    Fail(12, {" ^<?xml version='1.0' encoding='ISO-8859-1'?>"});
-    Fail(12, {"^<?xml encoding='UTF-16'?><a/>", "^<?xml encoding='Unicode'?><a/>"}, Utf8);
+    Fail(12, {"^<?xml encoding='UTF-16'?><a/>"}, Utf8);
     for (const char16_t* name : {u"utf-16", u"iso-10646-UCS-2", u"UNICODE"})
-        CheckUtf16(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", {kGood, 0, "a"});
+        Check(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", kGood, 0, "a");
     for (const char16_t* name : {u"UTF-8", u"UTF-16LE", u"UTF-1", u"UTF-16 x"})
-        CheckUtf16(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", {12, 0, ""});
+        Check(u"<?xml encoding='" + std::u16string(name) + u"'?><a/>", 12, 0);
 }
 
-TEST(XmlDocument, Tags) {
-    Open({"<a \n/> -> a", "<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b",
-          "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301"});
-    Fail(1, {"<a>^", "<a><b/> ^"});
-    Fail(4, {"<^", "<a><^", "<a>x<^", "<ab^", "<a ^", "<a ^<b/>", "<a/^ >", "<a b='c'/^", "<a></a^", "<a></a ^",
-             "<a></a ^b='c'>", "<a></a^/>", "<a></^", "<a>x</^"});
-    Fail(5, {"<^>", "<^ a/>", "<a><^1/></a>", "<^\xCC\x81/>", "<^\xF0\x9F\x98\x80/>"});
-    Fail(6, {"<a^?>", "<a^\"b\"/>", "<a^\xC2\xA9/>"});
-    Fail(14, {"<a>^</b>", "<a><b>^</a></b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
-}
-
-TEST(XmlDocument, Attributes) {
-    Open({"<a b='\"' c=\"'\"/> -> a b='\"' c='''", "<a b='1'c=\"2\"d='3'/> -> a b='1' c='2' d='3'",
-          "<a b \t=\r\n '1' >x</a> -> a b='1':x", "<a b=' 1 \t\r\n 2 '/> -> a b='1 2'",
+TEST(XmlDocument, TagsAndAttributes) {
+    Open({"<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b", "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301",
+          "<a b='\"'c=\"'\"d \t=\r\n ' 1 \t\r\n 2 ' >x</a> -> a b='\"' c=''' d='1 2':x",
           "<a b='<c>]]><!-- x --><![CDATA[y]]>'/> -> a b='<c>]]><!-- x --><![CDATA[y]]>'",
           "<a b='' c='1' d=\" \n\"/> -> a c='1'", "<a b='&#32;'/> -> a b=' '", "<a b='' b='1'/> -> a b='1'"});
-    Fail(3, {"<a b=^'1\"/>", "<a b=^\"", "<a b=^'1 "});
-    Fail(4, {"<a b^", "<a b= ^"});
-    Fail(6, {"<a b='1' ^b=''/>", "<a b='1' c='2' ^b='1'/>", "<a ^='1'/>", "<a b ^'1'/>", "<a b^/>", "<a b= ^1/>",
-             "<a b=^>", "<a b='1'^2/>"});
+    Fail(1, {"<a>^", "<a><b/> ^"});
+    Fail(3, {"<a b=^'1\"/>", "<a b=^\""});
+    Fail(4, {"<^", "<a><^", "<a>x<^", "<ab^", "<a ^<b/>", "<a/^ >", "<a></a^", "<a></a ^b='c'>", "<a></^", "<a b^"});
+    Fail(5, {"<^>", "<^ a/>", "<a><^1/></a>", "<^\xCC\x81/>", "<^\xF0\x9F\x98\x80/>"});
+    Fail(6, {"<a^?>", "<a^\xC2\xA9/>", "<a b='1' ^b=''/>", "<a b='1' c='2' ^b='1'/>", "<a ^='1'/>", "<a b ^'1'/>",
+             "<a b= ^1/>", "<a b='1'^2/>"});
+    Fail(14, {"<a>^</b>", "<a>^</>", "<a>^</ a>", "<a>^</ab>", "<ab>^</a>"});
 }
 
 TEST(XmlDocument, ManyAttributesAreComparedByTable) {
@@ -144,17 +101,14 @@ TEST(XmlDocument, ManyAttributesAreComparedByTable) {
 }
 
 TEST(XmlDocument, InstructionsAndSections) {
-    Open({"<?a?><?b c='d' ?><a/><?e?> -> a", "<a><?b?><c/><?d e=\"?>\"?></a> -> a(c)", "<a> <?b?> x</a> -> a:x",
-          "<a>x <?b?> <!-- c --> <?d?></a> -> a:x"});
-    Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a?^", "<?a ^<b/>"});
+    Open({"<a><?b?><c/><?d e=\"?>\"?></a> -> a(c)", "<a>x <?b?> <!-- c --> <?d?></a> -> a:x"});
+    Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a ^<b/>"});
     Fail(5, {"<?^?>", "<?^ a?>"});
-    Fail(6, {"<?a text^?>", "<?a^/>", "<a><?b c='1' ^c='1'?></a>"});
+    Fail(6, {"<?a text^?>", "<a><?b c='1' ^c='1'?></a>"});
     Fail(15, {"<a>x<?b?> ^y</a>", "<a>x<?b?>^<![CDATA[y]]></a>", "<a>x^<b/></a>", "<a><b/>^x</a>", "<a>x<?b?>^</b>"});
 
     Open({"<a><![CDATA[ <&#65; \n ]> ]]></a> -> a: <&#65; \\000A ]> ", "<a>p <![CDATA[ x ]]> q</a> -> a:p  x  q",
-          "<a> <![CDATA[x]]> \n</a> -> a:x", "<a><![CDATA[x]]> \t <![CDATA[y]]></a> -> a:x y",
-          "<a><![CDATA[x]]]]><![CDATA[>y]]></a> -> a:x]]>y", "<a><![CDATA[]]]]></a> -> a:]]",
-          "<a><![CDATA[]]> x</a> -> a:x", "<a><![cdata[x]]></a> -> a"});
+          "<a><![CDATA[x]]]]><![CDATA[>y]]></a> -> a:x]]>y", "<a><![CDATA[]]> x</a> -> a:x"});
     Fail(9, {"<a>^<![CDATA[x]]", "<a>x ^<![CDATA[", "<a>^<![CDATA[]></a>"});
     Fail(10, {"<a>^]]></a>", "<a>x ]^]]></a>"});
 }
@@ -168,9 +122,9 @@ TEST(XmlDocument, IntendedReferenceLookUpIsInverted) {
     Fail(6, {"<a b=\"&\" c=\"d^\"/>"});
     Fail(16, {"<a>&xy\xC3^\xA9</a>", "<a>&x\xE4\xB8^\xAD</a>"}, Utf8);
     Open({"<a>&x\xC3\xA9y</a> -> a:<y"}, Utf8);
-    CheckUtf16(u"<a>&xy\xD83D\xDE00</a>", {16, 7, ""});
-    CheckUtf16(u"<a>&x\xD83D\xDE00y</a>", {kGood, 0, "a:<y"});
-    CheckUtf16(u"<a>&\xDC00xzy</a>", {kGood, 0, "a:<y"});
+    Check<std::u16string>(u"<a>&xy\xD83D\xDE00</a>", 16, 7);
+    Check<std::u16string>(u"<a>&x\xD83D\xDE00y</a>", kGood, 0, "a:<y");
+    Check<std::u16string>(u"<a>&\xDC00xzy</a>", kGood, 0, "a:<y");
 }
 
 TEST(XmlDocument, IntendedNumericReferences) {
@@ -203,18 +157,18 @@ TEST(XmlDocument, CharactersOfUtf8) {
 }
 
 TEST(XmlDocument, CharactersOfUtf16) {
-    CheckUtf16(u"<a b='\xD83D\xDE00'>\xD800\xDC00</a>", {kGood, 0, "a b='\\D83D\\DE00':\\D800\\DC00"});
-    CheckUtf16(u"<a>\xD83D\xDBFF\xD83D\xE000</a>", {kGood, 0, "a:\\D83D\\DBFF\\D83D\\E000"}); // from DBFF up
-    CheckUtf16(u"<a>\x01\xFFFE\xFFFF\xDBFF\xDFFF</a>", {kGood, 0, "a:\\0001\\FFFE\\FFFF\\DBFF\\DFFF"});
-    CheckUtf16(u"<a><!-- \xD83D -->x</a>", {kGood, 0, "a:x"});
+    Check<std::u16string>(u"<a b='\xD83D\xDE00'>\xD800\xDC00</a>", kGood, 0, "a b='\\D83D\\DE00':\\D800\\DC00");
+    Check<std::u16string>(u"<a>\xD83D\xDBFF\xD83D\xE000</a>", kGood, 0, "a:\\D83D\\DBFF\\D83D\\E000"); // from DBFF up
+    Check<std::u16string>(u"<a>\x01\xFFFE\xFFFF\xDBFF\xDFFF</a>", kGood, 0, "a:\\0001\\FFFE\\FFFF\\DBFF\\DFFF");
+    Check<std::u16string>(u"<a><!-- \xD83D -->x</a>", kGood, 0, "a:x");
     for (std::u16string text : {u"<a>x^\xD83Dy</a>", u"<a>^\xD83D\xDBFE\xDC00</a>", u"<a>^\xDE00</a>",
                                 u"<a b='x ^\xDE00'/>", u"<a>^\xD83D", u"<a><![CDATA[x^\xD83D]]></a>"}) {
-        const std::size_t error = TakeMark(text);
-        CheckUtf16(text, {16, error, ""});
+        const std::size_t error = text.find(u'^');
+        Check(text.erase(error, 1), 16, error);
     }
-    CheckUtf16(u"<a\xD83D\xDE00/>", {6, 2, ""});
-    CheckUtf16(u"<\xD83D\xDE00/>", {5, 1, ""});
-    CheckUtf16(u"\xDE00<a/>", {5, 0, ""});
+    Check<std::u16string>(u"<a\xD83D\xDE00/>", 6, 2);
+    Check<std::u16string>(u"<\xD83D\xDE00/>", 5, 1);
+    Check<std::u16string>(u"\xDE00<a/>", 5, 0);
 }
 
 // Bytes that are no UTF-8 are refused before anything is read.

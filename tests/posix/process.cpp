@@ -20,14 +20,14 @@ std::string Contents(std::FILE* file) {
     return bytes;
 }
 
+} // namespace
+
 std::string ToolPath() {
     char path[4096];
     const auto length = readlink("/proc/self/exe", path, sizeof path);
     const std::string self(path, length > 0 ? static_cast<std::size_t>(length) : 0);
     return self.substr(0, self.rfind('/') + 1) + "tavo";
 }
-
-} // namespace
 
 Finished RunTool(const std::vector<std::string>& arguments, const std::string& input) {
     const std::string tool = ToolPath();

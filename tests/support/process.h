@@ -16,6 +16,9 @@ struct Finished {
 // Arguments in UTF-8, without the program's name. Its standard streams are files, never terminals.
 Finished RunTool(const std::vector<std::string>& arguments, const std::string& input = std::string());
 
+// The tool's path; there is none on Windows, which finds it by itself.
+std::string ToolPath();
+
 // How often `tavo xml stat` has to read a document to be busy for about that many milliseconds on this machine.
 inline std::string RepeatsFor(double milliseconds, const std::string& document) {
     const std::string output = RunTool({"xml", "stat", "--repeat", "20", document}).output;

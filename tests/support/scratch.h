@@ -73,6 +73,17 @@ inline void Put(const wchar_t* path, const std::string& bytes) {
     ASSERT_TRUE(file.Write(bytes.data(), static_cast<TAVO::ulong32>(bytes.size()), nullptr));
 }
 
+// The bytes of a file; "(no file)" when there is none.
+inline std::string Get(const wchar_t* path) {
+    using namespace TAVO::Files::OS;
+    CFile file;
+    if (!file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting)) return "(no file)";
+    std::string bytes(file.GetSize(), 0);
+    TAVO::ulong32 done = 0;
+    EXPECT_TRUE(file.Read(bytes.data(), static_cast<TAVO::ulong32>(bytes.size()), &done) && done == bytes.size());
+    return bytes;
+}
+
 // A test with a folder, a path in it where no file is yet, and what it takes to use one.
 struct FileTest : testing::Test {
     ScratchFolder folder;

@@ -56,7 +56,6 @@ private:
         if (m_pretty) m_units += u"\r\n";
         m_atLineStart = true;
     }
-    static bool MustEscape(char16_t c) { return Text(u"&<>\"'").find(c) != Text::npos; }
     static Text Escaped(const Text& text) {
         Text out;
         for (char16_t c : text)
@@ -69,9 +68,7 @@ private:
         return out;
     }
     static Text Section(Text text) {
-        bool literal = false;
-        for (char16_t c : text) literal |= MustEscape(c);
-        if (!literal) return text;
+        if (Escaped(text) == text) return text;
         for (std::size_t at = 0; (at = text.find(u"]]>", at)) != Text::npos; at += 14)
             text.replace(at, 3, u"]]]]><![CDATA[>");
         return u"<![CDATA[" + text + u"]]>";
@@ -119,20 +116,15 @@ private:
                 continue;
             }
             const std::size_t free = 16384 - m_bytes.size() % 16384;
-            const auto trail = [&](int shift) { m_bytes += static_cast<char>(0x80 | (c >> shift & 0x3F)); };
-            if (c < 0x80) {
+            const auto trail = [&](int shift) { return static_cast<char>(0x80 | (c >> shift & 0x3F)); };
+            if (c < 0x80)
                 m_bytes += static_cast<char>(c);
-            } else if (c < 0x800) {
-                m_bytes += static_cast<char>(0xC0 | c >> 6);
-                trail(0);
-            } else {
-                if (c == 0xFFFF && free < 4)
-                    m_bytes += "\xF0\x8F";
-                else
-                    m_bytes += static_cast<char>(0xE0 | c >> 12);
-                trail(6);
-                trail(0);
-            }
+            else if (c < 0x800)
+                m_bytes += {static_cast<char>(0xC0 | c >> 6), trail(0)};
+            else if (c == 0xFFFF && free < 4)
+                m_bytes += "\xF0\x8F\xBF\xBF";
+            else
+                m_bytes += {static_cast<char>(0xE0 | c >> 12), trail(6), trail(0)};
         }
         return true;
     }

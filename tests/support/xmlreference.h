@@ -1,6 +1,7 @@
 #pragma once
 // A second reader of documents, slow and plain, written from the rules: the parser is compared with it.
 
+#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 #include <optional>
@@ -70,9 +71,7 @@ struct Reading {
     std::string outline; // empty when there is no root
     std::u16string message;
 
-    bool operator==(const Reading& other) const {
-        return code == other.code && offset == other.offset && outline == other.outline && message == other.message;
-    }
+    bool operator==(const Reading& other) const = default;
 };
 
 // How CXMLDoc answers for the text that it has opened or refused.
@@ -166,13 +165,15 @@ private:
             if (At(at + i) == kNone || (At(at + i) & 0xC0) != 0x80) return 0;
         return length;
     }
+    // Past that character, or that unit of none.
+    std::size_t Step(std::size_t at) const { return Length(at) ? Length(at) : 1; }
     bool IsValid() const {
-        for (std::size_t at = 0; at < Size(); at += Length(at))
-            if (!Length(at)) return false;
-        return true;
+        std::size_t at = 0;
+        while (Length(at)) at += Length(at);
+        return at == Size();
     }
-    char32_t Utf8Value(std::size_t at) const {
-        const std::size_t length = Length(at);
+    char32_t Value(std::size_t at) const {
+        const std::size_t length = m_utf8 ? Length(at) : 1;
         if (length == 1) return At(at);
         char32_t value = At(at) & (0xFFu >> (length + 1));
         for (std::size_t i = 1; i < length; ++i) value = value << 6 | (At(at + i) & 0x3F);
@@ -182,6 +183,15 @@ private:
     static std::u16string Wide(char32_t value) {
         if (value < 0x10000) return std::u16string(1, static_cast<char16_t>(value));
         return {static_cast<char16_t>(0xD800 | value >> 10), static_cast<char16_t>(0xDC00 | (value & 0x3FF))};
+    }
+    // The units that the character there becomes; none of what is no character.
+    std::u16string UnitsAt(std::size_t at, char32_t limit = 0x110000) const {
+        const std::size_t length = Length(at);
+        if (!m_utf8)
+            return std::u16string(m_text.begin() + std::ptrdiff_t(at), m_text.begin() + std::ptrdiff_t(at + length));
+        const char32_t value = Value(at);
+        const bool isNone = !length || !value || value >= limit || (value >= 0xD800 && value <= 0xDFFF);
+        return isNone ? std::u16string() : Wide(value);
     }
 
     // --- document ---
@@ -213,21 +223,17 @@ private:
         m_at += 2;
         while (!AtEnd() && At(m_at) != '>') {
             const char32_t quote = At(m_at);
-            if (quote == '"' || quote == '\'') {
-                const std::size_t end = m_text.find(quote, m_at + 1);
-                if (end == m_text.npos) throw Error{3, m_at};
-                m_at = end;
-            }
-            ++m_at;
+            const std::size_t end = quote == '"' || quote == '\'' ? m_text.find(quote, m_at + 1) : m_at;
+            if (end == m_text.npos) throw Error{3, m_at};
+            m_at = end + 1;
         }
         if (AtEnd()) throw comment ? Error{2, start} : Error{1, Size()};
         ++m_at;
     }
 
     std::size_t Find(const char* what, std::size_t from) const {
-        for (; from < Size(); ++from)
-            if (Is(what, from)) return from;
-        return Size();
+        while (from < Size() && !Is(what, from)) ++from;
+        return from;
     }
 
     void Comment() {
@@ -275,9 +281,8 @@ private:
         for (;;) {
             const std::size_t length = Length(m_at);
             if (!length || (length > 1 && !m_utf8)) break;
-            const char32_t value = m_utf8 ? Utf8Value(m_at) : At(m_at);
-            if (!Names(value, name.empty())) break;
-            name += Wide(value);
+            if (!Names(Value(m_at), name.empty())) break;
+            name += UnitsAt(m_at);
             m_at += length;
         }
         if (name.empty()) throw Error{missing, m_at};
@@ -422,7 +427,7 @@ private:
         if (!Is("&#")) {
             const char32_t value = Is("&lt;") ? '>' : '<';
             if (start + 4 > Size()) throw Error{1, Size()};
-            for (m_at = start + 1; m_at < start + 4;) m_at += Length(m_at) ? Length(m_at) : 1;
+            for (m_at = start + 1; m_at < start + 4;) m_at += Step(m_at);
             if (m_at != start + 4) throw Error{16, start + 4};
             return value;
         }
@@ -430,7 +435,7 @@ private:
         for (m_at += 2; At(m_at) >= '0' && At(m_at) <= ':'; ++m_at)
             if (value < 0x200000) value = value * 10 + (At(m_at) - '0');
         const bool allowed = value == 9 || value == 10 || value == 13 || (value >= 0x20 && value <= 0xD7FF) ||
-                             (value >= 0xE000 && value <= 0xFFFD) || (value >= 0x10000 && value <= 0x10FFFF);
+                             (value >= 0xE000 && value <= 0x10FFFF && value != 0xFFFE && value != 0xFFFF);
         if (At(m_at) != ';' || !allowed) throw Error{7, start};
         if (value >= 0x100000) throw Error{16, start};
         ++m_at;
@@ -438,17 +443,9 @@ private:
     }
 
     void Character(std::vector<Token>& tokens) {
-        const std::size_t length = Length(m_at);
-        std::u16string units;
-        if (!m_utf8) {
-            for (std::size_t i = 0; i < length; ++i) units += static_cast<char16_t>(At(m_at + i));
-        } else if (length) {
-            const char32_t value = Utf8Value(m_at);
-            if (value && value < 0x100000 && (value < 0xD800 || value > 0xDFFF)) units = Wide(value);
-        }
-        if (units.empty()) throw Error{16, m_at};
-        tokens.push_back({false, units});
-        m_at += length;
+        tokens.push_back({false, UnitsAt(m_at, 0x100000)});
+        if (tokens.back().units.empty()) throw Error{16, m_at};
+        m_at += Length(m_at);
     }
 
     // --- the message ---
@@ -461,42 +458,22 @@ private:
             "Bad termination tag|Mixed content|Illegal character|Root element missing|DOM error");
         std::string text;
         for (unsigned code = 0; code <= error.code; ++code) std::getline(texts, text, '|');
-        std::size_t line = 1;
-        for (std::size_t i = 0; i < error.offset; ++i) line += At(i) == '\n';
-        std::string header("[");
-        header.append(text).append(", Line ").append(std::to_string(line));
-        header.append(", Offset ").append(std::to_string(error.offset)).append("]");
+        const auto lines = std::count(m_text.begin(), m_text.begin() + std::ptrdiff_t(error.offset), U'\n');
+        const std::string header = "[" + text + ", Line " + std::to_string(lines + 1) + ", Offset " +
+                                   std::to_string(error.offset) + (error.offset > 60 ? "]..." : "]");
         std::u16string message(header.begin(), header.end());
-        std::size_t at = 0;
-        if (error.offset > 60) {
-            message += u"...";
-            at = error.offset - 60;
-        }
+        std::size_t at = error.offset > 60 ? error.offset - 60 : 0;
         // What the error position cuts is no character of the excerpt.
         const XmlReference before(m_text.substr(0, error.offset), m_utf8);
-        for (bool blank = false; at < error.offset;) {
-            const bool again = blank;
-            blank = Blank(At(at));
-            if (blank && !again) message += u' ';
-            at += blank ? 1 : before.Shown(message, at);
-        }
+        for (; at < error.offset; at += before.Step(at))
+            if (!Blank(At(at)))
+                message += before.UnitsAt(at);
+            else if (!Blank(At(at + 1)) || at + 1 == error.offset)
+                message += u' ';
         message += u"[[*]]";
-        while (at < Size() && message.size() < 120) at += Shown(message, at);
+        for (; at < Size() && message.size() < 120; at += Step(at)) message += UnitsAt(at);
         if (at < Size()) message += u"...";
         return message;
-    }
-
-    // Adds the character there, if it is one; gives its units.
-    std::size_t Shown(std::u16string& message, std::size_t at) const {
-        const std::size_t length = Length(at);
-        if (length == 0) return 1;
-        if (!m_utf8) {
-            for (std::size_t i = 0; i < length; ++i) message += static_cast<char16_t>(At(at + i));
-            return length;
-        }
-        const char32_t value = Utf8Value(at);
-        if (value && value <= 0x10FFFF && (value < 0xD800 || value > 0xDFFF)) message += Wide(value);
-        return length;
     }
 
     std::u32string m_text;

@@ -4,27 +4,16 @@
 #include "guardpage.h"
 #include "xmlreference.h"
 
+#include <filesystem>
 #include <gtest/gtest.h>
 #include <stdexcept>
 
 namespace support {
 
-// A good UTF-8 text in UTF-16.
+// A good UTF-8 text in UTF-16. A path is what the standard library still converts.
 inline std::u16string ToUtf16(const std::string& text) {
-    std::u16string units;
-    for (std::size_t i = 0; i < text.size();) {
-        const unsigned lead = static_cast<unsigned char>(text[i]);
-        const std::size_t length = lead < 0x80 ? 1 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
-        char32_t value = length == 1 ? lead : lead & (0xFFu >> (length + 1));
-        for (std::size_t k = 1; k < length; ++k) value = value << 6 | (static_cast<unsigned char>(text[i + k]) & 0x3F);
-        i += length;
-        if (value >= 0x10000) {
-            units += static_cast<char16_t>(0xD7C0 + (value >> 10));
-            value = 0xDC00 | (value & 0x3FF);
-        }
-        units += static_cast<char16_t>(value);
-    }
-    return units;
+    const std::u8string bytes(text.begin(), text.end());
+    return std::filesystem::path(bytes).u16string();
 }
 
 // The bytes of units, in host order or swapped.
@@ -63,6 +52,23 @@ inline Reading OpenRaw(const std::string& bytes) {
 }
 
 inline std::string WithMark(const std::string& text) { return std::string("\xEF\xBB\xBF").append(text); }
+
+// Opens the text up to its first zero in every way, and compares with the second reader.
+inline void Compare(const std::string& whole) {
+    const std::string text = whole.c_str(), marked = WithMark(text);
+    ASSERT_EQ(OpenUtf8(text), XmlReference::Read(text)) << text;
+    if (!text.empty()) {
+        ASSERT_EQ(OpenRaw(marked), XmlReference::Read(marked)) << text;
+    }
+}
+inline void Compare(const std::u16string& whole) {
+    const std::u16string text = whole.c_str(), marked = u"\xFEFF" + text;
+    ASSERT_EQ(OpenUtf16(text), XmlReference::Read(text)) << Printable(text);
+    for (bool swapped : {false, true})
+        if (!text.empty()) {
+            ASSERT_EQ(OpenRaw(BytesOf(marked, swapped)), XmlReference::Read(marked)) << Printable(text);
+        }
+}
 
 inline void PrintTo(const Reading& reading, std::ostream* out) {
     *out << "code " << reading.code << " at " << reading.offset << " [" << reading.outline << "] \""

@@ -49,14 +49,6 @@ std::string TakeContents(HANDLE stream) {
     return bytes;
 }
 
-std::vector<wchar_t> ToolPath() {
-    std::vector<wchar_t> path(MAX_PATH);
-    path.resize(GetModuleFileNameW(nullptr, path.data(), MAX_PATH));
-    while (!path.empty() && path.back() != L'\\') path.pop_back();
-    for (const wchar_t unit : L"tavo.exe") path.push_back(unit);
-    return path;
-}
-
 } // namespace
 
 Finished RunTool(const std::vector<std::string>& arguments, const std::string& input) {
@@ -77,8 +69,8 @@ Finished RunTool(const std::vector<std::string>& arguments, const std::string& i
 
     Finished finished;
     PROCESS_INFORMATION process = {};
-    const bool started = CreateProcessW(ToolPath().data(), command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
-                                        &start, &process) != 0;
+    const bool started =
+        CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &start, &process) != 0;
     EXPECT_TRUE(started);
     if (started) {
         DWORD code = 0;
