@@ -124,6 +124,11 @@ TEST(PoolKeys, FollowTheRulesForEveryText) {
     for (const Units& text : {Units{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'}, Units{0xD83D, 0xDBFF, 0xD800, 0xDC00},
                               Units{0xC1, 0xC0, 0x41C0, 0x410}})
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, text, true));
+    for (const std::string text : {"x\xC0\x80y", "\xF4\x90\x80\x80", "ab\xE4\xB8",
+                                   "\xF0\x9F"
+                                   "a\x80",
+                                   "\xE4\xFF\x80"})
+        ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(text.begin(), text.end()), true)) << text;
     EXPECT_EQ(assertions.Take(), Texts());
 }
 
