@@ -226,8 +226,9 @@ TEST(HashTable, DisposalSeesCountsMayThrowAndChangeTheTable) {
     };
     EXPECT_FALSE(table.DisposeTable(60000));
     EXPECT_EQ(table.GetNItems(), 11u) << "up to the one that throws";
+    EXPECT_FALSE(table.DisposeTable(60000)) << "reaches the others first";
+    EXPECT_EQ(table.List(), (Entries{{5, {5, 5}}}));
     for (int i = 0; i < 16; ++i) table.AddItem(5, Item(i, i), eHashKeep);
-    table.DeleteIndex(6);
     std::vector<int> disposed;
     table.disposable = [](Content, TAVO::ulong32) { return true; };
     table.onDispose = [&](Content item, TAVO::ulong32 count) {
@@ -236,8 +237,8 @@ TEST(HashTable, DisposalSeesCountsMayThrowAndChangeTheTable) {
         if (item.first == 13) table.DeleteItem(5, Item(2, 0));
         if (item.first == 11) table.ClearTable();
     };
-    EXPECT_TRUE(table.DisposeTable(60000));
-    EXPECT_TRUE(table.GetNItems() == 0 && held.lockcnt() == 1);
+    EXPECT_TRUE(table.DisposeTable(60000) && table.GetNItems() == 0 && held.lockcnt() == 1);
+    EXPECT_EQ(disposed, (std::vector<int>{15, 14, 13, 13, 12, 11})) << "13 again: it was elsewhere after its end";
     table.Fill(3, 1);
     table.onDispose = [](Content, TAVO::ulong32) { throw 1; };
     EXPECT_TRUE(table.DeleteIndex(0) && table.GetNItems() == 0);
