@@ -39,18 +39,15 @@ TEST_F(FileOpen, FollowsTheTableOfOptions) {
     for (unsigned row = 0; row < 128; ++row) {
         const unsigned options = row % 16;
         const bool write = row & 16, share = row & 32, exists = row & 64;
-        SCOPED_TRACE(testing::Message() << "options " << options << " write " << write << " share " << share
-                                        << " exists " << exists);
+        SCOPED_TRACE(testing::Message() << options << " write " << write << " share " << share << " exists " << exists);
         const bool create = options & 1, truncate = options & 4, temporary = options & 8;
         bool expected = exists || create;
         if (temporary && (!create || share || !write)) expected = false;
         if ((options & 3) && (!write || !create)) expected = false;
         if (truncate && !write) expected = false;
 
-        if (exists)
-            Put(path, "abc");
-        else
-            _DeleteFile(path);
+        _DeleteFile(path);
+        if (exists) Put(path, "abc");
         const auto access = (write ? FileAccessWrite : FileAccessRead) | (share ? FileAccessShareRead : FileAccessRead);
         EXPECT_EQ(file.Open(path, access, static_cast<eOpenFileOptions>(options)), expected);
         EXPECT_EQ(file.GetSize(), !expected ? kNone : exists && !truncate ? 3u : 0u);
@@ -60,7 +57,7 @@ TEST_F(FileOpen, FollowsTheTableOfOptions) {
     }
 }
 
-TEST_F(FileOpen, RefusesNullEmptyOpenAndFoldersAndOnlyReads) {
+TEST_F(FileOpen, RefusesWhatIsNoFileAndOnlyReadsWhenAskedTo) {
     Put(path, "x");
     for (const wchar_t* wrong : {static_cast<const wchar_t*>(nullptr), L"", static_cast<const wchar_t*>(folder.Path())})
         EXPECT_FALSE(file.Open(wrong, FileAccessRead, OpenFileExisting) ||
@@ -68,25 +65,23 @@ TEST_F(FileOpen, RefusesNullEmptyOpenAndFoldersAndOnlyReads) {
     ASSERT_TRUE(file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting));
     EXPECT_FALSE(file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting)) << "already open";
     EXPECT_FALSE(file.Write("y", 1, &done) || file.SetEOF() || file.Flush()) << "opened for reading";
-    EXPECT_EQ(done, 0u);
-    EXPECT_EQ(file.GetSize(), 1u) << "and still is";
+    EXPECT_TRUE(done == 0 && file.GetSize() == 1 && file.Close() && file.Close());
+    EXPECT_TRUE(file.GetSize() == kNone && file.GetPointer() == kNone);
+    EXPECT_FALSE(file.Flush() || file.SetPointer(0) || file.MovePointer(0) || file.SetEOF());
+    char byte = 'y';
+    done = 7;
+    EXPECT_FALSE(file.Read(&byte, 1, &done) || std::exchange(done, 7) || file.Write(&byte, 1, &done) || done)
+        << "closed";
 }
 
-TEST_F(FileOpen, CreatesOneMissingFolder) {
+TEST_F(FileOpen, CreatesOneMissingFolderEvenToRead_Intended) {
     EXPECT_FALSE(file.Open(folder / L"a/b/file", FileAccessWrite, OpenFileCreate)) << "two are missing";
     EXPECT_FALSE(_TestDirExists(folder / L"a"));
-    EXPECT_TRUE(file.Open(folder / L"a\\file", FileAccessWrite, OpenFileCreate));
-    EXPECT_TRUE(_TestFileExists(folder / L"a/file"));
-    file.Close();
-    EXPECT_FALSE(file.Open(folder / L"a/missing", FileAccessRead, OpenFileExisting));
+    EXPECT_TRUE(file.Open(folder / L"a\\file", FileAccessWrite, OpenFileCreate) && file.Close());
     EXPECT_FALSE(file.Open(folder / L"a/file/below", FileAccessWrite, OpenFileCreate)) << "a file in the way";
-}
-
-TEST_F(FileOpen, ReadingInAMissingFolderLeavesItBehind_Intended) {
     EXPECT_FALSE(file.Open(folder / L"new/file", FileAccessRead, OpenFileExisting));
-    EXPECT_TRUE(_TestDirExists(folder / L"new"));
     EXPECT_FALSE(file.Open(folder / L"other/file", FileAccessRead, OpenFileCreate)) << "excluded before that";
-    EXPECT_FALSE(_TestDirExists(folder / L"other"));
+    EXPECT_EQ(List(folder.Path()), (std::vector<WideText>{L"a", L"new"}));
 }
 
 TEST_F(FileSharing, All64PairsAnswerAsTheRulesSayInEveryProcess) {
@@ -102,59 +97,29 @@ TEST_F(FileSharing, All64PairsAnswerAsTheRulesSayInEveryProcess) {
 
 TEST_F(FileSharing, ARefusedOpenDoesNotTruncateAndAsksEveryHolder) {
     Put(path, "kept");
-    CFile writer;
-    ASSERT_TRUE(file.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting));
-    EXPECT_FALSE(writer.Open(path, FileAccessWrite | FileAccessShareRead, OpenFileTruncate));
-    EXPECT_FALSE(writer.Open(path, FileAccessWrite | FileAccessShareRead, OpenFileCreate | OpenFileTruncate));
-    EXPECT_EQ(file.GetSize(), 4u);
-    // Every holder is asked, not only the first.
     const auto all = FileAccessShareRead | FileAccessShareWrite;
-    file.Close();
-    CFile second;
+    CFile second, writer;
     ASSERT_TRUE(file.Open(path, FileAccessRead | all, OpenFileExisting));
     ASSERT_TRUE(second.Open(path, FileAccessRead | FileAccessShareRead, OpenFileExisting));
-    EXPECT_FALSE(writer.Open(path, FileAccessWrite | all, OpenFileExisting));
-}
-
-TEST_F(File, ClosedOneAnswersNothing) {
-    char byte = 'x';
-    EXPECT_TRUE(file.Close());
-    EXPECT_TRUE(file.GetSize() == kNone && file.GetPointer() == kNone);
-    EXPECT_FALSE(file.Flush() || file.SetPointer(0) || file.MovePointer(0) || file.SetEOF());
-    EXPECT_FALSE(file.Read(&byte, 1, &done));
-    EXPECT_EQ(std::exchange(done, 7), 0u);
-    EXPECT_FALSE(file.Write(&byte, 1, &done));
-    EXPECT_EQ(done, 0u);
+    for (const auto options : {OpenFileTruncate, OpenFileCreate | OpenFileTruncate, OpenFileExisting})
+        EXPECT_FALSE(writer.Open(path, FileAccessWrite | all, options));
+    EXPECT_EQ(file.GetSize(), 4u);
 }
 
 TEST_F(File, ReadsWritesAndEnds) {
     char buffer[16];
     ASSERT_TRUE(file.Open(path, FileAccessWrite | FileAccessRandom, OpenFileCreate));
-    EXPECT_TRUE(file.Write("0123456789", 10, nullptr));
-    EXPECT_EQ(file.GetPointer(), 10u);
-    EXPECT_TRUE(file.Read(buffer, 4, &done));
-    EXPECT_EQ(done, 0u) << "at the end";
+    EXPECT_TRUE(file.Write("0123456789", 10, nullptr) && file.GetPointer() == 10);
+    EXPECT_TRUE(file.Read(buffer, 4, &done) && done == 0) << "at the end";
     EXPECT_TRUE(file.MovePointer(-3) && file.Read(buffer, 16, &done));
     EXPECT_EQ(std::string(buffer, done), "789") << "a short count at the end";
-    EXPECT_TRUE(file.SetPointer(4) && file.SetEOF() && file.Flush());
-    EXPECT_EQ(file.GetSize(), 4u);
-    EXPECT_TRUE(file.SetPointer(6) && file.SetEOF());
-    EXPECT_EQ(file.GetPointer(), 6u);
-    EXPECT_TRUE(file.Write("x", 1, &done) && file.Write(nullptr, 0, &done));
-    EXPECT_EQ(done, 0u);
+    EXPECT_FALSE(file.MovePointer(-11) || file.MovePointer(LLONG_MIN) || file.SetPointer(std::size_t{1} << 63));
+    EXPECT_TRUE(file.MovePointer(-6) && file.SetEOF() && file.Flush()) << "refused moves changed nothing";
+    EXPECT_TRUE(file.GetSize() == 4 && file.SetPointer(100) && file.GetSize() == 4) << "beyond the end";
+    EXPECT_TRUE(file.SetPointer(6) && file.SetEOF() && file.GetPointer() == 6);
+    EXPECT_TRUE(file.Write("x", 1, &done) && file.Write(nullptr, 0, &done) && done == 0);
     file.Close();
     EXPECT_EQ(Contents(path), std::string("0123\0\0x", 7)) << "the gap is zeros";
-}
-
-TEST_F(File, PositionsStayInRange) {
-    ASSERT_TRUE(file.Open(path, FileAccessWrite, OpenFileCreate) && file.Write("abc", 3, nullptr));
-    EXPECT_FALSE(file.MovePointer(-4) || file.MovePointer(LLONG_MIN));
-    EXPECT_FALSE(file.SetPointer(std::size_t{1} << 63) || file.SetPointer(kNone));
-    EXPECT_EQ(file.GetPointer(), 3u) << "refused moves change nothing";
-    EXPECT_TRUE(file.MovePointer(-3));
-    EXPECT_EQ(file.GetPointer(), 0u);
-    EXPECT_TRUE(file.SetPointer(100)) << "beyond the end";
-    EXPECT_EQ(file.GetSize(), 3u);
 }
 
 TEST_F(File, CrossesFourGiB) {
@@ -165,65 +130,46 @@ TEST_F(File, CrossesFourGiB) {
     EXPECT_TRUE(file.GetPointer() == k4GiB + 2 && file.GetSize() == k4GiB + 2);
     EXPECT_TRUE(file.MovePointer(-4) && file.Read(buffer, 8, &done));
     EXPECT_EQ(std::string(buffer, done), "edge");
-    EXPECT_TRUE(file.MovePointer(-static_cast<long long>(k4GiB)));
-    EXPECT_EQ(file.GetPointer(), 2u);
-    EXPECT_TRUE(file.SetPointer(k4GiB + 1) && file.SetEOF());
-    EXPECT_EQ(file.GetSize(), k4GiB + 1);
+    EXPECT_TRUE(file.MovePointer(-static_cast<long long>(k4GiB)) && file.GetPointer() == 2);
+    EXPECT_TRUE(file.SetPointer(k4GiB + 1) && file.SetEOF() && file.GetSize() == k4GiB + 1);
 }
 
 TEST_F(File, MovesItsHandle) {
     ASSERT_TRUE(file.Open(path, FileAccessWrite, OpenFileCreate | OpenFileTemporary));
     CFile second(std::move(file)), third;
-    EXPECT_EQ(file.GetSize(), kNone);
-    EXPECT_EQ(second.GetSize(), 0u);
+    EXPECT_TRUE(file.GetSize() == kNone && second.GetSize() == 0);
     ASSERT_TRUE(third.Open(folder / L"other", FileAccessWrite, OpenFileCreate | OpenFileTemporary));
     third = std::move(second);
-    EXPECT_FALSE(_TestFileExists(folder / L"other")) << "what it held was closed";
-    EXPECT_TRUE(_TestFileExists(path));
-    EXPECT_TRUE(third.Flush()) << "still opened for writing";
-    third.Close();
-    EXPECT_FALSE(_TestFileExists(path));
+    EXPECT_EQ(List(folder.Path()), std::vector<WideText>{L"file"}) << "what it held was closed";
+    EXPECT_TRUE(third.Flush() && third.Close() && !_TestFileExists(path)) << "still for writing, still temporary";
 }
 
 TEST_F(FileActions, TakeNamesOfEveryPlane) {
     for (const wchar_t* name : {L"Gr\u00FC\u00DFe \u20AC.txt", L"\u65E5\u672C", L"\U0001F600\U00010000\U0010FFFD.x"}) {
         Put(folder / name, "abc");
         EXPECT_EQ(List(folder.Path()), std::vector<WideText>{name});
-        EXPECT_TRUE(CFile::RenameFile(folder / name, path));
-        EXPECT_FALSE(_TestFileExists(folder / name));
-        EXPECT_TRUE(CFile::RenameFile(path, folder / name));
+        EXPECT_TRUE(CFile::RenameFile(folder / name, path) && CFile::RenameFile(path, folder / name));
         EXPECT_EQ(Contents(folder / name), "abc");
         EXPECT_TRUE(CFile::DeleteFileW(folder / name));
     }
 }
 
-TEST_F(FileActions, RenameNeverReplaces) {
-    Put(folder / L"a", "a");
-    Put(folder / L"b", "b");
-    ASSERT_TRUE(_CreateDir(folder / L"d"));
-    EXPECT_FALSE(CFile::RenameFile(folder / L"missing", path));
-    for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""})
-        EXPECT_FALSE(CFile::RenameFile(nothing, path) || CFile::RenameFile(folder / L"a", nothing));
-    EXPECT_FALSE(CFile::RenameFile(folder / L"a", folder / L"b") || CFile::RenameFile(folder / L"a", folder / L"d"));
-    EXPECT_EQ(Contents(folder / L"b"), "b");
-    EXPECT_TRUE(CFile::RenameFile(folder / L"a", folder / L"d/a"));
-    EXPECT_TRUE(CFile::RenameFile(folder / L"d", folder / L"e")) << "folders too";
-    EXPECT_EQ(Contents(folder / L"e/a"), "a");
-}
-
-TEST_F(FileActions, TellFilesFromFolders) {
-    const WideText dir = folder / L"dir", missing = folder / L"x";
-    Put(path, "");
+TEST_F(FileActions, TellFilesFromFoldersAndNeverReplace) {
+    const WideText dir = folder / L"dir", missing = folder / L"x", inside = dir + L"/file";
     EXPECT_TRUE(_CreateDir(dir));
+    Put(path, "");
+    Put(inside, "inside");
     EXPECT_FALSE(_CreateDir(dir) || _CreateDir(path) || _CreateDir(missing + L"/y")) << "one level only";
     EXPECT_TRUE(_TestFileExists(path) && _TestDirExists(dir) && _TestDirExists(dir + L"/") && _TestDirExists(L"."));
-    EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(path) || _DeleteFile(dir));
-    EXPECT_FALSE(_TestFileExists(missing) || _TestDirExists(missing) || _DeleteFile(missing));
-    for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""})
-        EXPECT_FALSE(_TestFileExists(nothing) || _TestDirExists(nothing) || _DeleteFile(nothing) ||
-                     _CreateDir(nothing));
-    EXPECT_TRUE(_DeleteFile(path));
-    EXPECT_FALSE(_TestFileExists(path));
+    EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(path) || _DeleteFile(dir) || _DeleteFile(missing));
+    EXPECT_FALSE(CFile::RenameFile(missing, dir) || CFile::RenameFile(path, inside) || CFile::RenameFile(path, dir));
+    for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""}) {
+        EXPECT_FALSE(_TestFileExists(nothing) || _TestDirExists(nothing) || _DeleteFile(nothing));
+        EXPECT_FALSE(_CreateDir(nothing) || CFile::RenameFile(nothing, missing) || CFile::RenameFile(path, nothing));
+    }
+    EXPECT_TRUE(CFile::RenameFile(dir, missing)) << "folders too";
+    EXPECT_EQ(Contents(missing + L"/file"), "inside");
+    EXPECT_TRUE(_DeleteFile(path) && !_TestFileExists(path));
 }
 
 namespace {
@@ -259,48 +205,32 @@ TEST_F(Enumeration, MatchesAsANaiveMatcherDoes) {
         EXPECT_EQ(List(folder.Path(), everything).size(), std::size(kNames)) << testing::PrintToString(everything);
 }
 
-TEST_F(Enumeration, FoldersAppearWhenAskedFor) {
-    Put(path, "12345");
-    ASSERT_TRUE(_CreateDir(folder / L"dir"));
-    for (const wchar_t* end : {L"", L"/", L"\\"})
-        EXPECT_EQ(List(folder.Path() + end), (std::vector<WideText>{L"dir", L"file"})) << "without the dots";
-    EXPECT_EQ(List(folder.Path(), L"*", false), std::vector<WideText>{L"file"});
-    EXPECT_EQ(List(nullptr), List(L".")) << "null is the current folder";
-    EXPECT_EQ(List(L""), List(L"."));
-}
-
-TEST_F(Enumeration, BeginsOnReadableFoldersOnly) {
+TEST_F(Enumeration, BeginsOnFoldersAndTellsWhatIsThere) {
     CDirectoryEnumerator listing;
     CFindData entry;
     EXPECT_FALSE(listing.GetNext(entry)) << "nothing begun";
     EXPECT_TRUE(listing.BeginEnumerate(folder.Path(), nullptr, true)) << "empty, but there";
     EXPECT_FALSE(listing.GetNext(entry) || listing.GetNext(entry));
-    Put(path, "");
-    EXPECT_TRUE(listing.BeginEnumerate(folder.Path(), L"f*", true)) << "a second begin ends the first";
-    EXPECT_TRUE(listing.GetNext(entry));
-    EXPECT_FALSE(listing.BeginEnumerate(folder / L"missing", nullptr, true) || listing.GetNext(entry));
-    EXPECT_STREQ(entry.GetFilename(), L"file") << "kept where nothing was found";
-    EXPECT_FALSE(listing.BeginEnumerate(path, nullptr, true)) << "no folder";
-    listing.EndEnumerate();
-    listing.EndEnumerate();
-}
-
-TEST_F(Enumeration, TellsSizesAndTimes) {
     Put(path, "12345");
     ASSERT_TRUE(_CreateDir(folder / L"dir"));
-    CDirectoryEnumerator listing;
-    CFindData entry;
-    ASSERT_TRUE(listing.BeginEnumerate(folder.Path(), L"file", false) && listing.GetNext(entry));
-    EXPECT_EQ(entry.GetSize(), 5u);
-    EXPECT_FALSE(entry.isDirectory() || entry.isReadOnly());
+    for (const wchar_t* end : {L"", L"/", L"\\"})
+        EXPECT_EQ(List(folder.Path() + end), (std::vector<WideText>{L"dir", L"file"})) << "without the dots";
+    EXPECT_EQ(List(folder.Path(), L"*", false), std::vector<WideText>{L"file"});
+    EXPECT_TRUE(List(nullptr) == List(L".") && List(L"") == List(L".")) << "the current folder";
+
+    ASSERT_TRUE(listing.BeginEnumerate(folder.Path(), L"d*", true) && listing.GetNext(entry));
+    EXPECT_TRUE(entry.isDirectory() && entry.GetSize() == 0);
+    ASSERT_TRUE(listing.BeginEnumerate(folder.Path(), L"f*", true) && listing.GetNext(entry)) << "ends the first";
+    EXPECT_FALSE(entry.isDirectory() || entry.isReadOnly() || entry.GetSize() != 5);
     // Milliseconds since 1970 to units of 100 ns since 1601.
     const auto now = (TAVO::Core::OS::GetTimeNow() + 11644473600000ULL) * 10000;
     constexpr unsigned long long kMinute = 600000000;
     for (const auto time : {entry.GetLastModified(), entry.GetLastAccessed(), entry.GetCreated()})
         EXPECT_TRUE(time == 0 ? time == entry.GetCreated() : time > now - kMinute && time < now + kMinute) << time;
-    ASSERT_TRUE(listing.BeginEnumerate(folder.Path(), L"dir", true) && listing.GetNext(entry));
-    EXPECT_TRUE(entry.isDirectory());
-    EXPECT_EQ(entry.GetSize(), 0u);
+    EXPECT_FALSE(listing.BeginEnumerate(folder / L"missing", nullptr, true) || listing.GetNext(entry));
+    EXPECT_STREQ(entry.GetFilename(), L"file") << "kept where nothing was found";
+    EXPECT_FALSE(listing.BeginEnumerate(path, nullptr, true)) << "no folder";
+    listing.EndEnumerate();
 }
 
 TEST_F(Enumeration, AndOpeningRunOutOfMemoryCleanly) {
@@ -310,8 +240,6 @@ TEST_F(Enumeration, AndOpeningRunOutOfMemoryCleanly) {
         EXPECT_EQ(created.GetSize(), open ? 0u : kNone);
         CDirectoryEnumerator listing;
         CFindData entry;
-        const bool begun = listing.BeginEnumerate(folder.Path(), L"a*", true);
-        EXPECT_TRUE(!begun || listing.GetNext(entry) || !open);
+        EXPECT_TRUE(!listing.BeginEnumerate(folder.Path(), L"a*", true) || listing.GetNext(entry) || !open);
     });
-    EXPECT_TRUE(_TestFileExists(folder / L"a/file"));
 }

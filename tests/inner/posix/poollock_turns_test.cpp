@@ -20,15 +20,10 @@ TEST(PoolLock, IsHandedOverToASleeper) {
     std::atomic<int> turns{0};
     const auto onOneProcessor = [](auto body) {
         return std::thread([=] {
-            cpu_set_t allowed, one;
+            cpu_set_t allowed;
             sched_getaffinity(0, sizeof allowed, &allowed);
-            CPU_ZERO(&one);
-            for (int i = 0; i < CPU_SETSIZE; ++i)
-                if (CPU_ISSET(i, &allowed)) {
-                    CPU_SET(i, &one);
-                    break;
-                }
-            sched_setaffinity(0, sizeof one, &one);
+            for (int i = 0; CPU_COUNT(&allowed) > 1; ++i) CPU_CLR(i, &allowed);
+            sched_setaffinity(0, sizeof allowed, &allowed);
             body();
         });
     };
