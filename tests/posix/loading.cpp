@@ -2,24 +2,13 @@
 
 #include <cstdio>
 #include <dlfcn.h>
-#include <string>
+#include <pthread.h>
 #include <unistd.h>
 
 namespace loading {
 
-namespace {
-
-std::string Beside(const char* name) {
-    char path[4096];
-    const auto length = readlink("/proc/self/exe", path, sizeof path);
-    const std::string self(path, length > 0 ? static_cast<std::size_t>(length) : 0);
-    return self.substr(0, self.rfind('/') + 1) + name;
-}
-
-} // namespace
-
 void* LoadPlugin() {
-    void* plugin = dlopen(Beside("TAVOTestPlugin.so").c_str(), RTLD_NOW | RTLD_LOCAL);
+    void* plugin = dlopen("TAVOTestPlugin.so", RTLD_NOW | RTLD_LOCAL); // along the program's run path
     if (!plugin) std::fprintf(stderr, "%s\n", dlerror());
     return plugin;
 }
@@ -38,6 +27,12 @@ std::size_t PrivateBytes() {
     if (!file || std::fscanf(file, "%zu %zu %zu", &size, &resident, &shared) != 3) resident = shared = 0;
     if (file) std::fclose(file);
     return (resident - shared) * static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+}
+
+std::size_t FirstFreeSlot() {
+    pthread_key_t slot = 0;
+    if (pthread_key_create(&slot, nullptr) == 0) pthread_key_delete(slot);
+    return slot;
 }
 
 } // namespace loading
