@@ -195,7 +195,6 @@ TEST(ClassRegistry, DefinitionsOutliveTheirClassAndTellTextsPieceByPiece) {
         EXPECT_EQ(capacity ? Ascii(text.data()) : "", capacity ? std::string("Blur;soft").substr(0, capacity - 1) : "");
     }
     EXPECT_TRUE(tells->GetText(acfTextNames, nullptr, 1, &needed) == acfInvalidArgument && needed == 0);
-    EXPECT_EQ(tells->GetText(static_cast<eACFDefinitionText>(3), nullptr, 0, nullptr), acfInvalidArgument);
     cacfuid id;
     EXPECT_TRUE(tells->GetIdentifier(acfIdCategory, &id.rec()) == acfOk && id == kFilters);
     EXPECT_TRUE(tells->GetIdentifier(static_cast<eACFDefinitionId>(5), &id.rec()) == acfInvalidArgument && !id);
@@ -249,8 +248,9 @@ TEST(ClassRegistry, LosesNothingWithoutMemory) {
         CPIACFUnknown object;
         EnumDefinitions list;
         COMPONENT_INFO info;
-        EXPECT_EQ(Unknown::Factory_CreateClass(Id(9), object), static_cast<bool>(object));
-        EXPECT_EQ(Unknown::Factory_GetComponentInfo(Id(9), info), Ascii(info.sName) == "Held");
+        const bool made = Unknown::Factory_CreateClass(Id(9), object);
+        const bool told = Unknown::Factory_GetComponentInfo(Id(9), info);
+        EXPECT_TRUE(made == static_cast<bool>(object) && told == (Ascii(info.sName) == "Held"));
         const bool listed = Unknown::Factory_EnumDefinitions({}, list);
         EXPECT_EQ(listed ? list->GetCount() : 0, listed && added ? 1u : 0u);
         EXPECT_EQ(Unknown::Factory_UnregisterClass(Id(9)), added);

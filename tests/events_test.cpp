@@ -214,7 +214,7 @@ TEST(Events, NeedMemoryOnlyToBeMade) {
 }
 
 TEST(Events, AssertAboutASourceAndAreSet_Intended) {
-    support::Assertions assertions;
+    const support::Assertions assertions;
     const CPEvent event(false);
     event.Set(&event);
     EXPECT_EQ(support::Assertions::Take(), support::Texts{"source/TAVO/threading,743:pSource==NULL"});

@@ -3,7 +3,6 @@
 #include "lifecycle.h"
 
 #include <gtest/gtest.h>
-#include <thread>
 #include <vector>
 
 using namespace TAVO;
@@ -24,24 +23,6 @@ TEST(Services, FailedStartStaysCountedAndTheCountWraps_Intended) {
     EXPECT_FALSE(services.Enter());
     services.Leave();
     EXPECT_TRUE(starts == 2 && stops == 2);
-}
-
-TEST(Services, OfThreadsStartAndStopInTurns) {
-    static std::atomic<int> running, faults;
-    CountedServices services({[]() noexcept { return running++ == 0 ? true : (++faults, true); },
-                              []() noexcept { faults += --running == 0 ? 0 : 1; }, []() noexcept { return false; },
-                              []() noexcept {}});
-    std::vector<std::thread> threads;
-    for (int t = 0; t < 4; ++t)
-        threads.emplace_back([&] {
-            for (int i = 0; i < 5000; ++i) {
-                services.Enter();
-                services.Leave();
-            }
-        });
-    for (auto& thread : threads) thread.join();
-    EXPECT_EQ(faults, 0);
-    EXPECT_EQ(running, 0);
 }
 
 TEST(ProcessFacts, StartupPathStartsAtTheSeparator_Intended) {
