@@ -41,10 +41,9 @@ TEST(Events, FollowANaiveModel) {
         const ulong32 ms = random() % 500 == 0;
         switch (random() % 8) {
         case 0:
-            one.event.Set(), one.set = true;
-            break;
         case 1:
-            one.event.Reset(), one.set = false;
+            one.set = random() % 2;
+            one.set ? one.event.Set() : one.event.Reset();
             break;
         case 2:
             ASSERT_EQ(one.event.Wait(ms), one.set ? 0 : WaitTimedOut) << step;
@@ -88,11 +87,10 @@ TEST(Events, NoSignalIsLostOrUsedTwice) {
         for (unsigned long long index = 0; index != kBetween + 2; used += index < kBetween + 2)
             index = several.Wait(ms);
     };
-    const std::function<void()> kinds[] = {[&] { waitFor(WaitForever); }, [&] { waitFor(1); },
-                                           [&] {
-                                               while (stop.Wait(0) != 0)
-                                                   used += (first.Wait(0) == 0) + (last.Wait(1) == 0);
-                                           }};
+    const auto poll = [&] {
+        while (stop.Wait(0) != 0) used += (first.Wait(0) == 0) + (last.Wait(1) == 0);
+    };
+    const std::function<void()> kinds[] = {[&] { waitFor(WaitForever); }, [&] { waitFor(1); }, poll};
     std::mt19937 random(2);
     for (unsigned chosen = 1; chosen < 8; ++chosen) { // every set of kinds at once
         std::vector<std::unique_ptr<Job>> jobs;

@@ -94,24 +94,16 @@ INSTANTIATE_TEST_SUITE_P(Systems, EveryFrame, testing::ValuesIn(kFacts),
                          [](const auto& info) { return info.param.name; });
 
 TEST(TimecodeRecord, BoundsOfFields) {
-    struct Row {
-        const char* name;
-        long32 hh;
-        ulong32 mm, ss, ff, sys, resulting;
-    };
-    const Row rows[] = {{"largest hours", 743, 59, 59, 24, 0, 0},
-                        {"hours too negative", -744, 0, 0, 0, 0, 0x10000},
-                        {"hours at the end of the range", INT_MIN, 0, 0, 0, 0, 0x10000},
-                        {"huge frames", 0, 0, 0, UINT_MAX, 13, 0x1000D},
-                        {"no such system, with a flag", 0, 0, 0, 0, 0x1000F, 0x30000},
-                        {"invalid beats the fields", 999, 0, 0, 0, 0x10003, 0x10003}};
-    for (const Row& row : rows) {
-        const TCINFO record(row.hh, row.mm, row.ss, row.ff, row.sys);
-        EXPECT_EQ(record.sys(), row.resulting) << row.name;
+    const std::pair<TCINFO, ulong32> rows[] = {
+        {TCINFO(743, 59, 59, 24, 0), 0},         {TCINFO(-744, 0, 0, 0, 0), kInvalid},
+        {TCINFO(INT_MIN, 0, 0, 0, 0), kInvalid}, {TCINFO(0, 0, 0, UINT_MAX, 13), kInvalid | 13},
+        {TCINFO(0, 0, 0, 0, 0x1000F), 0x30000},  {TCINFO(999, 0, 0, 0, 0x10003), 0x10003}};
+    for (const auto& [record, sys] : rows) {
+        EXPECT_EQ(record.sys(), sys);
         if (record.IsDefined()) continue;
-        EXPECT_EQ(FieldsOf(record), FieldsOf(TCINFO(0LL, row.resulting))) << row.name;
-        EXPECT_EQ(static_cast<long long>(record), 0) << row.name;
-        EXPECT_FALSE(record.GetInfo(nullptr, nullptr, nullptr, nullptr, nullptr, nullptr)) << row.name;
+        EXPECT_EQ(FieldsOf(record), FieldsOf(TCINFO(0LL, sys))) << sys;
+        EXPECT_EQ(static_cast<long long>(record), 0) << sys;
+        EXPECT_FALSE(record.GetInfo(nullptr, nullptr, nullptr, nullptr, nullptr, nullptr)) << sys;
     }
     for (const Facts& facts : kFacts) {
         EXPECT_FALSE(TCINFO(long32(0), 0, 0, facts.evenFrames, facts.sys).IsDefined()) << facts.name;

@@ -81,19 +81,6 @@ TEST(MaintenanceChoice, RunsTheMostUrgentAndAgesTheRest) {
 
 TEST(MaintenanceChoice, LowestPriorityWaitsAPassIntended) { EXPECT_EQ(Order({{kLowest, 0, 100}}, 3), ".A."); }
 
-TEST(MaintenanceChoice, WaitsForTheEarliestThatIsNotRetired) {
-    RequestList list;
-    unsigned long long due = 0;
-    EXPECT_FALSE(list.NextDue(due));
-    const CPRequest<Fake> late(0, 70, 0, '\0'), early(-5, 40, 0, '\0'), broken(0, 10, 0, 'd');
-    for (const auto* request : {&late, &early, &broken}) ASSERT_TRUE(list.Append(*request, Position(*request)));
-    EXPECT_TRUE(list.NextDue(due) && due == 40);
-    list.Take(list.Find(early, Position(early)));
-    EXPECT_TRUE(list.NextDue(due) && due == 70);
-    list.Take(list.Find(late, Position(late)));
-    EXPECT_FALSE(list.NextDue(due)) << "only the retired one is left";
-}
-
 TEST(MaintenanceChoice, ListKeepsItsOrderAndSurvivesFailingHeaps) {
     std::vector<CPRequest<Fake>> requests;
     for (int i = 0; i < 40; ++i) requests.emplace_back(0, 0ull, 0ull, '\0');
