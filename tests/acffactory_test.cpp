@@ -22,6 +22,7 @@ using TAVO::String::CPPoolString;
 namespace {
 
 using Unknown = CPIACFUnknown;
+using EnumDefinitions = CPACI<IACFEnumDefinitions>;
 
 struct ProbeObject final : CComponent<ProbeObject, IProbe> {
     int ACF_CALL Answer() override { return 5; }
@@ -89,22 +90,19 @@ struct HostFactory : FakeFactory {
 
 } // namespace
 
-TEST(Factory, IsCountedAndTheFirstStays) {
+TEST(Factory, IsCountedTheFirstStaysAndMayThrow) {
     FakeFactory first, second;
     Probe probe;
     IACFComponentFactory* out = &first;
     EXPECT_FALSE(Unknown::Factory_IsAvailable() || Unknown::Factory_Acquire(&out) || out);
     EXPECT_TRUE(Unknown::Factory_Release()) << "nothing to release";
-    EXPECT_TRUE(Unknown::Factory_Set(&first) && Unknown::Factory_Set(static_cast<IACFUnknown*>(&first)) &&
-                Unknown::Factory_Set(CPIACFUnknown(&first)));
-    EXPECT_FALSE(Unknown::Factory_Set(static_cast<IACFComponentFactory*>(nullptr)) || Unknown::Factory_Set(&second) ||
-                 Unknown::Factory_Set(static_cast<IACFUnknown*>(&second)) ||
+    first.addRefThrows = true;
+    EXPECT_FALSE(Unknown::Factory_Set(&first) || Unknown::Factory_IsAvailable());
+    first.addRefThrows = false;
+    EXPECT_TRUE(Unknown::Factory_Set(&first) && Unknown::Factory_Set(static_cast<IACFUnknown*>(&first)));
+    EXPECT_FALSE(Unknown::Factory_Set(&second) || Unknown::Factory_Set(static_cast<IACFUnknown*>(&second)) ||
                  Unknown::Factory_Set(static_cast<IACFUnknown*>(&probe)) || Unknown::Factory_Set(CPIACFUnknown()));
     EXPECT_TRUE(first.references == 2 && second.references == 1 && probe.references == 1);
-
-    EXPECT_FALSE(Unknown::Factory_Acquire(static_cast<IACFComponentFactory**>(nullptr)));
-    EXPECT_TRUE(Unknown::Factory_Acquire(&out) && out == &first);
-    out->Release();
     {
         CPACI<IACFComponentFactory> held;
         CPACI<IProbe> other(&probe);
@@ -112,27 +110,12 @@ TEST(Factory, IsCountedAndTheFirstStays) {
         EXPECT_FALSE(Unknown::Factory_Acquire(other) || other) << "not of the wrapper's type";
         EXPECT_TRUE(first.references == 3 && probe.references == 1);
     }
-    for (int left = 3; left > 0; --left) {
-        EXPECT_TRUE(Unknown::Factory_IsAvailable() && first.references == 2);
-        Unknown::Factory_Release();
-    }
-    EXPECT_FALSE(Unknown::Factory_IsAvailable());
-    EXPECT_EQ(first.references, 1);
-}
-
-TEST(Factory, MayThrowAndComeBack) {
-    FakeFactory factory;
-    IACFComponentFactory* out = &factory;
-    factory.addRefThrows = true;
-    EXPECT_FALSE(Unknown::Factory_Set(&factory) || Unknown::Factory_IsAvailable());
-    factory.addRefThrows = false;
-    EXPECT_TRUE(Unknown::Factory_Set(&factory));
-    factory.addRefThrows = true;
+    first.addRefThrows = true;
     EXPECT_FALSE(Unknown::Factory_Acquire(&out) || out);
-    factory.releaseThrows = true;
-    factory.onRelease = [] { EXPECT_FALSE(Unknown::Factory_IsAvailable()); };
-    EXPECT_TRUE(Unknown::Factory_Release());
-    EXPECT_EQ(factory.references, 1);
+    first.releaseThrows = true;
+    first.onRelease = [] { EXPECT_FALSE(Unknown::Factory_IsAvailable()); };
+    EXPECT_TRUE(Unknown::Factory_Release() && Unknown::Factory_IsAvailable() && first.references == 2);
+    EXPECT_TRUE(Unknown::Factory_Release() && !Unknown::Factory_IsAvailable() && first.references == 1);
 }
 
 TEST(ClassRegistry, KeepsTheFirstAndTakesTheSameAgain) {
@@ -148,21 +131,16 @@ TEST(ClassRegistry, KeepsTheFirstAndTakesTheSameAgain) {
         EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(9)));
         EXPECT_FALSE(Unknown::Factory_UnregisterClass(Id(9)) || Unknown::Factory_CreateClass(Id(9), out) || out);
     }
-}
-
-TEST(ClassRegistry, NamesAreMandatory) {
     static std::string line;
-    TAVO::Develop::SetExternalLogger([](_acfDebugLevel level, const wchar_t* category, const char* source,
-                                        TAVO::long32 number, const wchar_t* format, std::va_list arguments) {
-        line += std::to_string(level) + ' ' + Ascii(category) + ' ' + source + ' ' + std::to_string(number) + ' ' +
-                Ascii(format) + ' ' + Ascii(va_arg(arguments, const wchar_t*)) + '\n';
+    TAVO::Develop::SetExternalLogger([](_acfDebugLevel level, const wchar_t*, const char* source, TAVO::long32 number,
+                                        const wchar_t* format, std::va_list arguments) {
+        line += std::to_string(level) + ' ' + source + ' ' + std::to_string(number) + ' ' + Ascii(format) + ' ' +
+                Ascii(va_arg(arguments, const wchar_t*));
     });
-    EXPECT_FALSE(Unknown::Factory_RegisterClass(Id(9), kFilters, CPPoolString(), MakeProbe) ||
-                 Unknown::Factory_RegisterClass(Id(9), kFilters, L"", MakeProbe));
+    EXPECT_FALSE(Unknown::Factory_RegisterClass(Id(9), kFilters, L"", MakeProbe));
     TAVO::Develop::SetExternalLogger(nullptr);
-    const std::string one = "1 TAVO source/TAVO/CPACF 645 Factory_RegisterClass: ClassNames are mandatory! %ls "
-                            "00000009-0000-0000-0100-000000000000\n";
-    EXPECT_EQ(line, one + one);
+    EXPECT_EQ(line, "1 source/TAVO/CPACF 645 Factory_RegisterClass: ClassNames are mandatory! %ls "
+                    "00000009-0000-0000-0100-000000000000");
 }
 
 TEST(ClassRegistry, CreatesFindsAndEnumerates) {
@@ -175,33 +153,28 @@ TEST(ClassRegistry, CreatesFindsAndEnumerates) {
         EXPECT_EQ(out ? out->Answer() : 0, number == 3 ? 5 : 0);
         EXPECT_FALSE(Unknown::Factory_CreateClass(Id(number), other) || other || probe.references != 1);
     }
-    const struct {
-        const wchar_t* name;
-        std::uint32_t number;
-    } names[] = {{L"blur", 3},   {L"SOFT", 3},     {L"reel", 1},  {L"Sharpen", 2}, {L"odd", 4},
-                 {L"Sharpe", 0}, {L"Sharpens", 0}, {L"Blur;", 0}, {L"", 0},        {nullptr, 0}};
-    for (const auto& row : names) {
+    const std::pair<const wchar_t*, std::uint32_t> names[] = {
+        {L"blur", 3},   {L"SOFT", 3},     {L"reel", 1},  {L"Sharpen", 2}, {L"odd", 4},
+        {L"Sharpe", 0}, {L"Sharpens", 0}, {L"Blur;", 0}, {L"", 0},        {nullptr, 0}};
+    for (const auto& [name, number] : names) {
         cacfuid found = Id(8);
-        EXPECT_EQ(Unknown::Factory_FindClass(row.name, found), row.number != 0) << Ascii(row.name);
-        EXPECT_EQ(found, row.number ? Id(row.number) : cacfuid()) << Ascii(row.name);
+        EXPECT_EQ(Unknown::Factory_FindClass(name, found), number != 0) << Ascii(name);
+        EXPECT_EQ(found, number ? Id(number) : cacfuid()) << Ascii(name);
     }
-    const struct {
-        cacfuid category;
-        const char* names;
-    } lists[] = {{kFilters, "Blur;soft Sharpen "},
-                 {kReaders, "Reel;Soft "},
-                 {Id(0xF3), ""},
-                 {{}, "Blur;soft Reel;Soft Sharpen ;Odd; "}};
-    for (const auto& row : lists) {
-        CPACI<IACFEnumDefinitions> list;
-        ASSERT_TRUE(Unknown::Factory_EnumDefinitions(row.category, list));
-        EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(6), row.category, L"Late", MakeProbe));
+    const std::pair<cacfuid, const char*> lists[] = {{kFilters, "Blur;soft Sharpen "},
+                                                     {kReaders, "Reel;Soft "},
+                                                     {Id(0xF3), ""},
+                                                     {{}, "Blur;soft Reel;Soft Sharpen ;Odd; "}};
+    for (const auto& [category, expected] : lists) {
+        EnumDefinitions list;
+        ASSERT_TRUE(Unknown::Factory_EnumDefinitions(category, list));
+        EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(6), category, L"Late", MakeProbe));
         for (int round = 0; round < 2; ++round) {
-            EXPECT_EQ(Names(*list.Get()), row.names);
+            EXPECT_EQ(Names(*list.Get()), expected);
             EXPECT_EQ(Names(*list.Get()), "") << "at its end";
             EXPECT_EQ(list->Reset(), acfOk);
         }
-        EXPECT_EQ(list->GetCount(), std::count(row.names, row.names + std::strlen(row.names), ' '));
+        EXPECT_EQ(list->GetCount(), std::count(expected, expected + std::strlen(expected), ' '));
         EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(6)));
     }
 }
@@ -221,9 +194,7 @@ TEST(ClassRegistry, DefinitionsOutliveTheirClassAndTellTextsPieceByPiece) {
         EXPECT_EQ(needed, 10u);
         EXPECT_EQ(capacity ? Ascii(text.data()) : "", capacity ? std::string("Blur;soft").substr(0, capacity - 1) : "");
     }
-    EXPECT_TRUE(tells->GetText(acfTextVendor, nullptr, 0, &needed) == acfEnd && needed == 1);
     EXPECT_TRUE(tells->GetText(acfTextNames, nullptr, 1, &needed) == acfInvalidArgument && needed == 0);
-    EXPECT_EQ(tells->GetText(static_cast<eACFDefinitionText>(3), nullptr, 0, nullptr), acfInvalidArgument);
     cacfuid id;
     EXPECT_TRUE(tells->GetIdentifier(acfIdCategory, &id.rec()) == acfOk && id == kFilters);
     EXPECT_TRUE(tells->GetIdentifier(static_cast<eACFDefinitionId>(5), &id.rec()) == acfInvalidArgument && !id);
@@ -238,11 +209,9 @@ TEST(ClassRegistry, ComponentInformation) {
     EXPECT_TRUE(info.uidClass == Id(3) && info.uidCategory == kFilters && Ascii(info.sName) == "Blur");
     EXPECT_FALSE(info.uidVendor || info.sVendor || info.uidModule || info.sModule || info.uidInterface);
     EXPECT_FALSE(Unknown::Factory_GetComponentInfo(Id(5), info) || info.uidClass || info.sName);
-    EXPECT_EQ(Assertions::Take(), Texts());
     --info.sSizeStruct;
     info.uidClass = Id(2);
-    EXPECT_FALSE(Unknown::Factory_GetComponentInfo(Id(3), info));
-    EXPECT_EQ(info.uidClass, Id(2)) << "a record of another size is not touched";
+    EXPECT_FALSE(Unknown::Factory_GetComponentInfo(Id(3), info) || info.uidClass != Id(2)) << "not touched";
     EXPECT_EQ(Assertions::Take(), Texts{"source/TAVO/CPACF,554:CompInfo.sSizeStruct != sizeof(COMPONENT_INFO)"});
 }
 
@@ -260,7 +229,7 @@ TEST(ClassRegistry, AsksTheFactoryThatKnowsDefinitions) {
         host.registry.throws = throws;
         EXPECT_EQ(Unknown::Factory_FindClass(L"Reel", found), !throws);
         EXPECT_EQ(found, throws ? cacfuid() : Id(77));
-        CPACI<IACFEnumDefinitions> list;
+        EnumDefinitions list;
         COMPONENT_INFO info;
         EXPECT_FALSE(Unknown::Factory_EnumDefinitions({}, list) || Unknown::Factory_GetComponentInfo(Id(1), info));
     }
@@ -277,12 +246,12 @@ TEST(ClassRegistry, LosesNothingWithoutMemory) {
     support::ForEachFailingAllocation([&] {
         const bool added = Unknown::Factory_RegisterClass(Id(9), kFilters, names, MakeProbe);
         CPIACFUnknown object;
-        CPACI<IACFEnumDefinitions> list;
+        EnumDefinitions list;
         COMPONENT_INFO info;
         const bool made = Unknown::Factory_CreateClass(Id(9), object);
-        const bool listed = Unknown::Factory_EnumDefinitions({}, list);
         const bool told = Unknown::Factory_GetComponentInfo(Id(9), info);
         EXPECT_TRUE(made == static_cast<bool>(object) && told == (Ascii(info.sName) == "Held"));
+        const bool listed = Unknown::Factory_EnumDefinitions({}, list);
         EXPECT_EQ(listed ? list->GetCount() : 0, listed && added ? 1u : 0u);
         EXPECT_EQ(Unknown::Factory_UnregisterClass(Id(9)), added);
     });
@@ -295,7 +264,7 @@ TEST(ClassRegistry, ServesThreadsAtOnce) {
             for (int round = 0; round < 200; ++round) {
                 EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(number), kFilters, L"Same", MakeProbe));
                 CPACI<IProbe> object;
-                CPACI<IACFEnumDefinitions> list;
+                EnumDefinitions list;
                 cacfuid found;
                 EXPECT_TRUE(Unknown::Factory_CreateClass(Id(number), object));
                 EXPECT_TRUE(Unknown::Factory_FindClass(L"same", found));

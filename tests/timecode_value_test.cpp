@@ -18,14 +18,7 @@ constexpr double kNan = std::numeric_limits<double>::quiet_NaN();
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
 // Count and word, for comparing values whole: operator== takes any two invalid values for equal.
-struct Whole {
-    long long count;
-    ulong32 sys;
-    bool operator==(const Whole& o) const { return count == o.count && sys == o.sys; }
-    friend std::ostream& operator<<(std::ostream& out, const Whole& w) {
-        return out << w.count << " sys 0x" << std::hex << w.sys << std::dec;
-    }
-};
+using Whole = std::pair<long long, ulong32>;
 Whole Of(const timecode& t) { return {static_cast<long long>(t), t.sys()}; }
 
 struct ResultRow {
@@ -43,86 +36,67 @@ const timecode kBroken(7LL, kInvalid);
 } // namespace
 
 TEST(Timecode, Construction) {
-    Check({{"one field", T(1, 0), {24, 0}},
-           {"one second of longer units", T(1.0, 1), {1199, 1}},
+    Check({{"one second of longer units", T(1.0, 1), {1199, 1}},
            {"half a unit", T(0.5 / 1200, 0), {1, 0}},
-           {"minus half a unit", T(-0.5 / 1200, 0), {-1, 0}},
            {"seconds below the range", T(-kInfinity, 0), {-LLONG_MAX, 0}},
            {"not a number", T(kNan, 3), {0, kInvalid}},
            {"unassigned has no count", T(5LL, kUnassigned | 3), {0, kUnassigned | 3}},
-           {"no such system", T(5LL, 15), {0, kUnassigned}},
            {"an invalid count stays", T(5LL, kInvalid | 3), {5, kInvalid | 3}},
            {"invalid fields have none", T(5, kInvalid | 3), {0, kInvalid | 3}},
            {"from a skipped label", T(0, 1, 0, 1, 2), {0, kInvalid | 2}}});
 }
 
-TEST(Timecode, Conversions) {
+TEST(Timecode, ConversionsWithUnsignedUnitsIntended) {
     const timecode back(-49LL, 0);
     EXPECT_TRUE(long32(T(12LL, 0)) == 1 && double(T(1200LL, 4)) == 1200 * (1.001 / 1200.0));
     EXPECT_TRUE(static_cast<long long>(kBroken) == 7 && double(kBroken) == 0 && kBroken.Frames(0, 0) == 0);
     EXPECT_TRUE(back.Frames(0, 1) == -2 && back.Frames(0, 0) == -1 && back.Frames(14, 0) == 0);
     EXPECT_EQ(T(72LL, 0).Frames(0, 0), 2) << "halves away from zero";
     EXPECT_EQ(T(LLONG_MIN, 0).Frames(0, 1), static_cast<long32>(0 - ((1ULL << 63) + 47) / 48));
+    EXPECT_EQ(T(-48LL, 0).Frames(0, -1), static_cast<long32>((0ULL - 48) / 48));
     EXPECT_TRUE(!kNothing && kNothing.IsDefined() && !!kBroken);
 }
 
-TEST(Timecode, UnsignedUnitsIntended) { EXPECT_EQ(T(-48LL, 0).Frames(0, -1), static_cast<long32>((0ULL - 48) / 48)); }
-
-TEST(Timecode, AddingAndSubtracting) {
-    const timecode pal(48LL, 0), film(100LL, 3);
+TEST(Timecode, Arithmetic) {
+    const timecode pal(48LL, 0), film(100LL, 3), bottom(LLONG_MIN, 3);
     Check({{"keeps the left system", pal + film, {148, 0}},
-           {"base units", pal - 1LL, {47, 0}},
            {"fields on the left", 1 + pal, {72, 0}},
            {"too many fields", pal + INT_MAX, {48, kInvalid}},
            {"not a number", pal - kNan, {48, kInvalid}},
            {"unassigned left", kNothing + film, {100, 3}},
-           {"unassigned right", film + kNothing, {100, 3}},
            {"unassigned left of minus", kNothing - film, {0, kUnassigned}},
            {"invalid right", film + kBroken, {100, kInvalid | 3}},
            {"invalid left", kBroken + film, {107, kInvalid}},
-           {"invalid left of minus", kBroken - film, {7, kInvalid}},
            {"beyond the top", T(LLONG_MAX, 3) + 1LL, {LLONG_MIN, kInvalid | 3}},
-           {"beyond the bottom", T(LLONG_MIN, 3) - 1LL, {LLONG_MAX, kInvalid | 3}},
-           {"negated bottom", -T(LLONG_MIN, 3), {LLONG_MIN, kInvalid | 3}},
-           {"magnitude of the bottom", tcabs(T(LLONG_MIN, 3)), {LLONG_MIN, kInvalid | 3}}});
+           {"negated bottom", -bottom, {LLONG_MIN, kInvalid | 3}},
+           {"magnitude of the bottom", tcabs(bottom), {LLONG_MIN, kInvalid | 3}},
+           {"over, truncating", -film / 3, {-33, 3}},
+           {"over zero", film / 0, {0, kInvalid}},
+           {"bottom over minus one", bottom / -1, {LLONG_MIN, kInvalid | 3}},
+           {"times a double", film * 0.555, {56, 3}},
+           {"Intended: 0.5 is added to negative results too", -pal * 1.0, {-47, 0}},
+           {"over the least double", film / 0.000001, {100000000, 3}},
+           {"times infinity", film * kInfinity, {LLONG_MAX, kInvalid | 3}},
+           {"scaled half up", T::Scale(film, 1, 8, true), {13, 3}},
+           {"scaled by a negative denominator", T::Scale(film, 1, -8, true), {-13, 3}},
+           {"scaled by the least denominator", T::Scale(film, 1, INT_MIN, true), {0, 3}},
+           {"scaled beyond it", T::Scale(T(2147483648LL, 3), 1, 1, false), {2147483648, kInvalid | 3}},
+           {"scaled bottom", T::Scale(bottom, 1, -1, false), {LLONG_MIN, kInvalid | 3}}});
+    EXPECT_TRUE(film / T(50LL, 0) == 2.0 && film / T(0LL, 0) == 1e300 && film / kBroken == 1e300);
     timecode t = film;
     EXPECT_EQ(Of(t++), Of(film));
     EXPECT_EQ(Of(++t), (Whole{200, 3}));
     EXPECT_EQ(Of(--t), (Whole{150, 3}));
-    EXPECT_EQ(Of(t--), (Whole{150, 3}));
     const timecode& same = t;
     t -= same;
     EXPECT_EQ(Of(t), (Whole{0, 3}));
-    timecode end(LLONG_MAX, 3);
-    EXPECT_EQ(Of(++ ++end), (Whole{LLONG_MIN + 49, kInvalid | 3}));
 }
 
-TEST(Timecode, Scaling) {
-    const timecode t(100LL, 3), bottom(LLONG_MIN, 3);
-    Check({{"over, truncating", T(-100LL, 3) / 3, {-33, 3}},
-           {"over zero", t / 0, {0, kInvalid}},
-           {"bottom over minus one", bottom / -1, {LLONG_MIN, kInvalid | 3}},
-           {"times a double", t * 0.555, {56, 3}},
-           {"over the least double", t / 0.000001, {100000000, 3}},
-           {"over a smaller double", t / 0.0000009, {0, kInvalid}},
-           {"over not-a-number", t / kNan, {0, kInvalid}},
-           {"times infinity", t * kInfinity, {LLONG_MAX, kInvalid | 3}},
-           {"scaled half up", T::Scale(t, 1, 8, true), {13, 3}},
-           {"scaled by a negative denominator", T::Scale(t, 1, -8, true), {-13, 3}},
-           {"scaled by the least denominator", T::Scale(t, 1, INT_MIN, true), {0, 3}},
-           {"scaled over zero", T::Scale(t, 1, 0, true), {0, kInvalid | 3}},
-           {"scaled beyond it", T::Scale(T(2147483648LL, 3), 1, 1, false), {2147483648, kInvalid | 3}},
-           {"scaled bottom", T::Scale(bottom, 1, -1, false), {LLONG_MIN, kInvalid | 3}}});
-    EXPECT_TRUE(t / T(50LL, 0) == 2.0 && t / T(0LL, 0) == 1e300 && t / kBroken == 1e300);
-    EXPECT_EQ(Of(T(-48LL, 0) * 1.0), (Whole{-47, 0})) << "Intended: 0.5 is added to negative results too";
-}
-
-TEST(Timecode, Order) {
+TEST(Timecode, OrderIntended) {
     const timecode one(1LL, 0), two(2LL, 3), broken2(9LL, kInvalid | 3);
     EXPECT_TRUE(one < two && two > one && one <= two && two >= one && one != two);
     EXPECT_TRUE(one != T(1LL, 3) && one <= T(1LL, 3) && one >= T(1LL, 3));
     EXPECT_TRUE(kBroken > two && two < kBroken && !(kBroken <= two) && !(two >= kBroken));
-    EXPECT_TRUE(one == 1LL && 1LL == one && one < 1 && 0 < T(24LL, 0) && T(24LL, 0) == 1);
     EXPECT_TRUE(T(1200LL, 0) == 1.0 && 2.0 >= T(1200LL, 0) && T(1200LL, 0) != 1.5);
     EXPECT_TRUE(kBroken == 7LL && kBroken == 0 && kBroken == 0.0);
     // Intended: two invalid values are equal, and each is less than the other.
@@ -134,10 +108,10 @@ TEST(Timecode, RoundingToFramesIntended) {
     struct Row {
         long long count, aligned, trunced, roofed;
     };
-    const Row rows[] = {{0, 0, 0, 0},       {1, 0, 0, 48},      {23, 0, 0, 48},      {24, 48, 0, 48},
-                        {47, 48, 0, 48},    {48, 48, 48, 48},   {49, 48, 48, 96},    {-1, 0, 0, 48},
-                        {-23, 0, 0, 48},    {-24, -48, 0, 48},  {-47, -48, 0, 48},   {-48, -48, -48, -48},
-                        {-49, -48, -96, 0}, {-72, -96, -96, 0}, {-96, -96, -96, -96}};
+    const Row rows[] = {{0, 0, 0, 0},       {1, 0, 0, 48},       {23, 0, 0, 48},       {24, 48, 0, 48},
+                        {47, 48, 0, 48},    {48, 48, 48, 48},    {49, 48, 48, 96},     {-1, 0, 0, 48},
+                        {-23, 0, 0, 48},    {-24, -48, 0, 48},   {-48, -48, -48, -48}, {-49, -48, -96, 0},
+                        {-72, -96, -96, 0}, {-96, -96, -96, -96}};
     for (const Row& row : rows) {
         const timecode t(row.count, 0);
         EXPECT_EQ(Of(t.Aligned()), (Whole{row.aligned, 0})) << row.count;
@@ -154,25 +128,32 @@ TEST(Timecode, RoundingToFramesIntended) {
            {"trunc at the bottom", T::Trunc(T(LLONG_MIN, 0)), {-top, kInvalid}},
            {"roof at the top", T::Roof(T(LLONG_MAX, 0)), {top, kInvalid}},
            {"smallest frame", T::GetMinFrame(0), {-top, 0}},
-           {"largest frame of no system", T::GetMaxFrame(14), {0, kUnassigned}},
            {"align to an unassigned system", T(47LL, 0).AlignedToSystem(kUnassigned | 3), {0, kUnassigned | 3}},
            {"roof to an invalid system", T(1LL, 0).RoofedToSystem(kInvalid | 3), {1, kInvalid | 3}},
-           {"down", T(24LL, 6).Downconverted(-1), {0, 0}},
            {"up, flagged", T(49LL, kInvalid | 1).Upconverted(0), {49, kInvalid | 7}},
            {"re-timed", T(120000LL, 1).XlatedToSystem(0), {120120, 0}},
-           {"re-timed between equal units", T(LLONG_MAX, 1).XlatedToSystem(8), {LLONG_MAX, 8}},
            {"re-timed out of range", T(LLONG_MIN, 1).XlatedToSystem(0), {-LLONG_MAX, kInvalid}},
            {"re-timed, flagged", kBroken.XlatedToSystem(3), {7, kInvalid | 3}}});
-    EXPECT_FALSE(T(0LL, 0).AssertAlignedToSystem(kUnassigned));
-    EXPECT_FALSE(kBroken.AssertAlignedToSystem(0));
+    EXPECT_FALSE(T(0LL, 0).AssertAlignedToSystem(kUnassigned) || kBroken.AssertAlignedToSystem(0));
 }
 
-TEST(Timecode, Days) {
-    Check({{"clip a negative", T(-103680048LL, 0).Clipped(), {-48, 0}},
-           {"clip at the bottom", T(LLONG_MIN, 3).Clipped(), {-(LLONG_MAX % 103680000 / 50 * 50), 3}},
+TEST(Timecode, DaysAndChoices) {
+    const long long day = 103680000;
+    const timecode lo(1000LL, 0), hi(2000LL, 3);
+    Check({{"clip a negative", T(-day - 48, 0).Clipped(), {-48, 0}},
+           {"clip at the bottom", T(LLONG_MIN, 3).Clipped(), {-(LLONG_MAX % day / 50 * 50), 3}},
            {"wrap drop frame", T(-40LL, 2).Wrapped(), {103576280, 2}},
-           {"wrap a whole day", T(-103680000LL, 0).Wrapped(), {0, 0}},
-           {"unassign to a system", T(5LL, 3).Unassign(kInvalid | 4), {0, kUnassigned | 4}}});
+           {"unassign to a system", T(5LL, 3).Unassign(kInvalid | 4), {0, kUnassigned | 4}},
+           {"at the bound", T::Bias(T(2000LL, 1), lo, hi), {2000, 1}},
+           {"folded from below", T::Bias(T(1480 - day, 0), lo, hi), {1480, 0}},
+           {"above", T::Bias(T(2041LL, 1), lo, hi), {2000, 3}},
+           {"invalid", T::Bias(kBroken, lo, hi), {2000, 3}},
+           {"unassigned bound", T::Bias(T(5LL, 1), kNothing, hi), {5, 1}},
+           {"nearer to b", T::RoundTo(T(1501LL, 1), lo, hi), {2000, 3}},
+           {"as near", T::RoundTo(T(1500LL, 1), hi, lo), {2000, 3}},
+           {"unassigned", T::RoundTo(kNothing, lo, hi), {0, kUnassigned}}});
+    timecode own(3000LL, 0);
+    EXPECT_EQ(Of(own.Bias(lo, own)), (Whole{3000, 0}));
 }
 
 TEST(Timecode, SlippingByFieldsIntended) {
@@ -182,55 +163,29 @@ TEST(Timecode, SlippingByFieldsIntended) {
         EXPECT_EQ(Of(T::GetMaxTC(sys)), (Whole{steps[sys], steps[sys] ? sys : kInvalid}));
         EXPECT_EQ(Of(T(7LL, sys).Slipped(-2)), (Whole{7 - 2 * steps[sys], steps[sys] ? sys : kInvalid | sys}));
     }
-    EXPECT_EQ(Of(T::GetMaxTC(kUnassigned | 2)), (Whole{0, kUnassigned | 2}));
     EXPECT_EQ(Of(T::Slip(T(0LL, kUnassigned | 2), 1)), (Whole{0, kUnassigned | 2}));
     EXPECT_EQ(Of(kBroken.Slipped(1)), (Whole{7, kInvalid}));
     EXPECT_EQ(T(LLONG_MIN, 12).Slipped(INT_MIN).sys(), kInvalid | 12);
 }
 
-TEST(Timecode, Choosing) {
-    const long long day = 103680000;
-    const timecode lo(1000LL, 0), hi(2000LL, 3);
-    Check({{"at the bound", T::Bias(T(2000LL, 1), lo, hi), {2000, 1}},
-           {"folded from above", T::Bias(T(day + 1480, 0), lo, hi), {1480, 0}},
-           {"folded from below", T::Bias(T(1480 - day, 0), lo, hi), {1480, 0}},
-           {"above", T::Bias(T(2041LL, 1), lo, hi), {2000, 3}},
-           {"invalid", T::Bias(kBroken, lo, hi), {2000, 3}},
-           {"unassigned bound", T::Bias(T(5LL, 1), kNothing, hi), {5, 1}},
-           {"nearer to b", T::RoundTo(T(1501LL, 1), lo, hi), {2000, 3}},
-           {"as near", T::RoundTo(T(1500LL, 1), hi, lo), {2000, 3}},
-           {"neither", T::RoundTo(T(5LL, 1), kNothing, kNothing), {5, 1}},
-           {"unassigned", T::RoundTo(kNothing, lo, hi), {0, kUnassigned}}});
-    timecode own(3000LL, 0);
-    EXPECT_EQ(Of(own.Bias(lo, own)), (Whole{3000, 0}));
-}
-
-TEST(TimecodeSystem, FactsOfTheTable) {
-    const char* names[] = {"PAL",    "NTSC",       "NTSC(DF)", "FILM",     "HDFILM",   "HDFILM(DF)", "HD50",
-                           "HDNTSC", "HDNTSC(DF)", "PAL(PX)",  "NTSC(PX)", "FILM(PX)", "HD30",       "HD60"};
+TEST(TimecodeSystem, FactsOfTheTableIntended) {
+    const wchar_t* names[] = {L"PAL",    L"NTSC",       L"NTSC(DF)", L"FILM",     L"HDFILM",   L"HDFILM(DF)", L"HD50",
+                              L"HDNTSC", L"HDNTSC(DF)", L"PAL(PX)",  L"NTSC(PX)", L"FILM(PX)", L"HD30",       L"HD60"};
     constexpr double kPal = 25.0, kNtsc = 29.97002997002997, kFilm = 23.976023976023978;
     const double rates[] = {kPal, kNtsc, kNtsc, 24, kFilm, kFilm, 2 * kPal, 2 * kNtsc, 2 * kNtsc, 12.5, 15, 12, 30, 60};
     for (ulong32 sys = 0; sys < 14; ++sys) {
-        std::string name;
-        for (const wchar_t* c = T::GetSystemString(sys); *c; ++c) name += static_cast<char>(*c);
-        EXPECT_EQ(name, names[sys]);
+        EXPECT_STREQ(T::GetSystemString(sys), names[sys]);
         EXPECT_EQ(T::FramerateOf(sys), rates[sys]);
-        const bool slow = sys == 1 || sys == 2 || sys == 4 || sys == 5 || sys == 7 || sys == 8;
+        const bool slow = std::fmod(rates[sys], 1) > 0.6;
         EXPECT_EQ(T(0LL, sys).BULen(), slow ? 1.001 / 1200.0 : 1 / 1200.0);
         EXPECT_EQ(T::GetFrameBU(sys), 2 * T::GetFieldBU(sys));
+        const bool drop = sys == 2 || sys == 5 || sys == 8, plain = sys == 1 || sys == 4 || sys == 7;
+        EXPECT_EQ(T::GetDFSystem(sys), plain ? sys + 1 : kUnassigned);
+        EXPECT_EQ(T::GetNDFSystem(sys), drop ? sys - 1 : kUnassigned);
+        EXPECT_EQ(T::IsDFSystem(sys), drop || sys == 9) << "Intended: PAL(PX), too";
     }
-    EXPECT_EQ(*T::GetSystemString(14), L'\0');
-    EXPECT_EQ(T::NormalizeSystem(0x1000E), 0x30000u);
-
-    const ulong32 pairs[][2] = {{1, 2}, {4, 5}, {7, 8}};
-    for (const auto& [plain, drop] : pairs) {
-        EXPECT_TRUE(T::GetDFSystem(plain) == drop && T::GetDFSystem(drop) == kUnassigned);
-        EXPECT_TRUE(T::GetNDFSystem(drop) == plain && T::GetNDFSystem(plain) == kUnassigned);
-        EXPECT_TRUE(T::IsDFSystem(drop) && !T::IsDFSystem(plain));
-    }
-    EXPECT_TRUE(T::IsDFSystem(9)) << "Intended";
-    EXPECT_FALSE(T::IsDFSystem(0x10002));
-    EXPECT_TRUE(T(0LL, 0x10002).IsDFSystem());
+    EXPECT_TRUE(*T::GetSystemString(14) == 0 && T::NormalizeSystem(0x1000E) == 0x30000);
+    EXPECT_TRUE(!T::IsDFSystem(0x10002) && T(0LL, 0x10002).IsDFSystem());
 }
 
 TEST(TimecodeSystem, RateLookUpIntended) {
@@ -246,8 +201,6 @@ TEST(TimecodeSystem, RateLookUpIntended) {
     for (const auto& [num, den, sys] : fractions) EXPECT_EQ(T::GetTCSystemOf(num, den), sys) << num << "/" << den;
 
     ulong32 list[14] = {};
-    EXPECT_EQ(T::GetFramerateTCList(list, 3), 3u);
-    EXPECT_EQ(list[3], 0u);
-    EXPECT_EQ(T::GetFramerateTCList(list, 99), 14u);
+    EXPECT_TRUE(T::GetFramerateTCList(list, 3) == 3 && list[3] == 0 && T::GetFramerateTCList(list, 99) == 14);
     for (std::size_t i = 1; i < 14; ++i) EXPECT_LE(T::FramerateOf(list[i - 1]), T::FramerateOf(list[i]));
 }

@@ -19,81 +19,57 @@ using Input = std::vector<std::uint8_t>;
 constexpr int kMutations = 4000;
 constexpr std::size_t kLongest = 65536;
 
-Input ReadInput(const std::filesystem::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    return Input(std::istreambuf_iterator<char>(file), {});
-}
-
 void Run(const Input& input) {
     const Input exact(input); // capacity equals size, so that a sanitizer sees the end
     LLVMFuzzerTestOneInput(exact.data(), exact.size());
 }
 
-class Mutator {
-public:
-    void Mutate(Input& input, const std::vector<Input>& seeds) {
-        for (std::uint32_t times = 1 + Below(4); times; --times) MutateOnce(input, seeds);
-        if (input.size() > kLongest) input.resize(kLongest);
-    }
-    std::uint32_t Below(std::size_t limit) { return limit ? m_random() % static_cast<std::uint32_t>(limit) : 0; }
+Input RunFile(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    const Input input(std::istreambuf_iterator<char>(file), {});
+    Run(input);
+    return input;
+}
 
-private:
-    void MutateOnce(Input& input, const std::vector<Input>& seeds) {
-        const std::size_t at = Below(input.size() + 1), left = input.size() - at;
-        const auto place = input.begin() + static_cast<std::ptrdiff_t>(at);
-        const auto some = static_cast<std::ptrdiff_t>(std::min<std::size_t>(left, 1 + Below(8)));
-        const auto random = static_cast<std::uint8_t>(m_random());
-        switch (Below(6)) {
-        case 0: // flip a bit
-            if (left) *place ^= static_cast<std::uint8_t>(1u << Below(8));
-            break;
-        case 1: // another byte
-            if (left) *place = random;
-            break;
-        case 2: // a byte more
-            input.insert(place, random);
-            break;
-        case 3: // some bytes less
-            input.erase(place, place + some);
-            break;
-        case 4: { // some bytes twice
-            const Input copy(place, place + some);
-            input.insert(place, copy.begin(), copy.end());
-            break;
-        }
-        default: { // the rest of another seed
-            const Input& other = seeds[Below(seeds.size())];
-            const auto from = static_cast<std::ptrdiff_t>(Below(other.size() + 1));
-            input.resize(at);
-            input.insert(input.end(), other.begin() + from, other.end());
-        }
-        }
-    }
+std::mt19937 g_random{1};
+std::ptrdiff_t Below(std::size_t limit) { return g_random() % static_cast<std::uint32_t>(limit); }
 
-    std::mt19937 m_random{1};
-};
+void Mutate(Input& input, const Input& other) {
+    const auto place = input.begin() + Below(input.size() + 1);
+    const auto behind = place + std::min<std::ptrdiff_t>(input.end() - place, 1 + Below(8));
+    switch (Below(4)) {
+    case 0: // flip a bit
+        if (place != behind) *place ^= static_cast<std::uint8_t>(1u << Below(8));
+        break;
+    case 1: // a byte more
+        input.insert(place, static_cast<std::uint8_t>(g_random()));
+        break;
+    case 2: // some bytes less
+        input.erase(place, behind);
+        break;
+    default: // the rest of another seed
+        input.erase(place, input.end());
+        input.insert(input.end(), other.begin() + Below(other.size() + 1), other.end());
+    }
+}
 
 } // namespace
 
 int main(int argc, char** argv) {
-    for (int i = 1; i < argc; ++i) Run(ReadInput(argv[i]));
+    for (int i = 1; i < argc; ++i) RunFile(argv[i]);
     if (argc > 1) return 0;
 
     std::vector<std::filesystem::path> paths;
-    for (const auto& entry : std::filesystem::directory_iterator(TAVO_CORPUS))
-        if (entry.is_regular_file()) paths.push_back(entry.path());
+    for (const auto& entry : std::filesystem::directory_iterator(TAVO_CORPUS)) paths.push_back(entry.path());
     std::sort(paths.begin(), paths.end());
     std::vector<Input> seeds;
-    for (const auto& path : paths) seeds.push_back(ReadInput(path));
-    if (seeds.empty()) {
-        std::fprintf(stderr, "no seeds in %s\n", TAVO_CORPUS);
-        return 1;
-    }
-    for (const Input& seed : seeds) Run(seed);
-    Mutator mutator;
+    for (const auto& path : paths) seeds.push_back(RunFile(path));
+    if (seeds.empty()) return 1;
+    const auto any = [&]() -> const Input& { return seeds.at(static_cast<std::size_t>(Below(seeds.size()))); };
     for (int i = 0; i < kMutations; ++i) {
-        Input input = seeds[mutator.Below(seeds.size())];
-        mutator.Mutate(input, seeds);
+        Input input = any();
+        for (auto times = 1 + Below(4); times; --times) Mutate(input, any());
+        input.resize(std::min(input.size(), kLongest));
         Run(input);
     }
     std::printf("%zu seeds and %d mutations\n", seeds.size(), kMutations);

@@ -67,11 +67,9 @@ TEST(MaintenanceChoice, RunsTheMostUrgentAndAgesTheRest) {
         std::vector<Row> rows;
         const char* order;
     } rows[] = {
-        {"nothing due", {{5, 3, 100}}, "...A."},
         {"the higher priority first, and the lower one in its turn", {{5, 0, 0}, {3, 0, 0}}, "AAABAAABAAAB"},
         {"registered later, still first; a tie goes to the earlier", {{3, 0, 0}, {5, 0, 0}}, "BBABBABBA"},
         {"equal: the earlier one, also when a bonus has just caught up", {{1, 0, 0}, {1, 0, 0}}, "ABABAB"},
-        {"it takes its turn whenever it falls due", {{9, 0, 4}, {0, 0, 0}}, "ABBBABBBA"},
         {"what is not due gains nothing", {{2, 0, 0}, {0, 3, 100}}, "AAAAAAB"},
         {"a due time far in the past", {{0, 0, 100}, {0, 0, 100}, {0, 0, 100}}, "ABC..."},
         {"one that throws is passed over for good", {{9, 0, 0, 'd'}, {8, 0, 0, 'p'}, {0, 0, 0}}, "CCC"},
@@ -82,22 +80,6 @@ TEST(MaintenanceChoice, RunsTheMostUrgentAndAgesTheRest) {
 }
 
 TEST(MaintenanceChoice, LowestPriorityWaitsAPassIntended) { EXPECT_EQ(Order({{kLowest, 0, 100}}, 3), ".A."); }
-
-TEST(MaintenanceChoice, WaitsForTheEarliestThatIsNotRetired) {
-    RequestList list;
-    unsigned long long due = 0;
-    EXPECT_FALSE(list.NextDue(due));
-    const CPRequest<Fake> late(0, 70, 0, '\0'), early(-5, 40, 0, '\0'), broken(0, 10, 0, 'd');
-    for (const auto* request : {&late, &early, &broken}) ASSERT_TRUE(list.Append(*request, Position(*request)));
-    ASSERT_TRUE(list.NextDue(due));
-    EXPECT_EQ(due, 40u);
-    list.Take(list.Find(early, Position(early)));
-    ASSERT_TRUE(list.NextDue(due));
-    EXPECT_EQ(due, 70u);
-    list.Take(list.Find(late, Position(late)));
-    EXPECT_FALSE(list.NextDue(due)) << "only the retired one is left";
-    EXPECT_EQ(list.GetCount(), 1u);
-}
 
 TEST(MaintenanceChoice, ListKeepsItsOrderAndSurvivesFailingHeaps) {
     std::vector<CPRequest<Fake>> requests;
@@ -128,10 +110,7 @@ TEST(PoolUpkeep, SweepsEveryTenSecondsAndEveryTwentyWhileAllIsWell) {
     EXPECT_LE(upkeep.GetDueTime(), Core::OS::GetTimeNow() + 10000);
     EXPECT_EQ(upkeep.GetPriority(), 0);
 
-    IMaintenanceRequest& request = upkeep;
-    EXPECT_EQ(upkeep.QueryInterface(acfTypeOf<IMaintenanceRequest>::uid), &request);
-    EXPECT_EQ(upkeep.QueryInterface(acfTypeOf<IACFUnknown>::uid), nullptr);
-    EXPECT_STREQ(request.GetName(), L"CStringPoolMaintenance");
+    EXPECT_STREQ(static_cast<IMaintenanceRequest&>(upkeep).GetName(), L"CStringPoolMaintenance");
 }
 
 } // namespace

@@ -16,4 +16,7 @@ bool IsLibraryLoaded();
 // Memory that only this process uses.
 std::size_t PrivateBytes();
 
+// The slot of threads (a number of the system's) that the next one to ask for one gets.
+std::size_t FirstFreeSlot();
+
 } // namespace loading

@@ -1,6 +1,6 @@
 #pragma once
-// The addresses by which the library tells its types and special strings apart, taken in three ways by whichever module
-// includes this: by its static initialisers, by functions at run time, and from values that the library made.
+// The addresses by which the library tells its types and special strings apart, taken in two ways by whichever module
+// includes this: by its static initialisers, and from values that the library made.
 
 #include <TAVO/acf.h>
 #include <TAVO/buffers.h>
@@ -11,51 +11,27 @@
 
 namespace identities {
 
-enum Way { AtLoad, ByInlineFunction, FromValues, kWays };
+enum Way { AtLoad, FromValues };
 
-enum Identity {
-    PlainMemory,
-    VectorOfHandles,
-    VectorOfStrings,
-    VectorOfHashEntries,
-    PoolEntry,
-    Element,
-    Mutex,
-    CriticalSection,
-    RWInterlock,
-    Event,
-    MultipleEvent,
-    Thread,
-    WrapperOfEnumerations,
-    TextOfTrue,
-    TextOfFalse,
-    TextOfEmpty,
-    TextOfNull,
-    TextInterned,
-    kIdentities
-};
-
-constexpr const char* kNames[] = {
-    "CPPlainMemory",
-    "CPObjectVector<CPObjectMemory>",
-    "CPObjectVector<CPPoolString>",
-    "CPObjectVector<HASHENTRY>",
-    "CPPoolString",
-    "CPXMLObject",
-    "CPMutex",
-    "CPCriticalSection",
-    "CPRWInterlock",
-    "CPEvent",
-    "CPMultipleEvent",
-    "CPThread",
-    "CPACI<IACFEnumDefinitions>",
-    "ptrue",
-    "pfalse",
-    "pempty",
-    "the null string",
-    "an interned string",
-};
-static_assert(sizeof(kNames) / sizeof(*kNames) == kIdentities, "a name for each identity");
+constexpr const char* kNames[] = {"CPPlainMemory",
+                                  "vector of handles",
+                                  "vector of strings",
+                                  "vector of HASHENTRY",
+                                  "CPPoolString",
+                                  "CPXMLObject",
+                                  "CPMutex",
+                                  "CPCriticalSection",
+                                  "CPRWInterlock",
+                                  "CPEvent",
+                                  "CPMultipleEvent",
+                                  "CPThread",
+                                  "CPACI",
+                                  "ptrue",
+                                  "pfalse",
+                                  "pempty",
+                                  "the null string",
+                                  "an interned string"};
+constexpr int kIdentities = sizeof(kNames) / sizeof(*kNames);
 
 struct Table {
     const void* rows[kIdentities];
@@ -65,78 +41,35 @@ struct Table {
 using Answer = void (*)(Way way, Table* table);
 constexpr const char* kFunction = "TavoTestIdentities";
 
-using TAVO::Buffers::CPObjectMemory;
-using TAVO::Buffers::CPObjectVector;
-using TAVO::Buffers::CPPlainMemory;
-using TAVO::String::CPPoolString;
-using HashEntry = TAVO::Lookup::CBaseHashTable::HASHENTRY;
-
-inline const void* Text(const CPPoolString& string) { return static_cast<const wchar_t*>(string); }
-template <class Number> const void* Address(Number id) {
-    return reinterpret_cast<const void*>(static_cast<std::size_t>(id));
-}
-
-// The virtual table, which is the class where modules meet.
-inline const void* VirtualTable(const TAVO::ACF::CPIACFUnknown& wrapper) {
-    return *reinterpret_cast<const void* const*>(&wrapper);
-}
-using EnumWrapper = TAVO::ACF::CPACI<IACFEnumDefinitions>;
+using namespace TAVO;
+using namespace TAVO::Threading;
+using String::CPPoolString;
+using Handles = Buffers::CPObjectVector<Buffers::CPObjectMemory>;
+using Strings = Buffers::CPObjectVector<CPPoolString>;
+using HashEntries = Buffers::CPObjectVector<Lookup::CBaseHashTable::HASHENTRY>;
+using EnumWrapper = ACF::CPACI<IACFEnumDefinitions>;
 
 // Everything below belongs to one module alone, even where the loader could merge it with another's.
 namespace {
 
+const void* Text(const CPPoolString& string) { return static_cast<const wchar_t*>(string); }
+/// The type of a block, as it stands in its header.
+const void* TypeOf(const Buffers::CPObjectMemory& block) {
+    return reinterpret_cast<const void*>(static_cast<std::size_t>(block.GetTypeID()));
+}
+template <class Class> const void* TypeOf() {
+    return reinterpret_cast<const void*>(static_cast<std::size_t>(Class::GetTypeID()));
+}
+// The virtual table, which is the class where modules meet.
+const void* ClassOf(const EnumWrapper& wrapper) { return *reinterpret_cast<const void* const*>(&wrapper); }
+
 const CPPoolString g_interned(L"interned by every module");
 const EnumWrapper g_wrapper;
-
-const Table g_atLoad = {{
-    &CPPlainMemory::_vtbl,
-    &CPObjectVector<CPObjectMemory>::_vtbl,
-    &CPObjectVector<CPPoolString>::_vtbl,
-    &CPObjectVector<HashEntry>::_vtbl,
-    Address(CPPoolString::GetTypeID()),
-    &TAVO::XML::CPXMLObject::_vtbl,
-    &TAVO::Threading::CPMutex::_vtbl,
-    &TAVO::Threading::CPCriticalSection::_vtbl,
-    &TAVO::Threading::CPRWInterlock::_vtbl,
-    &TAVO::Threading::CPEvent::_vtbl,
-    &TAVO::Threading::CPMultipleEvent::_vtbl,
-    &TAVO::Threading::CPThread::_vtbl,
-    VirtualTable(g_wrapper),
-    Text(CPPoolString::ptrue),
-    Text(CPPoolString::pfalse),
-    Text(CPPoolString::pempty),
-    Text(CPPoolString()),
-    Text(g_interned),
-}};
-
-Table ByFunctions() {
-    using namespace TAVO;
-    CPPoolString moved(L"moved from");
-    const CPPoolString taken(static_cast<CPPoolString&&>(moved));
-    return {{
-        Address(CPPlainMemory::GetTypeID()),
-        Address(CPObjectVector<CPObjectMemory>::GetTypeID()),
-        Address(CPObjectVector<CPPoolString>::GetTypeID()),
-        Address(CPObjectVector<HashEntry>::GetTypeID()),
-        Address(CPPoolString::GetTypeID()),
-        Address(XML::CPXMLObject::GetTypeID()),
-        Address(Threading::CPMutex::GetTypeID()),
-        Address(Threading::CPCriticalSection::GetTypeID()),
-        Address(Threading::CPRWInterlock::GetTypeID()),
-        Address(Threading::CPEvent::GetTypeID()),
-        Address(Threading::CPMultipleEvent::GetTypeID()),
-        Address(Threading::CPThread::GetTypeID()),
-        VirtualTable(EnumWrapper()),
-        Text(CPPoolString(true)),
-        Text(CPPoolString(false)),
-        Text(CPPoolString(L"")),
-        Text(moved),
-        Text(CPPoolString(L"interned by every module")),
-    }};
-}
-
-/// The type of a block, as it stands in its header.
-const void* TypeOf(const CPObjectMemory& block) { return Address(block.GetTypeID()); }
+const Table g_atLoad = {{&Buffers::CPPlainMemory::_vtbl, &Handles::_vtbl, &Strings::_vtbl, &HashEntries::_vtbl,
+                         TypeOf<CPPoolString>(), &XML::CPXMLObject::_vtbl, &CPMutex::_vtbl, &CPCriticalSection::_vtbl,
+                         &CPRWInterlock::_vtbl, &CPEvent::_vtbl, &CPMultipleEvent::_vtbl, &CPThread::_vtbl,
+                         ClassOf(g_wrapper), Text(CPPoolString::ptrue), Text(CPPoolString::pfalse),
+                         Text(CPPoolString::pempty), Text(CPPoolString()), Text(g_interned)}};
 
 // Runs nothing.
 struct Nothing {
@@ -144,43 +77,26 @@ struct Nothing {
     void Run(unsigned long long) {}
 };
 
-struct RunningThread : TAVO::Threading::CPThread {
-    RunningThread() { Execute(TAVO::Threading::CThreadWrapper<Nothing>::Create(), 0); }
-    ~RunningThread() { Wait(TAVO::Threading::WaitForever); } // before a plug-in with its code goes
+struct RunningThread : CPThread {
+    RunningThread() { Execute(CThreadWrapper<Nothing>::Create(), 0); }
+    ~RunningThread() { Wait(WaitForever); } // before a plug-in with its code goes
 };
 
 Table OfValues() {
-    using namespace TAVO;
-    CPPlainMemory plain;
+    using Pool = String::CStringPool;
+    Buffers::CPPlainMemory plain;
     plain.Alloc(1);
-    CPObjectVector<CPObjectMemory> handles(1);
-    CPObjectVector<CPPoolString> strings(1);
-    CPObjectVector<HashEntry> entries(1);
     XML::CPXMLObject element;
     element.SetName(L"element");
-    return {{
-        TypeOf(plain),
-        TypeOf(handles),
-        TypeOf(strings),
-        TypeOf(entries),
-        Address(CPPoolString::GetTypeID()),
-        TypeOf(element),
-        TypeOf(Threading::CPMutex()),
-        TypeOf(Threading::CPCriticalSection()),
-        TypeOf(Threading::CPRWInterlock()),
-        TypeOf(Threading::CPEvent(true)),
-        TypeOf(Threading::CPMultipleEvent()),
-        TypeOf(RunningThread()),
-        VirtualTable(EnumWrapper(g_wrapper)),
-        Text(String::CStringPool::GetStringRefi(L"TRUE")),
-        Text(String::CStringPool::GetStringRefi(L"False")),
-        Text(String::CStringPool::GetStringRefn(L"text", 0)),
-        Text(String::CStringPool::QueryStringRef(L"nobody interned this")),
-        Text(String::CStringPool::GetStringRefi(L"INTERNED by every MODULE")),
-    }};
+    return {{TypeOf(plain), TypeOf(Handles(1)), TypeOf(Strings(1)), TypeOf(HashEntries(1)), TypeOf<CPPoolString>(),
+             TypeOf(element), TypeOf(CPMutex()), TypeOf(CPCriticalSection()), TypeOf(CPRWInterlock()),
+             TypeOf(CPEvent(true)), TypeOf(CPMultipleEvent()), TypeOf(RunningThread()), ClassOf(EnumWrapper(g_wrapper)),
+             Text(Pool::GetStringRefi(L"TRUE")), Text(Pool::GetStringRefi(L"False")),
+             Text(Pool::GetStringRefn(L"text", 0)), Text(Pool::QueryStringRef(L"nobody interned this")),
+             Text(Pool::GetStringRefi(L"INTERNED by every MODULE"))}};
 }
 
-Table Taken(Way way) { return way == AtLoad ? g_atLoad : way == ByInlineFunction ? ByFunctions() : OfValues(); }
+Table Taken(Way way) { return way == AtLoad ? g_atLoad : OfValues(); }
 
 } // namespace
 } // namespace identities

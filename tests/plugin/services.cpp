@@ -24,12 +24,6 @@ struct Sleeper {
     void Run(unsigned long long) { Use(); }
 };
 
-void RunAThread() {
-    TAVO::Threading::CPThread thread;
-    thread.Execute(TAVO::Threading::CThreadWrapper<Sleeper>::Create(), 0);
-    thread.Wait(TAVO::Threading::WaitForever);
-}
-
 } // namespace
 
 extern "C" TAVO_EXPORT void TavoTestService(plugin::Deed deed, void** kept) {
@@ -40,9 +34,12 @@ extern "C" TAVO_EXPORT void TavoTestService(plugin::Deed deed, void** kept) {
     case plugin::Use:
         Use();
         break;
-    case plugin::RunAThread:
-        RunAThread();
+    case plugin::RunAThread: {
+        TAVO::Threading::CPThread thread;
+        thread.Execute(TAVO::Threading::CThreadWrapper<Sleeper>::Create(), 0);
+        thread.Wait(TAVO::Threading::WaitForever);
         break;
+    }
     case plugin::KeepHandles:
         ::new (static_cast<void*>(kept)) TAVO::String::CPPoolString(L"Never let go");
         break;

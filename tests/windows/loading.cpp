@@ -21,4 +21,10 @@ std::size_t PrivateBytes() {
     return counters.PrivateUsage;
 }
 
+std::size_t FirstFreeSlot() {
+    const DWORD slot = TlsAlloc();
+    TlsFree(slot);
+    return slot;
+}
+
 } // namespace loading
