@@ -2,12 +2,18 @@
 
 #include <cstdio>
 #include <dlfcn.h>
+#include <pthread.h>
+#include <string>
 #include <unistd.h>
 
 namespace loading {
 
+// By its whole path: under sanitizers the loader does not follow the program's run path.
 void* LoadPlugin() {
-    void* plugin = dlopen("TAVOTestPlugin.so", RTLD_NOW | RTLD_LOCAL); // along the program's run path
+    char path[4096];
+    const auto length = readlink("/proc/self/exe", path, sizeof path);
+    const std::string self(path, length > 0 ? static_cast<std::size_t>(length) : 0);
+    void* plugin = dlopen((self.substr(0, self.rfind('/') + 1) + "TAVOTestPlugin.so").c_str(), RTLD_NOW | RTLD_LOCAL);
     if (!plugin) std::fprintf(stderr, "%s\n", dlerror());
     return plugin;
 }
@@ -28,7 +34,10 @@ std::size_t PrivateBytes() {
     return (resident - shared) * static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
 }
 
-// Not watched here: Boost's shared library leaves one behind whenever it is unloaded.
-std::size_t FirstFreeSlot() { return 0; }
+std::size_t FirstFreeSlot() {
+    pthread_key_t slot = 0;
+    if (pthread_key_create(&slot, nullptr) == 0) pthread_key_delete(slot);
+    return slot;
+}
 
 } // namespace loading

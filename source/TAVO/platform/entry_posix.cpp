@@ -3,7 +3,29 @@
 
 #include "lifecycle.h"
 
+#include <boost/thread/thread_only.hpp>
+#include <dlfcn.h>
+#if defined(TAVO_MIMALLOC)
+#include <mimalloc.h>
+#endif
+
 namespace {
+
+// The library that holds the function stays when this one goes.
+void Keep(void* function) {
+    Dl_info own, other;
+    if (!dladdr(reinterpret_cast<void*>(&Keep), &own) || !dladdr(function, &other)) return;
+    if (own.dli_fbase != other.dli_fbase) dlopen(other.dli_fname, RTLD_NOW | RTLD_NOLOAD | RTLD_NODELETE);
+}
+
+// Threads that used them end through their code, and what they took of the process comes back with none of them: of
+// Boost a key of the threads' own data, of the allocator its thread-local storage.
+__attribute__((constructor(101))) void KeepOthers() {
+    Keep(reinterpret_cast<void*>(&boost::this_thread::interruption_enabled));
+#if defined(TAVO_MIMALLOC)
+    Keep(reinterpret_cast<void*>(&mi_malloc));
+#endif
+}
 
 __attribute__((constructor(101))) void Load() { TAVO::OnLoad(); }
 

@@ -5,7 +5,6 @@
 #include <stdlib.h>
 
 #if defined(TAVO_MIMALLOC)
-#include <dlfcn.h>
 #include <mimalloc.h>
 #else
 #define mi_malloc malloc
@@ -22,16 +21,6 @@ namespace {
 
 // Small blocks take 16 bytes: mimalloc aligns smaller ones to 8 only, and realloc to 0 would free the block.
 std::size_t AtLeast16(std::size_t size) { return size < 16 ? 16 : size; }
-
-#if defined(TAVO_MIMALLOC)
-// The allocator stays when this library goes: threads that used it end through its code, and the loader cannot give
-// its thread-local storage out again.
-__attribute__((constructor(101))) void KeepAllocator() {
-    Dl_info allocator;
-    if (dladdr(reinterpret_cast<void*>(&mi_malloc), &allocator))
-        dlopen(allocator.dli_fname, RTLD_NOW | RTLD_NOLOAD | RTLD_NODELETE);
-}
-#endif
 
 } // namespace
 
