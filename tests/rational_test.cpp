@@ -64,7 +64,7 @@ TEST(Rational, OrderOfNonNegativeFractionsAndSignOfProductsIntended) {
     EXPECT_FALSE(CRational(0) < CRational(1, 2));
     EXPECT_TRUE(CRational(-3, 4) < CRational(-1, 2) && CRational(-1, 2) < CRational(1, 2));
     const CRational product = CRational(-2, 3) * CRational(3, 4);
-    EXPECT_EQ(Both(product), std::make_pair(1, -2));
+    EXPECT_EQ(Both(product), std::make_pair(long32(1), long32(-2)));
     EXPECT_FALSE(product == CRational(-1, 2));
     EXPECT_EQ(+CRational(-3, 4), CRational(3, 4)) << "unary plus is the magnitude";
 }
