@@ -6,7 +6,7 @@
 namespace TAVO::String {
 
 // Paces CStringPool::Collect: every 10 seconds, every 20 and behind others while sweeps get through in time.
-class CStringPoolMaintenance : public Maintenance::IMaintenanceRequest {
+class CStringPoolMaintenance final : public Maintenance::IMaintenanceRequest {
 public:
     CStringPoolMaintenance() noexcept;
 
