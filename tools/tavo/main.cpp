@@ -177,31 +177,40 @@ void AddIdCommands(CLI::App& id, Action& action) {
     addTexts("format", "Shows the ways to write an identifier", IdFormat);
 }
 
+void AddPoolCommands(CLI::App& pool, Action& action) {
+    pool.require_subcommand(1);
+    auto* command = pool.add_subcommand("stat", "Tells what the pool holds before, with and after documents");
+    auto& stat = Add<PoolStatOptions>(*command, action, PoolStat);
+    command->add_option("FILE", stat.files, kFileHelp)->type_name("");
+    command
+        ->add_option("--watch", stat.watch,
+                     "Look once a second how the library sweeps the pool by itself, so many seconds at most (60)")
+        ->type_name("SECONDS")
+        ->expected(0, 1)
+        ->default_str("60");
+}
+
+// Everything that can be asked; who adds a command adds it here.
+void AddCommands(CLI::App& app, Action& action) {
+    app.allow_windows_style_options(false); // a name may begin with '/'
+    app.set_version_flag("--version", TAVO_VERSION);
+    app.require_subcommand(1);
+
+    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
+    AddPoolCommands(*app.add_subcommand("pool", "The pool of strings"), action);
+    AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
+    AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
+    AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
+    app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
+}
+
 int Run(std::vector<std::string> arguments) {
     CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, and makes\n"
                  "identifiers, with the library TAVO.\n"
                  "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
                  "tavo");
-    app.allow_windows_style_options(false); // a name may begin with '/'
-    app.set_version_flag("--version", TAVO_VERSION);
-    app.require_subcommand(1);
     Action action;
-
-    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
-    auto* pool = app.add_subcommand("pool", "The pool of strings")->require_subcommand(1);
-    auto* command = pool->add_subcommand("stat", "Tells what the pool holds before, with and after documents");
-    auto& poolStat = Add<PoolStatOptions>(*command, action, PoolStat);
-    command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
-    command
-        ->add_option("--watch", poolStat.watch,
-                     "Look once a second how the library sweeps the pool by itself, so many seconds at most (60)")
-        ->type_name("SECONDS")
-        ->expected(0, 1)
-        ->default_str("60");
-    AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
-    AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
-    AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
-    app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
+    AddCommands(app, action);
 
     std::reverse(arguments.begin(), arguments.end()); // the order that the parser wants
     try {
