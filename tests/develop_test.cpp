@@ -206,6 +206,7 @@ struct NaiveTwister {
 
 } // namespace
 
+// Intended: random-first-outputs, random-oddness
 TEST(Random, SequenceOfASeedIsIntended) {
     CMTRandom random;
     for (std::uint32_t seed : {0u, 5489u, 0xFFFFFFFFu}) {

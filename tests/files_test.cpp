@@ -74,6 +74,7 @@ TEST_F(FileOpen, RefusesWhatIsNoFileAndOnlyReadsWhenAskedTo) {
         << "closed";
 }
 
+// Intended: open-makes-folder
 TEST_F(FileOpen, CreatesOneMissingFolderEvenToRead_Intended) {
     EXPECT_FALSE(file.Open(folder / L"a/b/file", FileAccessWrite, OpenFileCreate)) << "two are missing";
     EXPECT_FALSE(_TestDirExists(folder / L"a"));

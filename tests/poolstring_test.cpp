@@ -30,6 +30,7 @@ TEST(PooledString, NullEmptyAndTextDiffer) {
     EXPECT_TRUE(CPPoolString().iequals(CPPoolString(L""))) << "both hashes are 0";
 }
 
+// Intended: number-32-bits
 TEST(PooledString, NumbersKeepTheirLow32BitsIntended) {
     using Row = std::pair<CPPoolString, const wchar_t*>;
     for (const auto& [text, expected] :
@@ -66,6 +67,7 @@ TEST(PooledString, IncRaisesTheTrailingNumber) {
     EXPECT_TRUE(CPPoolString().inc().isnull());
 }
 
+// Intended: pool-utf8-size
 TEST(PooledString, Utf8FormIsMadeOnceAndOnlyWhereItFits) {
     const std::pair<CPPoolString, const char*> rows[] = {{L"\U0001F600", "\x01"},
                                                          {L"A\U0001F600B", "A\x01"
@@ -99,6 +101,7 @@ std::vector<int> FoldedUnits(const wchar_t* text, bool fold) {
 }
 int Order(const std::vector<int>& a, const std::vector<int>& b) { return a < b ? -1 : b < a; }
 
+// Intended: pool-null-first
 TEST(PooledString, ComparesLikeASlowReading) {
     for (const wchar_t* first : kTexts)
         for (const wchar_t* second : kTexts) {
@@ -220,6 +223,7 @@ TEST(StringArray, JoinsWithTheSeparator) {
         << "all units, not len()";
 }
 
+// Intended: split-trailing
 TEST(StringArray, SplitsAtTheSeparator) {
     struct Row {
         const wchar_t* text;

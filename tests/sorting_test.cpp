@@ -209,6 +209,7 @@ TEST(Checksum, AgreesWithBitByBitInEveryWidth) {
     EXPECT_EQ(CMachineCRC(16, 0x1021).Eval("123456789", 9, 0xFFFF), 0x29B1u) << "the well-known check value";
 }
 
+// Intended: crc-eight-bits
 TEST(Checksum, OfEightBitsComputesNothingIntended) {
     for (const unsigned width : {0u, 7u, 8u, 65u, 0xFFFFFFFFu})
         EXPECT_EQ(CMachineCRC(width, 0x07).Eval("abc", 3, 0x1234), 0x1234u) << width;

@@ -148,6 +148,7 @@ Wide WithGenerator(Wide text, std::size_t at) {
     return text;
 }
 
+// Intended: ten-units
 TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
     for (std::size_t at = 0; at < 20; ++at) {
         Wide text(31, L'\u4000');

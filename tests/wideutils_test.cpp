@@ -17,6 +17,7 @@ constexpr std::size_t kAll = SIZE_MAX;
 
 unsigned Lower(unsigned c) { return c >= 'A' && c <= 'Z' ? c + 32 : c; }
 
+// Intended: blank-is-space
 TEST(WideUtilities, CaseIsAToZAndNothingElse_Intended) {
     for (unsigned unit = 0; unit < 0x10000; ++unit) {
         const auto c = static_cast<wchar_t>(unit);
@@ -35,6 +36,7 @@ TEST(WideUtilities, CaseIsAToZAndNothingElse_Intended) {
     EXPECT_TRUE(wcscount(L"a,b,,c", L',') == 3 && wcscount(nullptr, L',') == 0);
 }
 
+// Intended: null-sorts-last, signed-count
 TEST(WideUtilities, NullSortsLastAndCountsHave32SignedBits_Intended) {
     for (std::size_t n : {std::size_t(0), std::size_t(5), kAll})
         EXPECT_TRUE(wcsncmpi(nullptr, L"a", n) == 1 && wcsncmpi(L"a", nullptr, n) == -1 &&

@@ -53,6 +53,7 @@ TEST(XmlDocument, TopLevel) {
     EXPECT_EQ(OpenUtf16(u"\xFEFF\xFEFF<a/>").code, 5u);
 }
 
+// Intended: xml-declaration-end
 TEST(XmlDocument, IntendedDeclarationsRunToTheFirstBracketOutsideQuotes) {
     Open({"<!-- don't --><a/><!-- can't --><b/> -> b", "<!-- '>' --><a/> -> a", "<!x \"'>\" '\">'><a/> -> a",
           "<!--><a/> -> a", "<!DOCTYPE a SYSTEM \"a>.dtd\"><a/> -> a", "<![CDATA[x]]><a/> -> a"});
@@ -113,6 +114,7 @@ TEST(XmlDocument, InstructionsAndSections) {
     Fail(10, {"<a>^]]></a>", "<a>x ]^]]></a>"});
 }
 
+// Intended: xml-named-references
 TEST(XmlDocument, IntendedReferenceLookUpIsInverted) {
     Open({"<a>&lt;</a> -> a:>", "<a>&gt;</a> -> a:<", "<a>&amp;</a> -> a:<;", "<a>&apos;</a> -> a:<s;",
           "<a b='&quot;'/> -> a b='<t;'", "<a>&xyz</a> -> a:<", "<a>&   x</a> -> a:<x", "<a>&</a></a> -> a:<>",
@@ -127,6 +129,7 @@ TEST(XmlDocument, IntendedReferenceLookUpIsInverted) {
     Check<std::u16string>(u"<a>&\xDC00xzy</a>", kGood, 0, "a:<y");
 }
 
+// Intended: xml-numeric-references
 TEST(XmlDocument, IntendedNumericReferences) {
     Open({"<a b='&#65;'>&#00000000000000000000000000066;</a> -> a b='A':B", "<a>&#6:;&#:;</a> -> a:F\\000A",
           "<a> &#32;&#9;&#10;&#13; </a> -> a: \\0009\\000A\\000D", "<a>x &#32; y</a> -> a:x   y",
@@ -172,6 +175,7 @@ TEST(XmlDocument, CharactersOfUtf16) {
 }
 
 // Bytes that are no UTF-8 are refused before anything is read.
+// Intended: xml-bad-utf8
 TEST(XmlDocument, IntendedBadUtf8IsToldWithoutItsPlace) {
     for (const char* bad : {"\x80", "\xBF", "\xC3", "\xC3x", "\xE4\xB8", "\xE4\xB8x", "\xF0\x9F\x98", "\xF0\x9F\x98x",
                             "\xF5\x80\x80\x80", "\xF8\x88\x80\x80\x80", "\xFE", "\xFF"})

@@ -29,6 +29,7 @@ std::string Written(const CPXMLObject& element) {
 
 } // namespace
 
+// Intended: xml-pair-written
 TEST(XmlWrite, SurrogatesAreNotCombinedIntended) {
     for (const wchar_t* pair : {L"\xD83D\xDE00", L"\xD87D\xDE00", L"\xD83D\xFFFF", L"\xD83D\xDBFF"})
         EXPECT_EQ(Written(WithData(pair)), kDeclaration + "<e>\x01</e>");

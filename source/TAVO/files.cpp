@@ -75,8 +75,8 @@ bool CFile::Open(const wchar_t* path, eFileAccess access, eOpenFileOptions optio
     Platform::FileRequest request;
     if (!HasText(path) || m_handle != kClosed || !MakeRequest(access, options, request)) return false;
     auto result = Platform::OpenFile(path, request, m_handle);
-    // Intended: also an open that only reads creates the missing folder, although it cannot succeed then. Callers that
-    // write next to what they looked for rely on the folder.
+    // Intended (open-makes-folder): also an open that only reads creates the missing folder, although it cannot succeed
+    // then. Callers that write next to what they looked for rely on the folder.
     if (result == Platform::OpenResult::PathNotFound && MakeParent(path))
         result = Platform::OpenFile(path, request, m_handle);
     if (result != Platform::OpenResult::Opened) return false;

@@ -141,8 +141,8 @@ bool CPPoolStringArray::Inflate(const CPPoolString& text, wchar_t separator) noe
         if (!AddPiece(piece, static_cast<std::size_t>(unit - piece))) return false;
         piece = unit + 1;
     }
-    // Intended: a trailing empty piece adds nothing, while others add the null string. A textbook split would treat all
-    // alike; lists that end in a separator would grow by an element.
+    // Intended (split-trailing): a trailing empty piece adds nothing, while others add the null string. A textbook
+    // split would treat all alike; lists that end in a separator would grow by an element.
     return piece == end || AddPiece(piece, static_cast<std::size_t>(end - piece));
 }
 
