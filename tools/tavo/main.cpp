@@ -2,6 +2,7 @@
 
 #include "commands.h"
 #include "console.h"
+#include "reference.h"
 #include "streams.h"
 
 #include <CLI/CLI.hpp>
@@ -33,7 +34,7 @@ void AddOutput(CLI::App& command, OutputOptions& output) {
     command
         .add_option("--encoding", output.encoding, "utf-8 (the default), utf-16, or utf-16-raw, which writes any text")
         ->check(CLI::IsMember(EncodingNames()).description(""))
-        ->type_name("NAME");
+        ->type_name("ENCODING");
     command.add_flag("--pretty", output.pretty, "one element per line, indented");
     command.add_flag("--strict", output.strict, "write nothing when some text would not read back as it is");
 }
@@ -190,6 +191,19 @@ void AddPoolCommands(CLI::App& pool, Action& action) {
         ->default_str("60");
 }
 
+// For the build, which installs what they print; not listed in the help.
+void AddReferenceCommands(const CLI::App& app, CLI::App& help, Action& action) {
+    help.group("")->require_subcommand(1);
+    const auto add = [&](CLI::App& command, std::function<std::string()> make) {
+        command.callback([make, &action] { action = [make] { return Print(make()), kFine; }; });
+    };
+    add(*help.add_subcommand("man", "Prints the man page"), [&app] { return ManPage(app); });
+    auto* completion = help.add_subcommand("completion", "Prints the script that completes commands in a shell");
+    const auto shell = std::make_shared<std::string>();
+    completion->add_option("SHELL", *shell, "the shell")->required()->check(CLI::IsMember(ShellNames()))->type_name("");
+    add(*completion, [&app, shell] { return Completion(app, *shell); });
+}
+
 // Everything that can be asked; who adds a command adds it here.
 void AddCommands(CLI::App& app, Action& action) {
     app.allow_windows_style_options(false); // a name may begin with '/'
@@ -202,6 +216,7 @@ void AddCommands(CLI::App& app, Action& action) {
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
+    AddReferenceCommands(app, *app.add_subcommand("help", "The tool's reference"), action);
 }
 
 int Run(std::vector<std::string> arguments) {
