@@ -134,6 +134,7 @@ TEST(PooledString, ComparesLikeASlowReading) {
         }
 }
 
+// Intended: pool-length, pool-suffix
 TEST(PooledString, SuffixesCountPairsAsOneIntended) {
     const CPPoolString text(L"a\U0001F600bc");
     EXPECT_EQ(text.len(), 4u);

@@ -60,6 +60,7 @@ Elements RandomElements(std::mt19937& random, std::size_t count, unsigned keys) 
     return elements;
 }
 
+// Intended: sort-equal-elements
 TEST(Sort, PlacesEqualElementsAsStatedIntended) {
     std::mt19937 random(1);
     // A random long range never runs out of patience, so the same holds there.

@@ -220,6 +220,7 @@ TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweepInARow) {
         text.free();
         Sweep();
         EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
+        // Intended: pool-idle
         EXPECT_TRUE(IsKept(L"swept")) << "a look-up does not prolong its life";
     }
     Sweep();

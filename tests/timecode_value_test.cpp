@@ -55,6 +55,7 @@ TEST(Timecode, ConversionsWithUnsignedUnitsIntended) {
     EXPECT_EQ(T(72LL, 0).Frames(0, 0), 2) << "halves away from zero";
     EXPECT_EQ(T(LLONG_MIN, 0).Frames(0, 1), static_cast<long32>(0 - ((1ULL << 63) + 47) / 48));
     EXPECT_EQ(T(-48LL, 0).Frames(0, -1), static_cast<long32>((0ULL - 48) / 48));
+    // Intended: timecode-defined
     EXPECT_TRUE(!kNothing && kNothing.IsDefined() && !!kBroken);
 }
 

@@ -43,6 +43,7 @@ void Open(Texts texts, Form form = Both) {
 } // namespace
 
 TEST(XmlDocument, TopLevel) {
+    // Intended: xml-no-element
     Open({"<?xml version='1.0'?> -> ", "<!--x--> -> ", " \r\n<a/>\t -> a"});
     Fail(1, {" \t\r\n^"});
     Fail(4, {"<a/></^", "<a/><^"});
@@ -80,6 +81,7 @@ TEST(XmlDocument, TagsAndAttributes) {
     Open({"<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b", "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301",
           "<a b='\"'c=\"'\"d \t=\r\n ' 1 \t\r\n 2 ' >x</a> -> a b='\"' c=''' d='1 2':x",
           "<a b='<c>]]><!-- x --><![CDATA[y]]>'/> -> a b='<c>]]><!-- x --><![CDATA[y]]>'",
+          // Intended: xml-empty-attribute
           "<a b='' c='1' d=\" \n\"/> -> a c='1'", "<a b='&#32;'/> -> a b=' '", "<a b='' b='1'/> -> a b='1'"});
     Fail(1, {"<a>^", "<a><b/> ^"});
     Fail(3, {"<a b=^'1\"/>", "<a b=^\""});
@@ -106,6 +108,7 @@ TEST(XmlDocument, InstructionsAndSections) {
     Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a ^<b/>"});
     Fail(5, {"<?^?>", "<?^ a?>"});
     Fail(6, {"<?a text^?>", "<a><?b c='1' ^c='1'?></a>"});
+    // Intended: xml-text-or-children
     Fail(15, {"<a>x<?b?> ^y</a>", "<a>x<?b?>^<![CDATA[y]]></a>", "<a>x^<b/></a>", "<a><b/>^x</a>", "<a>x<?b?>^</b>"});
 
     Open({"<a><![CDATA[ <&#65; \n ]> ]]></a> -> a: <&#65; \\000A ]> ", "<a>p <![CDATA[ x ]]> q</a> -> a:p  x  q",

@@ -129,6 +129,7 @@ TEST(XmlTree, KindStaysAfterSingleDeletesIntended) {
     CPXMLObject parent = Parent({L"a"});
     EXPECT_TRUE(parent.Delete(0) && parent.DeleteElements() && CanBeWritten(parent));
     EXPECT_TRUE(parent.Add(L"text") && !CanBeWritten(parent)) << "counts as children and data";
+    // Intended: xml-insert-beside-data
     EXPECT_FALSE(parent.Insert(Named(L"a"), 0)) << "refused beside data, where Add is not";
     EXPECT_TRUE(parent.Set(L"text") && CanBeWritten(parent));
 }

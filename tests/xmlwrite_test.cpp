@@ -54,6 +54,7 @@ TEST(XmlWrite, FilesAreReplacedOrDeleted) {
     EXPECT_TRUE(root.Write(path, XMLEncodingUTF16, false));
     EXPECT_EQ(support::Get(path).substr(78, 8), std::string("<\0e\0>\0<\0", 8)) << "no mark";
 
+    // Intended: xml-write-replaces
     EXPECT_FALSE(mixed.Write(path, XMLEncodingUTF8, false));
     EXPECT_EQ(support::Get(path), "(no file)");
     support::Put(path, "x");

@@ -133,6 +133,7 @@ bool CFile::Write(const void* buffer, ulong32 n, ulong32* done) noexcept {
 
 bool CFile::DeleteFileW(const wchar_t* path) noexcept { return HasText(path) && Platform::RemoveFile(path); }
 
+// Intended (rename-keeps): a file that exists is never replaced, where a POSIX textbook would.
 bool CFile::RenameFile(const wchar_t* from, const wchar_t* to) noexcept {
     return HasText(from) && HasText(to) && Platform::RenameWithoutReplacing(from, to);
 }

@@ -175,6 +175,7 @@ tagSWITCHES GetSwitches() noexcept {
 namespace Core::OS {
 
 unsigned long long GetTimeNow() { return Platform::GetUtcMilliseconds(); }
+// Intended (platform-name): on every system; hosts compare it.
 const wchar_t* GetPlatformString() { return L"Windows"; }
 const wchar_t* GetProcessName() { return g_facts.processName; }
 const wchar_t* GetStartupPath() { return g_facts.startupPath; }

@@ -199,6 +199,8 @@ int CPPoolString::cmppi(const wchar_t* other) const noexcept {
     return len() < start.length ? -1 : ComparePrefixFolded(Entry().text, start);
 }
 
+// Intended (pool-suffix): offsets and limits are len() here and below, where a textbook would count units; with pairs
+// in the text they lie one unit per pair too early. Results that hosts sorted by would change.
 int CPPoolString::cmp_p(const CPPoolString& other) const noexcept {
     if (*this == other) return 0;
     if (len() < other.len()) return -1;

@@ -34,6 +34,8 @@ int CompareFolded(const wchar_t* a, const wchar_t* b, std::size_t n) {
 
 // Whether `part` occurs in the first `n` units of `text`, each unit seen through `map`.
 template <wchar_t (*map)(wchar_t)> bool Contains(const wchar_t* text, const wchar_t* part, std::size_t n) {
+    // Intended (empty-part): an empty text occurs in none but itself, where a textbook finds it everywhere; and null in
+    // null.
     if (text == part) return true;
     if (!text || !part || !*part) return false;
     const std::size_t partLength = WideLength(part);

@@ -203,6 +203,7 @@ template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t uni
     }
     ParseResult result = Parse(text, units);
     m_errorCode = result.code;
+    // Intended (xml-no-element): also without any element, which a textbook refuses; callers look at the root.
     if (result.code == kSuccess) {
         m_root = std::move(result.root);
         return true;

@@ -260,6 +260,8 @@ _CFileOut::~_CFileOut() {
     if (m_isOpen) Discard();
 }
 
+// Intended (xml-write-replaces): a file that stood at the path is gone by now, where a textbook would write beside it
+// and rename. Hosts that look for the file after a failure would notice.
 void _CFileOut::Discard() {
     m_isOpen = false;
     m_file.Close();

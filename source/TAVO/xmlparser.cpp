@@ -242,7 +242,8 @@ private:
         return true;
     }
 
-    // Content is children or data; text beside children is refused. After a child nothing but markup may come.
+    // Intended (xml-text-or-children): a textbook reads text between children. Here content is one or the other, as the
+    // tree and the writer know it; after a child nothing but markup may come.
     bool MixedContent(const Unit* at) { return Fail(kMixedContent, at); }
 
     // --- names
@@ -336,7 +337,8 @@ private:
         if (attribute.name.isnull()) return OutOfMemory();
         if (!Value(attribute.value)) return false;
         if (IsDuplicate(attribute.name)) return Fail(kBadAttribute, name);
-        // An empty value is dropped: an attribute that is missing reads the same.
+        // Intended (xml-empty-attribute): an empty value is dropped, where a textbook keeps it: hosts take it for
+        // missing.
         if (!attribute.value.isdef()) return true;
         return Keep(std::move(attribute)) || OutOfMemory();
     }
@@ -507,7 +509,7 @@ private:
     // --- text
     // ----------------------------------------------------------------------------------------------------------
 
-    // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone between other
+    // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone among other
     // units, a control, a character above 7F, '&', or one of the two stops; the end when there is none.
     // Requires: `start` is not at a blank.
     const Unit* RunEnd(const Unit* start, Unit stop1, Unit stop2) const {
@@ -532,8 +534,8 @@ private:
             }
             at -= spaceBefore;
         }
-        while (at != m_end && (IsPlain(*at, stop1, stop2) ||
-                               (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
+        while (at != m_end &&
+               (IsPlain(*at, stop1, stop2) || (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
             ++at;
         return at;
     }

@@ -532,6 +532,7 @@ xmlret CPXMLObject::SetTag(const CPPoolString& name, const wchar_t* value) noexc
 
 xmlret CPXMLObject::Insert(const CPXMLObject& child, std::size_t index) noexcept {
     Node* node = NamedNode(*this);
+    // Intended (xml-insert-beside-data): an element with data takes no child here, though Add gives it one.
     if (!node || node->data.isdef()) return Failed();
     const std::size_t count = Elements::Count(node->elements);
     if (!Elements::Insert(node->elements, index < count ? index : count, CPXMLObject(child))) return Failed();
