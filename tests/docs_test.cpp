@@ -89,7 +89,7 @@ support::Finished Run(const Pipe& pipe) {
     for (const Words& words : pipe.commands) {
         const bool isFirst = &words == pipe.commands.data();
         if (isFirst && words.size() == 2 && words[0] == "printf") {
-            run.output = Printf(words[1]);
+            run = {0, Printf(words[1]), {}};
             continue;
         }
         if (words.empty() || words[0] != "tavo") throw std::invalid_argument("not a command of tavo");
