@@ -204,7 +204,7 @@ TEST(XmlTree, FailingAllocationsLeaveElementsUsable) {
             ASSERT_EQ(CountOf(element), count + added);
         }
         // Intended: xml-cadd
-        ASSERT_TRUE(other.CAdd(leaf)) << "true, also without the memory for it";
+        ASSERT_TRUE(other.CAdd(element)) << "true, also without the memory for it";
         const bool named = element.AddAttribute(kName, kValue);
         ASSERT_EQ(element.GetNAttributes(), named ? 1u : 0u);
         // Setting an attribute anew takes no memory.
