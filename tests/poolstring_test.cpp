@@ -171,6 +171,7 @@ TEST(StringArray, SortedOneIsASet) {
         add ? void(model.insert(name)) : void(model.erase(name));
         held |= add;
         const auto place = static_cast<std::size_t>(std::distance(model.begin(), model.lower_bound(name)));
+        // Intended: array-locate
         ASSERT_EQ(array.LocateEntry(text), held ? place : TAVO::Buffers::NotFound);
         ASSERT_EQ(array.GetNItems(), model.size());
     }
@@ -209,6 +210,7 @@ TEST(StringArray, TakesBlocksOfPooledStrings) {
     CPPoolStringArray list(false), set(true);
     list = block, set = block;
     EXPECT_EQ(Elements(list), (Strings{"b", "a", "b"}));
+    // Intended: array-duplicates
     EXPECT_EQ(Elements(set), (Strings{"a", "b", "b"})) << "sorted; duplicates stay";
     list = TAVO::Buffers::CPOMVector(2);
     const support::FailingHeap heap(0);
