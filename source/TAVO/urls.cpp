@@ -37,6 +37,8 @@ constexpr ByteSet kUnreserved = [] {
     return set;
 }();
 
+// Intended (url-percent): a '%' in the extra set is kept like any other byte, in encoding and in checking, where one
+// expects that it is escaped or begins an escape. Hosts that pass it count on text with escapes staying as it is.
 ByteSet Kept(Bytes extra) {
     ByteSet set = kUnreserved;
     if (extra)
@@ -302,8 +304,9 @@ TAVO_INLINE std::size_t CopyToPercent(unsigned char* out, Bytes in, Bytes end) {
     return done;
 }
 
-// Ends behind what it writes, which may hold zeros, without a terminator. `out` may be in the same text, at or before
-// `in`.
+// Ends behind what it writes, without a terminator. `out` may be in the same text, at or before `in`.
+// Intended (url-zero): %00 becomes a byte 0 like any other, so that the text seems to end there; a wary decoder refuses
+// it. Hosts that decode bytes and not texts need it.
 unsigned char* Decode(unsigned char* out, Bytes in, std::size_t length) {
     Bytes const end = in + length;
     if (HasShuffle()) in = DecodeBlocks(in, end, out);
@@ -383,6 +386,8 @@ String::CUTF8Char file_EncodeURL(const wchar_t* path) noexcept {
     // Intended (file-url-whole): one expects the URL of as much as was converted. It would name another file, a folder
     // above it perhaps.
     if (!path || !*path || !IsWholeWide(path)) return {};
+    // Intended (file-url-pairs): a character above U+FFFF becomes the one byte 1, as in all UTF-8 of this library,
+    // where one expects its four. URLs that hosts have stored would change.
     const String::CUTF8Char bytes(path);
     if (!bytes) return {};
     ByteSet kept = kUnreserved;
@@ -413,6 +418,8 @@ String::CACFWChar file_DecodeURL(const unsigned char* url) noexcept {
     unsigned char* const end = Decode(decoded, url, length);
     *end = 0;
     if (!IsWholeUtf8(decoded, end)) return {};
+    // Intended (file-url-relative): what is neither drive path nor begins with a separator gets one, also when a
+    // relative path was encoded: a URL names a place, and the working folder is none.
     const std::size_t slashes = host ? 2 : IsSeparator(*decoded) || IsDrivePath(decoded) ? 0 : 1;
     return String::CACFWChar(static_cast<Bytes>(decoded - slashes));
 }
