@@ -68,13 +68,13 @@ void ExpectAsNaive(const std::string& text, const std::string& extra) {
 
 } // namespace
 
-// Each byte at each place of a block, alone and between others, and with an extra set that has it. Intended:
-// url-percent
+// Alone and between others, and with an extra set that has it.
+// Intended: url-percent
 TEST(Urls, EveryByteAtEveryPlace_Intended) {
     for (unsigned byte = 1; byte < 256; ++byte)
         for (std::size_t length : {1, 30})
             for (std::size_t at = 0; at < length; ++at)
-                for (const char* fill : {"a", "/", "%4a"}) {
+                for (const char* fill : {"a", "%4", "%4a"}) {
                     std::string text;
                     for (std::size_t i = 0; i < length; ++i) text += i == at ? std::string(1, char(byte)) : fill;
                     ExpectAsNaive(text, "");

@@ -176,8 +176,9 @@ TAVO_SHUFFLES inline void Expand(unsigned char*& out, Block group, std::uint32_t
 
 TAVO_SHUFFLES Bytes EncodeBlocks(const ByteSet& set, Bytes in, Bytes end, unsigned char*& target) {
     static constexpr char kHex[] = "0123456789ABCDEF";
-    // The output has at least as many bytes to come as the input: that is the room for a block at the fourth group.
-    constexpr std::size_t kLeast = kBlock + 12;
+    // The output has at least as many bytes to come as the input, and a terminator: that is the room for a block at the
+    // fourth group.
+    constexpr std::size_t kLeast = kBlock + 11;
     const Members kept(set);
     const Block hex = Load(kHex), percent = All8('%');
     unsigned char* out = target;
