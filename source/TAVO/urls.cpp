@@ -130,10 +130,13 @@ struct Escapes {
     Block decoded;
     std::uint32_t begins, digits; // a bit for each of their bytes
 };
-TAVO_SHUFFLES Bytes CountBlocks(const ByteSet& set, Bytes in, Bytes end, std::size_t& count) {
+// All of a text that has a block at least: the last one takes in what was counted before.
+TAVO_SHUFFLES std::size_t CountBlocks(const ByteSet& set, Bytes in, Bytes end) {
     const Members kept(set);
+    std::size_t count = 0;
     for (; HasLeft(in, end, kBlock); in += kBlock) count += CountBits(Mask(kept.Of(Load(in))));
-    return in;
+    const auto rest = static_cast<unsigned>(end - in);
+    return count + CountBits(Mask(kept.Of(Load(end - kBlock))) >> (kBlock - rest));
 }
 
 // Null: something is neither kept nor part of an escape.
@@ -251,9 +254,10 @@ std::size_t LengthOf(Bytes text) { return ZeroUnit(text, SIZE_MAX); }
 
 std::size_t EncodedLength(const ByteSet& kept, Bytes text, std::size_t length) {
     std::size_t count = 0;
-    Bytes in = text;
-    if (HasShuffle()) in = CountBlocks(kept, in, text + length, count);
-    for (; in < text + length; ++in) count += kept.Has(*in);
+    if (length >= kBlock && HasShuffle())
+        count = CountBlocks(kept, text, text + length);
+    else
+        for (std::size_t i = 0; i < length; ++i) count += kept.Has(text[i]);
     return 3 * length - 2 * count;
 }
 
