@@ -130,6 +130,7 @@ struct Escapes {
     Block decoded;
     std::uint32_t begins, digits; // a bit for each of their bytes
 };
+
 // All of a text that has a block at least: the last one takes in what was counted before.
 TAVO_SHUFFLES std::size_t CountBlocks(const ByteSet& set, Bytes in, Bytes end) {
     const Members kept(set);
@@ -221,7 +222,7 @@ constexpr std::array<Selection, 256> kSelections = [] {
 // `target` may be in the same text, at or before `in`: what is written over has been read.
 TAVO_SHUFFLES Bytes DecodeBlocks(Bytes in, Bytes end, unsigned char*& target) {
     static constexpr std::uint8_t kHalves[] = {0, 0, 0, 0, 0, 0, 0, 0, 8, 8, 8, 8, 8, 8, 8, 8};
-    // What follows becomes at least a third: the room for eight bytes at any place.
+    // What follows becomes at least a third of its bytes: the room for eight at any place.
     constexpr std::size_t kLeast = kBlock + 3 * 8 + 2;
     unsigned char* out = target;
     std::uint32_t behind = 0; // digits at the beginning of the block that belong to an escape before it

@@ -201,9 +201,7 @@ void AddUrlCommands(CLI::App& url, Action& action) {
 void AddTextCommands(CLI::App& text, Action& action) {
     text.require_subcommand(1);
     const auto addEncoding = [](CLI::App& command, const char* option, std::string& name, const char* help) {
-        return command.add_option(option, name, help)
-            ->check(CLI::IsMember(TextFormatNames()).description(""))
-            ->type_name("ENCODING");
+        return command.add_option(option, name, help)->check(CLI::IsMember(TextFormatNames()))->type_name("CHARSET");
     };
     constexpr const char* kTextHelp = "a text; - is standard input";
     constexpr const char* kFromHelp = "its encoding; without it the one that its mark tells, else utf-8";
@@ -212,8 +210,7 @@ void AddTextCommands(CLI::App& text, Action& action) {
     auto& recode = Add<TextRecodeOptions>(*command, action, TextRecode);
     command->add_option("FILE", recode.file, kTextHelp)->required()->type_name("");
     addEncoding(*command, "--from", recode.from, kFromHelp);
-    addEncoding(*command, "--to", recode.to, "utf-8, utf-16, utf-16le, utf-16be, utf-32, utf-32le, utf-32be or ansi")
-        ->required();
+    addEncoding(*command, "--to", recode.to, "the new one")->required();
     command->add_option("-o,--output", recode.output, "where to write; - is standard output")
         ->required()
         ->type_name("FILE");
