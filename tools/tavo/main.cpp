@@ -2,6 +2,7 @@
 
 #include "commands.h"
 #include "console.h"
+#include "encodings.h"
 #include "reference.h"
 #include "streams.h"
 
@@ -178,6 +179,55 @@ void AddIdCommands(CLI::App& id, Action& action) {
     addTexts("format", "Shows the ways to write an identifier", IdFormat);
 }
 
+void AddUrlCommands(CLI::App& url, Action& action) {
+    url.require_subcommand(1);
+    const auto add = [&](const char* name, const char* does, const char* what, const char* help,
+                         int (*run)(const UrlTextOptions&)) -> UrlTextOptions& {
+        auto* command = url.add_subcommand(name, does);
+        auto& options = Add<UrlTextOptions>(*command, action, run);
+        command->add_option(what, options.texts, help)->required()->type_name("");
+        AddJson(*command, options.json);
+        return options;
+    };
+    auto& encode = add("encode", "Escapes texts: %20 for a blank", "TEXT", "bytes, as they are given", UrlEncode);
+    url.get_subcommand("encode")
+        ->add_option("--keep", encode.keep, "characters that stay as they are, beside letters, digits and - _ . ~")
+        ->type_name("SET");
+    add("decode", "Reads escaped texts", "TEXT", "what is no escape stays as it is", UrlDecode);
+    add("from-path", "Tells the URLs of paths", "PATH", "any absolute path, of Windows or of POSIX systems",
+        UrlFromPath);
+    add("to-path", "Tells the paths of URLs", "URL", "begins with file://", UrlToPath);
+}
+
+void AddTextCommands(CLI::App& text, Action& action) {
+    text.require_subcommand(1);
+    const auto addEncoding = [](CLI::App& command, const char* option, std::string& name, const char* help) {
+        return command.add_option(option, name, help)->check(CLI::IsMember(TextFormatNames()))->type_name("CHARSET");
+    };
+    constexpr const char* kTextHelp = "a text; - is standard input";
+    constexpr const char* kFromHelp = "its encoding; without it the one that its mark tells, else utf-8";
+
+    auto* command = text.add_subcommand("recode", "Writes a text in another encoding");
+    auto& recode = Add<TextRecodeOptions>(*command, action, TextRecode);
+    command->add_option("FILE", recode.file, kTextHelp)->required()->type_name("");
+    addEncoding(*command, "--from", recode.from, kFromHelp);
+    addEncoding(*command, "--to", recode.to, "the new one")->required();
+    command->add_option("-o,--output", recode.output, "where to write; - is standard output")
+        ->required()
+        ->type_name("FILE");
+    command->add_flag("--strict", recode.strict, "write nothing when some character would come out as another");
+
+    const auto add = [&](const char* name, const char* does, int (*run)(const TextOptions&)) {
+        auto* looks = text.add_subcommand(name, does);
+        auto& options = Add<TextOptions>(*looks, action, run);
+        looks->add_option("FILE", options.files, kTextHelp)->required()->type_name("");
+        addEncoding(*looks, "--from", options.from, kFromHelp);
+        AddJson(*looks, options.json);
+    };
+    add("count", "Counts bytes, units and characters, by the standard and by the library", TextCount);
+    add("validate", "Tells the first fault by the standard, and what the library makes of the text", TextValidate);
+}
+
 void AddPoolCommands(CLI::App& pool, Action& action) {
     pool.require_subcommand(1);
     auto* command = pool.add_subcommand("stat", "Tells what the pool holds before, with and after documents");
@@ -215,13 +265,15 @@ void AddCommands(CLI::App& app, Action& action) {
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
+    AddUrlCommands(*app.add_subcommand("url", "URLs: escaping, and those of paths"), action);
+    AddTextCommands(*app.add_subcommand("text", "Encodings of texts"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
     AddReferenceCommands(app, *app.add_subcommand("help", "The tool's reference"), action);
 }
 
 int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, and makes\n"
-                 "identifiers, with the library TAVO.\n"
+    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, makes\n"
+                 "identifiers, escapes URLs and recodes texts, with the library TAVO.\n"
                  "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
                  "tavo");
     Action action;
