@@ -269,8 +269,8 @@ CPPoolString CStringPool::GetStringRef(IStringSubmitter* submitter) noexcept {
 }
 
 bool CStringPool::Collect(ulong32 budget) noexcept {
-    // Intended: a thread above or below normal priority does not sweep at all. Under a low one it could be kept from
-    // the processor while it holds the lock that everybody needs.
+    // Intended (collect-priority): a thread above or below normal priority does not sweep at all. Under a low one it
+    // could be kept from the processor while it holds the lock that everybody needs.
     if (Platform::GetThreadPriority() != 0) return false;
     Pool& pool = ThePool();
     bool finished;

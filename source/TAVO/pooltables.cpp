@@ -180,6 +180,7 @@ bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
     PoolEntry& entry = *Block::PayloadOf<PoolEntry>(item);
     const auto held = static_cast<std::int32_t>(item.lockcnt());
     if (held <= 0) return false; // a static entry
+    // Intended (pool-idle): being looked up does not count as use, as it would in a textbook cache; being held does.
     if (held != 3) {
         entry.idleSweeps = 0;
         return false;

@@ -3,6 +3,7 @@
 #include "commands.h"
 #include "console.h"
 #include "encodings.h"
+#include "reference.h"
 #include "streams.h"
 
 #include <CLI/CLI.hpp>
@@ -34,7 +35,7 @@ void AddOutput(CLI::App& command, OutputOptions& output) {
     command
         .add_option("--encoding", output.encoding, "utf-8 (the default), utf-16, or utf-16-raw, which writes any text")
         ->check(CLI::IsMember(EncodingNames()).description(""))
-        ->type_name("NAME");
+        ->type_name("ENCODING");
     command.add_flag("--pretty", output.pretty, "one element per line, indented");
     command.add_flag("--strict", output.strict, "write nothing when some text would not read back as it is");
 }
@@ -227,33 +228,56 @@ void AddTextCommands(CLI::App& text, Action& action) {
     add("validate", "Tells the first fault by the standard, and what the library makes of the text", TextValidate);
 }
 
-int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, makes\n"
-                 "identifiers, escapes URLs and recodes texts, with the library TAVO.\n"
-                 "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
-                 "tavo");
-    app.allow_windows_style_options(false); // a name may begin with '/'
-    app.set_version_flag("--version", TAVO_VERSION);
-    app.require_subcommand(1);
-    Action action;
-
-    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
-    auto* pool = app.add_subcommand("pool", "The pool of strings")->require_subcommand(1);
-    auto* command = pool->add_subcommand("stat", "Tells what the pool holds before, with and after documents");
-    auto& poolStat = Add<PoolStatOptions>(*command, action, PoolStat);
-    command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
+void AddPoolCommands(CLI::App& pool, Action& action) {
+    pool.require_subcommand(1);
+    auto* command = pool.add_subcommand("stat", "Tells what the pool holds before, with and after documents");
+    auto& stat = Add<PoolStatOptions>(*command, action, PoolStat);
+    command->add_option("FILE", stat.files, kFileHelp)->type_name("");
     command
-        ->add_option("--watch", poolStat.watch,
+        ->add_option("--watch", stat.watch,
                      "Look once a second how the library sweeps the pool by itself, so many seconds at most (60)")
         ->type_name("SECONDS")
         ->expected(0, 1)
         ->default_str("60");
+}
+
+// For the build, which installs what they print; not listed in the help.
+void AddReferenceCommands(const CLI::App& app, CLI::App& help, Action& action) {
+    help.group("")->require_subcommand(1);
+    const auto add = [&](CLI::App& command, std::function<std::string()> make) {
+        command.callback([make, &action] { action = [make] { return Print(make()), kFine; }; });
+    };
+    add(*help.add_subcommand("man", "Prints the man page"), [&app] { return ManPage(app); });
+    auto* completion = help.add_subcommand("completion", "Prints the script that completes commands in a shell");
+    const auto shell = std::make_shared<std::string>();
+    completion->add_option("SHELL", *shell, "the shell")->required()->check(CLI::IsMember(ShellNames()))->type_name("");
+    add(*completion, [&app, shell] { return Completion(app, *shell); });
+}
+
+// Everything that can be asked; who adds a command adds it here.
+void AddCommands(CLI::App& app, Action& action) {
+    app.allow_windows_style_options(false); // a name may begin with '/'
+    app.set_version_flag("--version", TAVO_VERSION);
+    app.require_subcommand(1);
+
+    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
+    AddPoolCommands(*app.add_subcommand("pool", "The pool of strings"), action);
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
     AddUrlCommands(*app.add_subcommand("url", "URLs: escaping, and those of paths"), action);
     AddTextCommands(*app.add_subcommand("text", "Encodings of texts"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
+    AddReferenceCommands(app, *app.add_subcommand("help", "The tool's reference"), action);
+}
+
+int Run(std::vector<std::string> arguments) {
+    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, makes\n"
+                 "identifiers, escapes URLs and recodes texts, with the library TAVO.\n"
+                 "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
+                 "tavo");
+    Action action;
+    AddCommands(app, action);
 
     std::reverse(arguments.begin(), arguments.end()); // the order that the parser wants
     try {
