@@ -16,6 +16,7 @@ void Xml();
 void Fractions();
 void Timecode();
 void Files();
+void Urls();
 void Threads();
 void Maintenance();
 void Components();

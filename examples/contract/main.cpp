@@ -31,6 +31,7 @@ int main() {
                  {"Fractions", Fractions},
                  {"Timecode", Timecode},
                  {"Files", Files},
+                 {"URLs", Urls},
                  {"Threads", Threads},
                  {"Maintenance", Maintenance},
                  {"Components", Components}};
