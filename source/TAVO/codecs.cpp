@@ -62,7 +62,7 @@ struct Codec3FFF {
     static constexpr std::size_t kGroup = 7;
     static constexpr unsigned kMark = 0x0300;
 
-    // Seven bytes, lowest first, are 56 bits: 28 to each quarter of a half, then 14 to each unit.
+    // Seven bytes, lowest first, are 56 bits: 28 to each quarter of the block, then 14 to each unit.
     TAVO_INLINE static Block Encode(Block bytes) {
         const Block quarters =
             Simd::Or(Bits(bytes, 0x0FFFFFFF), Bits(Simd::ShiftLeft64<4>(bytes), 0x0FFFFFFFULL << 32));
