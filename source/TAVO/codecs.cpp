@@ -7,7 +7,6 @@
 #include "simd.h"
 #include "wide.h"
 
-#include <algorithm>
 #include <cstring>
 #include <TAVO/develop.h>
 
@@ -21,7 +20,8 @@ namespace {
 constexpr char kSource[] = "source/TAVO/cstringpool";
 constexpr std::size_t kUnits = 4; // of a group
 constexpr std::size_t kHalf = sizeof(Block) / 2;
-constexpr unsigned kUnpadded = 0xFF; // a padding that no text has
+constexpr std::size_t kRest = 3 * kHalf; // room for what two groups at once leave over: below 15 bytes, read by halves
+constexpr unsigned kUnpadded = 0xFF;     // a padding that no text has
 
 // What `mask` leaves of both halves.
 TAVO_INLINE Block Bits(Block x, std::uint64_t mask) { return Simd::And(x, Simd::Pair(mask, mask)); }
@@ -101,13 +101,10 @@ template <class Codec> bool EncodeText(const void* data, std::size_t size, wchar
     // Two groups, while a whole half can be read from the second on.
     for (; size >= Codec::kGroup + kHalf; size -= 2 * Codec::kGroup, bytes += 2 * Codec::kGroup, out += 2 * kUnits)
         Simd::Store(out, Codec::Encode(Simd::LoadHalves(bytes, bytes + Codec::kGroup)));
-    while (size) {
-        unsigned char group[kHalf] = {};
-        const std::size_t taken = (std::min)(size, Codec::kGroup);
-        std::memcpy(group, bytes, taken);
-        Simd::StoreHalf(out, Codec::Encode(Simd::LoadHalves(group, group)));
-        size -= taken, bytes += taken, out += kUnits;
-    }
+    unsigned char rest[kRest] = {};
+    if (size) std::memcpy(rest, bytes, size);
+    for (std::size_t at = 0; at < size; at += Codec::kGroup, out += kUnits)
+        Simd::StoreHalf(out, Codec::Encode(Simd::LoadHalves(rest + at, rest + at)));
     *out = 0;
     return true;
 }
@@ -122,15 +119,13 @@ template <class Codec> bool DecodeGroups(const wchar_t* text, unsigned char* byt
         Simd::StoreHalf(bytes, groups);
         Simd::StoreHalf(bytes + Codec::kGroup, Simd::HighHalf(groups));
     }
-    while (size) {
+    unsigned char rest[kRest];
+    for (std::size_t at = 0; at < size; at += Codec::kGroup, text += kUnits) {
         const Block units = Simd::LoadHalves(text, text);
         good = Simd::And(good, Codec::AreUnits(units));
-        unsigned char group[kHalf];
-        Simd::StoreHalf(group, Codec::Decode(units));
-        const std::size_t taken = (std::min)(size, Codec::kGroup);
-        std::memcpy(bytes, group, taken);
-        size -= taken, bytes += taken, text += kUnits;
+        Simd::StoreHalf(rest + at, Codec::Decode(units));
     }
+    std::memcpy(bytes, rest, size);
     return Simd::Mask(good) == 0xFFFF;
 }
 
