@@ -471,40 +471,22 @@ TEST(ToolCodec, CodesFilesAndPipes) {
     const Folder folder;
     std::string all;
     for (int byte = 0; byte < 256; ++byte) all += static_cast<char>(byte);
-    const std::string source = folder.Put("bytes", all), text = folder / "text", back = folder / "back";
+    const std::string source = folder.Put("bytes", all), text = folder / "text";
     for (const std::string code : {"3fff", "hex"}) {
         ExpectRun(Call("codec|encode|" + code + "|" + source + "|-o|" + text), kFine, "", "");
-        ExpectRun(Call("codec|decode|" + code + "|" + text + "|-o|" + back), kFine, "", "");
-        EXPECT_EQ(Get(back), all);
-        ExpectRun(Call("codec|decode|" + code, Get(text) + "\r\n"), kFine, all, "");
+        ExpectRun(Call("codec|decode|" + code + "|" + text), kFine, all, "");
+        ExpectRun(Call("codec|decode|" + code, "\xEF\xBB\xBF" + Get(text) + "\r\n"), kFine, all, "");
     }
-    ExpectRun(Call("codec|encode|3fff", "TAVO"), kFine, "\xCC\x83\xE4\x85\x94\xE7\xB5\x99\xE4\x80\x84\xE4\x80\x80\n",
-              "");
-    ExpectRun(Call("codec|encode|hex|-|--nibbles|low-first", "\x1F\x01"), kFine, "F110\n", "");
     ExpectRun(Call("codec|decode|hex|-|--nibbles|low-first", "f1\n 1 0"), kFine, "\x1F\x01", "");
-    ExpectRun(Call("codec|decode|3f", "\xEF\xBB\xBF\xC4\x82!!!!"), kFine, std::string(1, '\0'), "");
-    for (const bool bigEndian : {false, true}) {
-        const std::string mark = bigEndian ? "\xFE\xFF" : "\xFF\xFE";
-        ExpectRun(Call("codec|decode|hex", mark + Utf16("4F4b", bigEndian)), kFine, "OK", "");
-    }
-}
-
-TEST(ToolCodec, Tells3FLosses) {
-    const Folder folder;
-    const std::string out = folder / "out";
+    ExpectRun(Call("codec|decode|hex", "\xFE\xFF" + Utf16("4F4b", true)), kFine, "OK", "");
     ExpectRun(Call("codec|encode|3f", std::string("\0\x0E", 2)), kFine, "\xC4\x81!\x01!!\n",
               "1 of 2 bytes would come back changed, the first at offset 1");
-    ExpectRun(Call("codec|encode|3f", "abc"), kFine,
-              "\xC4\x83"
-              "BBW9\n",
-              "3 bytes are a multiple of 3");
-    ExpectRun(Call("codec|encode|3f|--strict|-o|" + out, "abc"), kBadInput, "", "3 bytes are a multiple of 3");
-    EXPECT_EQ(Get(out), "(no file)");
-    ExpectRun(Call("codec|encode|3f|--strict", "5"), kFine, "\xC4\x82\x56!!!\n", "");
+    ExpectRun(Call("codec|encode|3f|--strict|-o|" + text + "3f", "abc"), kBadInput, "", "3 bytes are a multiple of 3");
+    EXPECT_EQ(Get(text + "3f"), "(no file)");
 }
 
 TEST(ToolCodec, TellsThePlaceOfFaults) {
-    const std::string header = "\xCC\x86", unit = "\xE4\x80\x80", place = "(standard input): unit ";
+    const std::string header = "\xCC\x86", unit = "\xE4\x80\x80", utf16 = "\xFF\xFE\x06\x03";
     const struct {
         const char* code;
         std::string text, complaint;
@@ -516,20 +498,15 @@ TEST(ToolCodec, TellsThePlaceOfFaults) {
         {"3fff", header, "2, at offset 2: the text ends where a padded group belongs"},
         {"3fff", header + unit + "\xE4\x80", "3, at offset 5: the bytes are no text"},
         {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+01F600 belongs to no code"},
-        {"3fff", std::string("\xFF\xFE\x06\x03\x00\x80", 6), "2, at offset 4: U+8000 does not belong there"},
-        {"3fff", std::string("\xFF\xFE\x06\x03\x00", 5), "2, at offset 4: the bytes are no text"},
+        {"3fff", utf16 + "\1\x80", "2, at offset 4: U+8001 does not belong there"},
+        {"3fff", utf16 + "@", "2, at offset 4: the bytes are no text"},
         {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
         {"3f", "\xC4\x82!%!!", "3, at offset 3: U+0025 does not belong there"},
-        {"3f", "\xC4\x82!!! ", "5, at offset 5: U+0020 does not belong there"},
-        {"hex", "4F4", "4, at offset 3: the text ends within a byte"},
-        {"hex", "4F g0", "4, at offset 3: U+0067 is no hexadecimal digit"},
+        {"hex", "4F 4", "5, at offset 4: the text ends within a byte"},
     };
     for (const auto& row : rows)
-        ExpectRun(Call("codec|decode|" + std::string(row.code), row.text), kBadInput, "", place + row.complaint);
-    ExpectRows("codec|", "",
-               {{"encode", kUsage, "", "CODE"},
-                {"encode|base64", kUsage, "", "base64"},
-                {"decode|3f|no such file", kFileTrouble, "", "does not exist"}});
+        ExpectRun(Call("codec|decode|" + std::string(row.code), row.text), kBadInput, "", "unit " + row.complaint);
+    ExpectRun(Call("codec|encode|base64"), kUsage, "", "base64");
 }
 
 TEST(ToolCrc, GivesTheCheckValueOfEachName) {
@@ -543,14 +520,11 @@ TEST(ToolCrc, GivesTheCheckValueOfEachName) {
     for (std::string name, meaning; list >> name && std::getline(list >> std::ws, meaning); ++names) {
         const bool isAlias = meaning[0] != '-';
         const std::string expected = valueOf(isAlias ? meaning : name) + "  -\n";
-        EXPECT_EQ(Call("crc|--name|" + name, digits).output, expected) << name;
         std::replace(meaning.begin(), meaning.end(), ' ', '|');
-        if (!isAlias) {
-            EXPECT_EQ(Call("crc|" + meaning, digits).output, expected) << name;
-        }
+        EXPECT_EQ(Call("crc|--name|" + name, digits).output, expected) << name;
+        EXPECT_EQ(Call("crc|" + (isAlias ? "--name|" + name : meaning), digits).output, expected) << name;
     }
     EXPECT_EQ(names, 32u);
-    EXPECT_EQ(valueOf("crc-32/iso-hdlc"), "cbf43926");
 }
 
 TEST(ToolCrc, ReadsFilesAndNumbers) {
@@ -560,14 +534,10 @@ TEST(ToolCrc, ReadsFilesAndNumbers) {
               "0000  " + empty + "\n" + "cb0b  " + large + '\n', "no such file: does not exist");
     ExpectRun(Call("crc|--name|crc-32|--json|" + empty), kFine,
               "[\n{\"file\":\"" + empty + "\",\"crc\":\"00000000\",\"bytes\":0}\n]\n", "");
-    // Width 8, at which the library's machine computes nothing.
-    ExpectRun(Call("crc|--width|8|--poly|0X1d", "a"), kFine, "89  -\n", "");
     ExpectRows("crc|", "",
                {{"--name|crc-99", kUsage, "", "\"crc-99\" is no name"},
                 {"--width|8", kUsage, "", "--poly HEX"},
                 {"--name|crc-8|--refin", kUsage, "", "--name NAME alone"},
-                {"--width|65|--poly|1", kUsage, "", "65"},
                 {"--width|8|--poly|107", kUsage, "", "\"107\" is no hexadecimal number of 8 bits"},
-                {"--width|8|--poly|0x", kUsage, "", "\"0x\" is no"},
-                {"--width|64|--poly|1|--init|12345678901234567", kUsage, "", "--init: "}});
+                {"--width|8|--poly|0x", kUsage, "", "\"0x\" is no"}});
 }

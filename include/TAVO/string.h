@@ -656,12 +656,14 @@ private:
 // An encoder writes its text straight into the pool entry and keeps the bytes' address, so they must stay while it is
 // given to the pool again. It holds the null string when the bytes are null with a size above 0, or memory is out. A
 // decoder reads nothing behind the text's end and gives empty memory when it refuses the text or memory is out.
+// Encoded texts are pooled like all others: two whose lengths, first ten units and hashes agree are one entry, and 3FFF
+// has the same hash twice. Chance does not produce that, but the author of the bytes can.
 
-/// Bytes as 3F text: about 1.5 bytes of UTF-8 for each byte, where 3FFF takes 1.7 (of UTF-16 2.7, where 3FFF
-/// takes 1.1). It does not bring every block back, and stays so, since stored texts depend on it: the decoder refuses
-/// every block whose size is a multiple of 3, and reads some bytes back changed (7,680 of the 65,536 blocks of two
-/// bytes, and most long ones). Its units 1 to 4 and 11 to 14 (hexadecimal) are not allowed in XML documents. Use
-/// C3FFFEncoder.
+/// Bytes as 3F text, for hosts that have such texts; new ones take C3FFFEncoder.
+/// 3F does not bring every block back, and stays so, since stored texts depend on it: the decoder refuses every block
+/// whose size is a multiple of 3, and reads some bytes back changed (7,680 of the 65,536 blocks of two bytes, and most
+/// long ones). Units 1 to 4 and 11 to 14 (hexadecimal), which it uses, are not allowed in XML documents. It takes about
+/// 1.5 bytes of UTF-8 for each byte, 3FFF 1.7; of UTF-16 2.7, 3FFF 1.1.
 class TAVO_API C3FEncoder final : public IStringSubmitter {
 public:
     C3FEncoder(const void* data, std::size_t size) noexcept;
