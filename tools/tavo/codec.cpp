@@ -1,7 +1,7 @@
 // tavo codec
 
 #include "commands.h"
-#include "position.h"
+#include "encodings.h"
 #include "streams.h"
 #include "text.h"
 
@@ -17,66 +17,28 @@ using Units = std::vector<wchar_t>;
 
 std::string NameOf(const std::string& file) { return file == "-" ? "(standard input)" : file; }
 
-// The first fault of a text, in words.
-struct Fault {
-    std::size_t offset; // bytes from the start of the file
-    std::string what;
-};
-
-std::string UnitName(std::uint32_t character) {
-    std::string digits;
-    for (int shift = character > 0xFFFF ? 20 : 12; shift >= 0; shift -= 4)
-        digits += "0123456789ABCDEF"[character >> shift & 15];
-    return "U+" + digits;
+// The units of a text, without the ends of lines behind it. False with the reason for what stands behind them.
+bool ReadUnits(const EncodedText& text, Units& units, std::string& why) {
+    for (std::size_t at = text.Begin(); at < text.End();) {
+        const Character character = text.Standard(at);
+        why = character.fault;
+        if (why.empty() && (character.value == 0 || character.value > 0xFFFF))
+            why = CodePointName(character.value) + " belongs to no code";
+        if (!why.empty()) return false;
+        units.push_back(static_cast<wchar_t>(character.value));
+        at += character.units;
+    }
+    if (text.Rest()) why = "the text ends within a unit";
+    while (why.empty() && !units.empty() && (units.back() == '\n' || units.back() == '\r')) units.pop_back();
+    return why.empty();
 }
 
-// The file's text in units: UTF-8, or UTF-16 with its mark. Ends of lines behind the text do not belong to it.
-class Text {
-public:
-    explicit Text(std::string_view bytes) : m_bytes(bytes) {
-        if (IsUtf16())
-            m_start = 2;
-        else if (bytes.substr(0, 3) == "\xEF\xBB\xBF")
-            m_start = 3;
-    }
-
-    const Units& All() const { return m_units; }
-    // False with the first place that is no unit.
-    bool Read(Fault& fault) {
-        std::string_view rest = m_bytes.substr(m_start);
-        while (!rest.empty()) {
-            const std::size_t offset = m_bytes.size() - rest.size();
-            const std::uint32_t character = Take(rest);
-            if (character > 0xFFFF || character == 0) {
-                fault = {offset, character == kNoCharacter ? "the bytes are no text"
-                                                           : UnitName(character) + " belongs to no code"};
-                return false;
-            }
-            m_units.push_back(static_cast<wchar_t>(character));
-        }
-        while (!m_units.empty() && (m_units.back() == '\n' || m_units.back() == '\r')) m_units.pop_back();
-        return true;
-    }
-    std::size_t OffsetOf(std::size_t unit) const {
-        std::string_view rest = m_bytes.substr(m_start);
-        while (unit-- > 0 && !rest.empty()) Take(rest);
-        return m_bytes.size() - rest.size();
-    }
-
-private:
-    bool IsUtf16() const { return m_bytes.substr(0, 2) == "\xFF\xFE" || m_bytes.substr(0, 2) == "\xFE\xFF"; }
-    std::uint32_t Take(std::string_view& rest) const {
-        if (!IsUtf16()) return TakeUtf8(rest);
-        if (rest.size() < 2) return kNoCharacter;
-        const auto first = static_cast<unsigned char>(rest[0]), second = static_cast<unsigned char>(rest[1]);
-        rest.remove_prefix(2);
-        return m_bytes[0] == '\xFF' ? first | second << 8 : first << 8 | second;
-    }
-
-    std::string_view m_bytes;
-    std::size_t m_start = 0;
-    Units m_units;
-};
+// The bytes before a unit, when all before it are good.
+std::size_t OffsetOf(const EncodedText& text, std::size_t unit) {
+    std::size_t at = text.Begin();
+    while (unit-- > 0 && at < text.End()) at += text.Standard(at).units;
+    return text.Offset(at);
+}
 
 // --- 3F and 3FFF -----------------------------------------------------------------------------------------------------
 
@@ -124,10 +86,10 @@ bool FindFault(const Code& code, const Units& units, std::size_t& at, std::strin
     if (code.group == 3 && padding == 3)
         return wrong(0, "U+0103 stands for a size that is a multiple of 3: such a text is written but never decoded");
     if (padding < code.from || padding > code.to)
-        return wrong(0, UnitName(units[0]) + " is no header: that is " + UnitName(code.mark + code.from) + " to " +
-                            UnitName(code.mark + code.to));
+        return wrong(0, CodePointName(units[0]) + " is no header: that is " + CodePointName(code.mark + code.from) +
+                            " to " + CodePointName(code.mark + code.to));
     for (std::size_t i = 1; i < units.size(); ++i)
-        if (!code.isUnit((i - 1) % 4, units[i])) return wrong(i, UnitName(units[i]) + " does not belong there");
+        if (!code.isUnit((i - 1) % 4, units[i])) return wrong(i, CodePointName(units[i]) + " does not belong there");
     if (units.size() % 4 != 1) return wrong(units.size(), "the text ends within a group of four units");
     if (units.size() == 1 && padding % code.group != 0) return wrong(1, "the text ends where a padded group belongs");
     return false;
@@ -176,7 +138,7 @@ bool FromHex(const Units& units, bool lowFirst, std::string& bytes, std::size_t&
         if (unit == ' ' || unit == '\t' || unit == '\n' || unit == '\r') continue;
         const int digit = Digit(unit);
         if (digit < 0) {
-            why = UnitName(unit) + " is no hexadecimal digit";
+            why = CodePointName(unit) + " is no hexadecimal digit";
             return false;
         }
         if (high >= 0) bytes += static_cast<char>(lowFirst ? digit << 4 | high : high << 4 | digit);
@@ -231,25 +193,24 @@ int CodecEncode(const CodecOptions& options) {
 int CodecDecode(const CodecOptions& options) {
     std::string file;
     if (!Read(options, file)) return kFileTrouble;
-    Text text(file);
-    Fault fault;
-    const auto refuse = [&](std::size_t unit) {
-        Complain(NameOf(options.file) + ": unit " + std::to_string(unit + 1) + ", at offset " +
-                 std::to_string(fault.offset) + ": " + fault.what);
-        return kBadInput;
-    };
-    if (!text.Read(fault)) return refuse(text.All().size());
-    std::size_t at = 0;
-    std::string bytes;
+    const EncodedText text(file, GuessTextFormat(file));
     const Code* const code = FindCode(options.code);
-    const bool good = code ? !FindFault(*code, text.All(), at, fault.what)
-                           : FromHex(text.All(), options.nibbles == kLowFirst, bytes, at, fault.what);
+    Units units;
+    std::string bytes, why;
+    std::size_t at = 0;
+    bool good = ReadUnits(text, units, why);
+    if (!good)
+        at = units.size();
+    else if (code)
+        good = !FindFault(*code, units, at, why);
+    else
+        good = FromHex(units, options.nibbles == kLowFirst, bytes, at, why);
     if (!good) {
-        fault.offset = text.OffsetOf(at);
-        return refuse(at);
+        Complain(NameOf(options.file) + ": unit " + std::to_string(at + 1) + ", at offset " +
+                 std::to_string(OffsetOf(text, at)) + ": " + why);
+        return kBadInput;
     }
     if (!code) return Write(options, bytes);
-    Units units = text.All();
     const std::size_t size = units.size() / 4 * code->group - (units[0] - code->mark) % code->group;
     units.push_back(0);
     const CPPlainMemory memory = code->decode(units.data());

@@ -1,18 +1,38 @@
 #include "text.h"
 
 #include <algorithm>
+#include <cstdint>
 
 namespace tool {
 
 namespace {
 
 constexpr std::uint32_t kReplacement = 0xFFFD;
+constexpr std::uint32_t kNone = 0xFFFFFFFF;
 
 struct SequenceForm {
     std::uint32_t lead, mask; // the bits that mark the lead byte, and those that carry the value
     std::uint32_t least;      // shorter forms exist below
 };
 constexpr SequenceForm kSequences[] = {{0x00, 0x7F, 0}, {0xC0, 0x1F, 0x80}, {0xE0, 0x0F, 0x800}, {0xF0, 0x07, 0x10000}};
+
+// Takes one character off the front; kNone when there is none.
+std::uint32_t TakeUtf8(std::string_view& text) {
+    const auto lead = static_cast<unsigned char>(text[0]);
+    for (std::size_t more = 0; more < std::size(kSequences); ++more) {
+        const auto& form = kSequences[more];
+        if ((lead & ~form.mask) != form.lead || text.size() <= more) continue;
+        std::uint32_t character = lead & form.mask;
+        for (std::size_t i = 1; i <= more; ++i) {
+            const auto next = static_cast<unsigned char>(text[i]);
+            if ((next & 0xC0) != 0x80) return kNone;
+            character = character << 6 | (next & 0x3F);
+        }
+        text.remove_prefix(more + 1);
+        return character >= form.least && character <= 0x10FFFF ? character : kNone;
+    }
+    return kNone;
+}
 
 void AddUtf8(std::string& text, std::uint32_t character) {
     std::size_t more = 0;
@@ -43,28 +63,11 @@ std::string Encode(const wchar_t* text, Pairs pairs, bool replaceSingles) {
 
 } // namespace
 
-std::uint32_t TakeUtf8(std::string_view& text) {
-    const auto lead = static_cast<unsigned char>(text[0]);
-    for (std::size_t more = 0; more < std::size(kSequences); ++more) {
-        const auto& form = kSequences[more];
-        if ((lead & ~form.mask) != form.lead || text.size() <= more) continue;
-        std::uint32_t character = lead & form.mask;
-        for (std::size_t i = 1; i <= more; ++i) {
-            const auto next = static_cast<unsigned char>(text[i]);
-            if ((next & 0xC0) != 0x80) return kNoCharacter;
-            character = character << 6 | (next & 0x3F);
-        }
-        text.remove_prefix(more + 1);
-        return character >= form.least && character <= 0x10FFFF ? character : kNoCharacter;
-    }
-    return kNoCharacter;
-}
-
 bool ToWide(std::string_view text, Pairs pairs, WideText& wide) {
     wide = WideText();
     while (!text.empty()) {
         std::uint32_t character = TakeUtf8(text);
-        if (character == 0 || character == kNoCharacter) return false;
+        if (character == 0 || character == kNone) return false;
         if (character >= 0x10000) {
             character -= Offset(pairs);
             wide.Add(static_cast<wchar_t>(0xD800 + (character >> 10)));

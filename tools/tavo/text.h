@@ -2,7 +2,6 @@
 // Text inside the tool is UTF-8; the library takes and gives wide text. Names of files need the standard's pairs, texts
 // of documents the pairs that the library made when it read them.
 
-#include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -28,11 +27,6 @@ public:
 private:
     std::vector<wchar_t> m_units;
 };
-
-// Takes one character off the front of a text that is not empty. kNoCharacter for what is no UTF-8: overlong forms and
-// what lies above 10FFFF are none, surrogates pass.
-constexpr std::uint32_t kNoCharacter = 0xFFFFFFFF;
-std::uint32_t TakeUtf8(std::string_view& text);
 
 // False for bytes that are no UTF-8 and for a zero character. Single surrogates pass, so that every file name of
 // Windows makes the round trip.
