@@ -12,6 +12,7 @@ void Core();
 void Memory();
 void Text();
 void PooledStrings();
+void BytesAsText();
 void Xml();
 void Fractions();
 void Timecode();

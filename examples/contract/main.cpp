@@ -27,6 +27,7 @@ int main() {
                  {"Memory", Memory},
                  {"Text", Text},
                  {"Pooled strings", PooledStrings},
+                 {"Bytes as text", BytesAsText},
                  {"XML", Xml},
                  {"Fractions", Fractions},
                  {"Timecode", Timecode},
