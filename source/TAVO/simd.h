@@ -50,7 +50,7 @@ TAVO_INLINE std::uint32_t Mask(Block a) { return static_cast<std::uint32_t>(_mm_
 // The bytes as 16-bit units, low and high half.
 TAVO_INLINE Block WidenLow(Block a) { return _mm_unpacklo_epi8(a, _mm_setzero_si128()); }
 TAVO_INLINE Block WidenHigh(Block a) { return _mm_unpackhi_epi8(a, _mm_setzero_si128()); }
-// Bytes of two blocks of 16-bit units below 100, in order.
+// Bytes of two blocks of 16-bit units, in order; of units from 100 up 255, from 8000 up 0 or 255.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
 // 32-bit lanes.
@@ -251,10 +251,15 @@ inline Block WidenHigh(Block a) {
 }
 inline Block Narrow(Block a, Block b) {
     Block x;
+    const auto byte = [](const std::uint8_t* unit) -> std::uint8_t { return unit[1] ? 0xFF : unit[0]; };
+    for (int i = 0; i < 8; ++i) x.b[i] = byte(a.b + i * 2), x.b[i + 8] = byte(b.b + i * 2);
+    return x;
+}
+inline Block PackSigned(Block a, Block b) {
+    Block x;
     for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
     return x;
 }
-inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
 inline std::uint64_t LowHalf(Block a) {
     std::uint64_t half;
     std::memcpy(&half, &a, sizeof half);

@@ -1,0 +1,467 @@
+// Typed values of elements and attributes: their texts, and what is read from texts.
+
+#include "support/heapwatch.h"
+
+#include <bit>
+#include <charconv>
+#include <clocale>
+#include <cmath>
+#include <random>
+#include <TAVO/acf.h>
+#include <TAVO/xml.h>
+
+using namespace TAVO;
+using namespace TAVO::XML;
+using ACF::cacfuid;
+using Math::CRational;
+using String::CPPoolString;
+using TimeCode::timecode;
+
+namespace {
+
+using Bytes = std::vector<unsigned char>;
+
+constexpr tagXMLFLAGMAP kMap[] = {{1, L"read"}, {6, L"write"}, {2, L"half"}, {0, L"none"}, {8, nullptr}, {16, L""}};
+constexpr std::size_t kMapCount = std::size(kMap);
+
+std::string Narrow(const CPPoolString& text) {
+    std::string narrow;
+    for (const wchar_t* c = text; *c; ++c) narrow += static_cast<char>(*c);
+    return narrow;
+}
+
+CPXMLObject Element(const CPPoolString& data = nullptr) {
+    CPXMLObject element;
+    EXPECT_TRUE(element.SetName(L"e") && element.Add(data));
+    return element;
+}
+
+// Stores a value by each of the six operations and requires the same text of all; that text.
+template <class... Value> std::string Stored(const Value&... value) {
+    CPXMLObject element = Element(), full = Element(L"x"), parent = Element();
+    EXPECT_TRUE(element.Add(value...) && full.Set(value...));
+    const std::string text = Narrow(element.GetData());
+    EXPECT_EQ(Narrow(full.GetData()), text);
+    EXPECT_EQ(element.Add(value...), text.empty()) << "data is never appended to";
+    EXPECT_EQ(element.AddAttribute(L"a", value...), !text.empty());
+    EXPECT_TRUE(full.AddAttribute(L"a", L"x") && full.SetAttribute(L"a", value...) == !text.empty());
+    EXPECT_EQ(Narrow(element.FindAttribute(L"a")), text);
+    EXPECT_EQ(Narrow(full.FindAttribute(L"a")), text);
+    EXPECT_FALSE(element.AddAttribute(L"a", value...));
+    EXPECT_EQ(parent.AddTag(L"t", value...).sIndex(), 0u);
+    EXPECT_EQ(parent.AddTag(L"u", value...).sIndex(), 1u);
+    EXPECT_EQ(Narrow(parent.item(1).GetData()), text);
+    EXPECT_EQ(parent.SetTag(L"v", value...).sIndex(), 0u);
+    EXPECT_EQ(Narrow(parent.FindElementData(L"v")), text);
+    EXPECT_FALSE(parent.item(1) || parent.AddTag(L"0", value...) || parent.AddAttribute(L"0", value...));
+    EXPECT_FALSE(CPXMLObject().Add(value...) || CPXMLObject().SetTag(L"t", value...));
+    return text;
+}
+
+// --- readers by name -------------------------------------------------------------------------------------------------
+
+template <class Number> std::string Shown(Number value) {
+    char text[40];
+    return {text, std::to_chars(text, text + sizeof text, value).ptr};
+}
+std::string Shown(bool value) { return value ? "yes" : "no"; }
+std::string Shown(const CRational& value) { return Shown(value.num()) + '/' + Shown(value.den()); }
+std::string Shown(const _acfUID& value) { return std::string(cacfuid(value).ANSI()).substr(24); }
+std::string Shown(const timecode& value) { return Shown(static_cast<long long>(value)) + ' ' + Shown(value.sys()); }
+
+// What one text reads as: its value, or "-" for the default.
+struct Reader {
+    const char* name;
+    std::string (*data)(const CPXMLObject& element);
+    std::string (*element)(const CPXMLObject& parent);
+    std::string (*attribute)(const CPXMLObject& element);
+};
+
+template <class Value, class Read> std::string Show(Value one, Value other, Read read) {
+    const Value first = read(one), second = read(other);
+    if (Shown(first) == Shown(one) && Shown(second) == Shown(other)) return "-";
+    EXPECT_EQ(Shown(first), Shown(second));
+    return Shown(first);
+}
+
+#define READER_WITH(Suffix, one, other, ...)                                                                           \
+    {                                                                                                                  \
+#Suffix,                                                                                                          \
+     [](const CPXMLObject& e) {                                                                                        \
+         return Show(one, other, [&](const auto& fallback) { return e.GetData##Suffix(__VA_ARGS__ fallback); });       \
+     },                                                                                                                \
+     [](const CPXMLObject& e) {                                                                                        \
+         return Show(one, other,                                                                                       \
+                     [&](const auto& fallback) { return e.FindElement##Suffix(L"e", __VA_ARGS__ fallback); });         \
+     },                                                                                                                \
+     [](const CPXMLObject& e) {                                                                                        \
+         return Show(one, other,                                                                                       \
+                     [&](const auto& fallback) { return e.FindAttribute##Suffix(L"a", __VA_ARGS__ fallback); });       \
+     }    \
+    }
+#define READER(Suffix, one, other) READER_WITH(Suffix, one, other, )
+#define COMMA ,
+
+const Reader kReaders[] = {
+    READER(Int, 77, 78),
+    READER(UInt, 77u, 78u),
+    READER(LInt, 77LL, 78LL),
+    READER(LUInt, 77ULL, 78ULL),
+    READER(Hex, 77u, 78u),
+    READER(EDouble, 0.77, 0.78),
+    READER(Double, 0.77, 0.78),
+    READER(FileTime, 77ULL, 78ULL),
+    READER(Rational, CRational(77), CRational(78)),
+    READER(Bool, false, true),
+    READER(GUID, (_acfUID{7, 7, 7, {7, 7, 7}}), (_acfUID{8, 8, 8, {8, 8, 8}})),
+    READER(Timecode, timecode(77LL, 0), timecode(78LL, 1)),
+    READER_WITH(Index, std::size_t(77), std::size_t(78), L"a;bb;c" COMMA L';' COMMA),
+    READER_WITH(Flags, 77u, 78u, kMap COMMA kMapCount COMMA L';' COMMA),
+};
+constexpr std::size_t kDataOnlyReaders = 7; // the first ones
+
+const Reader& Named(const std::string& name) {
+    for (const Reader& reader : kReaders)
+        if (reader.name == name) return reader;
+    throw name;
+}
+
+std::string Read(const Reader& reader, const CPPoolString& text) {
+    CPXMLObject parent;
+    EXPECT_TRUE(parent.SetName(L"p"));
+    const CPXMLObject element = Element(text);
+    EXPECT_TRUE(parent.AddTag(L"other") && parent.AddAttribute(L"a", text) == text.isdef() && parent.Add(element));
+    const std::string read = reader.data(element);
+    EXPECT_EQ(reader.element(parent), read) << reader.name;
+    EXPECT_EQ(reader.attribute(parent), read) << reader.name;
+    return read;
+}
+
+double ReadDouble(const std::string& text) { return Element(text.c_str()).GetDataDouble(0.25); }
+
+std::uint64_t Bits(double value) { return std::bit_cast<std::uint64_t>(value); }
+
+} // namespace
+
+// --- writing ---------------------------------------------------------------------------------------------------------
+
+TEST(XmlValues, TextsOfValues) {
+    EXPECT_EQ(Stored(0ULL), "0");
+    EXPECT_EQ(Stored(255ULL), "ff");
+    EXPECT_EQ(Stored(std::size_t(0x123456789ABCDEF0)), "123456789abcdef0");
+    EXPECT_EQ(Stored(CRational(-30000, 1001)), "-30000/1001");
+    EXPECT_EQ(Stored(CRational(1, 0)), "1/0");
+    EXPECT_EQ(Stored(1.5), "3ff8000000000000(1.5)");
+    EXPECT_EQ(Stored(-0.1f), "bfb99999a0000000(-0.1)");
+    EXPECT_EQ(Stored(12345.678), "40c81cd6c8b43958(1.235e+04)");
+    EXPECT_EQ(Stored(0.0), "0(0)");
+    EXPECT_EQ(Stored(-1.7976931348623157e308), "ffefffffffffffff(-1.798e+308)");
+    EXPECT_EQ(Stored(true), "true");
+    EXPECT_EQ(Stored(false), "false");
+    EXPECT_EQ(Stored(timecode(1, 0, 0, 0, 0)), "01:00:00:00 {25/1}Hz");
+    EXPECT_EQ(Stored(timecode()), "--:--:--:-- {25/1}Hz");
+    EXPECT_EQ(Stored(cacfuid(L"15603cd4-ab81-4d6f-b05f-c6bea760a789")), "15603CD4-AB81-4D6F-B05F-C6BEA760A789");
+    EXPECT_EQ(Stored(_acfUID{}), "00000000-0000-0000-0000-000000000000");
+    EXPECT_EQ(Stored(L"text"), "text");
+    EXPECT_EQ(Stored(CPPoolString(-5)), "-5") << "decimal numbers, the explicit way";
+}
+
+// Which arguments compile.
+template <class... Value>
+concept CanAdd = requires(CPXMLObject e, Value... value) {
+    e.Add(value...);
+};
+template <class... Value>
+concept CanTag = requires(CPXMLObject e, Value... value) {
+    e.AddTag(L"t", value...), e.SetTag(L"t", value...), e.AddAttribute(L"a", value...), e.SetAttribute(L"a", value...);
+    e.Set(value...);
+};
+template <class... Values> constexpr bool kNoneFits = (!(CanAdd<Values> || CanTag<Values>)&&...);
+enum Plain { kPlain };
+static_assert(
+    kNoneFits<int, unsigned, long, short, char, wchar_t, signed char, long long, char16_t, Plain, long double>);
+static_assert(CanTag<unsigned long> == (sizeof(long) == 8), "32 bits on one system, never two meanings");
+static_assert(kNoneFits<void*, const int*, CRational*, const unsigned short*> && !CanTag<const wchar_t*, int>);
+static_assert(CanAdd<std::nullptr_t> && CanTag<const char*> && CanTag<const unsigned char*>, "text, not bool");
+
+// Intended: low-half-first
+TEST(XmlValues, BytesLowHalfFirstIntended) {
+    const unsigned char few[] = {0x12, 0xAB};
+    EXPECT_EQ(Stored(few, 2ULL), "21BA");
+    EXPECT_EQ(Stored(few, 0ULL), "") << "nothing to add";
+    EXPECT_FALSE(Element().Add(static_cast<unsigned char*>(nullptr), 0)) << "the pointer is looked at first";
+    EXPECT_FALSE(Element().Add(few, ~0ULL) || Element().Add(few, ~0ULL / 2 + 1));
+    Bytes bytes(67), read(67);
+    for (std::size_t i = 0; i < bytes.size(); ++i) bytes[i] = static_cast<unsigned char>(i * 7 + 9);
+    for (std::size_t size = 1; size <= bytes.size(); ++size) {
+        CPXMLObject element = Element();
+        ASSERT_TRUE(element.Add(bytes.data(), size) && element.GetDataBinarySize() == size);
+        read.assign(bytes.size(), 0xEE);
+        EXPECT_FALSE(element.GetDataBinary(read.data(), size - 1) || element.GetDataBinary(nullptr, size));
+        EXPECT_EQ(read[0], 0xEE) << "untouched";
+        EXPECT_TRUE(element.GetDataBinary(read.data(), size));
+        EXPECT_TRUE(std::equal(read.begin(), read.begin() + size, bytes.begin()) &&
+                    Bytes(read.begin() + size, read.end()) == Bytes(read.size() - size, 0xEE));
+
+        // One bad digit, wherever it stands; and one digit missing.
+        std::string text = Narrow(element.GetData());
+        for (const char bad : {'G', '/', ':', '@', '`', 'g', ' '}) {
+            std::string damaged = text;
+            damaged[size * 2 - 1 - size % 5] = bad;
+            EXPECT_EQ(Element(damaged.c_str()).GetDataBinarySize(), 0u) << damaged;
+        }
+        EXPECT_FALSE(Element(text.substr(1).c_str()).GetDataBinary(read.data(), size));
+    }
+    EXPECT_TRUE(Element(L"1Fab").GetDataBinary(read.data(), 2) && read[0] == 0xF1 && read[1] == 0xBA) << "either case";
+    EXPECT_EQ(Element(L"0000000000000\x130").GetDataBinarySize(), 0u) << "no digit's low byte";
+    EXPECT_FALSE(Element().GetDataBinary(read.data(), 9) || CPXMLObject().GetDataBinarySize());
+}
+
+TEST(XmlValues, FlagsByName) {
+    const struct {
+        ulong32 flags;
+        const char* text;
+    } rows[] = {{1, "read"},       {7, "read;write"}, {2, "half"},      {9, "read;0x00000008"},
+                {0, "0x00000000"}, {4, "0x00000004"}, {3, "read;half"}, {~0u, "read;write;0xfffffff8"}};
+    for (const auto& row : rows) {
+        EXPECT_EQ(Stored(row.flags, kMap, kMapCount, L';'), row.text);
+        EXPECT_EQ(Element(row.text).GetDataFlags(kMap, kMapCount, L';', 99), row.flags);
+    }
+    EXPECT_EQ(Stored(1u, static_cast<const tagXMLFLAGMAP*>(nullptr), std::size_t(3), L';'), "0x00000001");
+}
+
+// --- reading ---------------------------------------------------------------------------------------------------------
+
+TEST(XmlValues, WhatTextsRead) {
+    const struct {
+        const char* reader;
+        std::vector<std::pair<const wchar_t*, const char*>> rows; // text and value, "-" for the default
+    } tables[] = {
+        {"Int",
+         {{L"42", "42"},
+          {L" \t\n-7x", "-7"},
+          {L"+3", "3"},
+          {L"0x1F", "0"},
+          {L"2147483648", "-2147483648"},
+          {L"4294967297", "1"},
+          {L"-", "-"},
+          {L"+-1", "-"},
+          {L"x1", "-"},
+          {L"1.9", "1"},
+          {L"\x0661", "-"},
+          {L"\xA0\x31", "-"}}},
+        {"UInt",
+         {{L"4294967295", "4294967295"}, {L"-1", "4294967295"}, {L"4294967296", "0"}, {L"/", "-"}, {L":", "-"}}},
+        {"LInt", {{L"-9223372036854775808", "-9223372036854775808"}, {L"9223372036854775808", "-9223372036854775808"}}},
+        {"LUInt",
+         {{L"18446744073709551615", "18446744073709551615"},
+          {L"18446744073709551617", "1"},
+          {L"-1", "18446744073709551615"}}},
+        {"FileTime", {{L" 132539328000000000", "132539328000000000"}, {L"-", "-"}}},
+        {"Hex",
+         {{L"fF", "255"},
+          {L" -0X10", "4294967280"},
+          {L"123456789", "591751049"},
+          {L"0x", "-"},
+          {L"g", "-"},
+          {L"0x0123456789abcdef", "2309737967"},
+          {L"0000000000000000000000001f", "31"}}},
+        {"Rational",
+         {{L"30000/1001", "30000/1001"},
+          {L" -6 \n/ 4 x", "-3/2"},
+          {L"3/-6", "-1/2"},
+          {L"5/0", "1/0"},
+          {L"5", "-"},
+          {L"5/", "-"},
+          {L"/5", "-"},
+          {L"5:6", "-"},
+          {L"4294967299/6", "1/2"},
+          {L"5 / x", "-"}}},
+        {"Bool", {{L"true", "yes"}, {L"false", "no"}, {L"true ", "-"}, {L"1", "-"}, {L"yes", "-"}}},
+        {"EDouble",
+         {{L"3ff8000000000000(1.5)", "1.5"},
+          {L" 0x3FF8000000000000", "1.5"},
+          {L"0(0)", "0"},
+          {L"(1.5)", "-"},
+          {L"bff0000000000000", "-1"},
+          {L"53ff8000000000000", "1.5"},
+          {L"3ff8000000000000a", "-1.4044477616111874e+306"}}},
+        {"Double",
+         {{L"1.5", "1.5"},
+          {L" -.5e+1x", "-5"},
+          {L"2.", "2"},
+          {L"1e", "1"},
+          {L"1e+", "1"},
+          {L"1e400", "inf"},
+          {L"-1e400", "-inf"},
+          {L"1e-400", "0"},
+          {L"0e99999999999999999999", "0"},
+          {L"1e99999999999999999999", "inf"},
+          {L"inf", "-"},
+          {L"nan", "-"},
+          {L"0x10", "0"},
+          {L".", "-"},
+          {L"-.e1", "-"},
+          {L"e1", "-"},
+          {L"1,5", "1"},
+          {L"\x0661.5", "-"}}},
+        {"GUID", {{L"15603CD4-AB81-4D6F-B05F-C6BEA760A789", "C6BEA760A789"}, {L"1-2-3-4-5", "-"}}},
+        {"Timecode",
+         {{L"00:00:01:00 {25/1}Hz", "1200 0"},
+          {L"00:00:00:02 {30000/1001}Hz/D", "80 2"},
+          {L"--:--:--:-- {24/1}Hz", "0 131072"},
+          {L"00:00:00:25 {25/1}Hz", "0 65536"},
+          {L"00:00:01:00", "-"},
+          {L"00:00:01:00 {25/3}Hz", "-"},
+          {L"--:--:--:--", "-"},
+          {L"00:00:01:00 {25/1}Hz                           ", "1200 0"},
+          {L"00:00:01:00 {25/1}Hz                            ", "-"}}},
+        {"Index", {{L"a", "0"}, {L"bb", "1"}, {L"c", "2"}, {L"b", "-"}, {L"a;bb", "0"}, {L"c;", "-"}}},
+        {"Flags",
+         {{L"read", "1"},
+          {L"half;0x80", "130"},
+          {L"0xFFFFFFFF;read", "4294967295"},
+          {L"read;", "-"},
+          {L";", "-"},
+          {L"read; write", "-"},
+          {L"0x", "-"},
+          {L"0x000000001", "-"},
+          {L"8", "-"},
+          {L"0x1g", "-"},
+          {L"rea", "-"},
+          {L"none", "-"}}},
+    };
+    for (const auto& table : tables) {
+        const Reader& reader = Named(table.reader);
+        EXPECT_EQ(Read(reader, nullptr), "-") << reader.name;
+        for (const auto& [text, value] : table.rows)
+            EXPECT_EQ(Read(reader, text), value) << reader.name << ": " << Narrow(text);
+    }
+    EXPECT_EQ(Read(Named("GUID"), L"15603CD4"), "000000000000") << "no four dashes: the null identifier";
+    CPXMLObject element = Element(L"text");
+    EXPECT_TRUE(element.AddTag(L"t", L"x") && element.AddAttribute(L"a", L"y"));
+    EXPECT_TRUE(element.FindElementString(L"t") == L"x" && element.FindAttributeString(L"a", L"z") == L"y");
+    EXPECT_TRUE(element.FindElementString(L"u", L"z") == L"z" && element.FindAttributeString(L"u").isempty());
+    EXPECT_EQ(element.GetDataIndex(L"b", L';'), Buffers::NotFound);
+    EXPECT_EQ(element.GetDataIndex(nullptr, L';'), Buffers::NotFound);
+}
+
+// The pool keeps its group for the variants of a static string.
+TEST(XmlValues, BoolsInAnyCaseKeepsBlocks) {
+    for (const wchar_t* text : {L"TrUe", L"TRUE", L"False"})
+        EXPECT_EQ(Read(Named("Bool"), text), *text == L'T' ? "yes" : "no");
+}
+
+// Intended: numbers-of-mixed-elements
+TEST(XmlValues, ElementsWithChildrenHaveNoNumbersIntended) {
+    const CPPoolString text = L"3/4";
+    CPXMLObject mixed = Element(text), parent = Element();
+    EXPECT_TRUE(mixed.AddTag(L"child") && parent.Add(mixed) && parent.AddAttribute(L"a", text));
+    for (std::size_t i = 0; i < std::size(kReaders); ++i) {
+        const Reader& reader = kReaders[i];
+        const std::string alone = reader.data(Element(text));
+        EXPECT_EQ(reader.data(mixed), i < kDataOnlyReaders ? "-" : alone) << reader.name;
+        EXPECT_EQ(reader.element(parent), i < kDataOnlyReaders ? "-" : alone) << reader.name;
+        EXPECT_EQ(reader.attribute(parent), alone) << reader.name;
+        EXPECT_EQ(reader.data(CPXMLObject()), "-") << reader.name;
+    }
+}
+
+TEST(XmlValues, DoublesComeBackBitForBit) {
+    std::mt19937_64 random(1);
+    const auto check = [](std::uint64_t bits) {
+        const double value = std::bit_cast<double>(bits);
+        CPXMLObject element = Element();
+        ASSERT_TRUE(element.Add(value));
+        ASSERT_EQ(Bits(element.GetDataEDouble(7)), bits);
+        if (!std::isfinite(value)) return; // how these read is the standard library's affair
+        char readable[32], expected[32];
+        const std::string text = Narrow(element.GetData());
+        std::snprintf(expected, sizeof expected, "%llx(%.4g)", static_cast<unsigned long long>(bits), value);
+        ASSERT_EQ(text, expected);
+        // The shortest text is read as the same value by the decimal reader.
+        *std::to_chars(readable, std::end(readable), value).ptr = 0;
+        ASSERT_EQ(Bits(ReadDouble(readable)), bits) << readable;
+    };
+    for (std::uint64_t exponent = 0; exponent < 4096; ++exponent)
+        for (const std::uint64_t fraction :
+             {std::uint64_t(0), std::uint64_t(1), ~std::uint64_t(0) >> 12, random() >> 12})
+            check(exponent << 52 | fraction);
+    for (int i = 0; i < 20000; ++i) check(random());
+}
+
+TEST(XmlValues, DecimalTextsReadAsTheStandardLibraryDoes) {
+    std::mt19937 random(2);
+    const auto digits = [&](unsigned most) {
+        std::string text(random() % (most + 1), '0');
+        for (char& digit : text)
+            if (random() % 4) digit = static_cast<char>('0' + random() % 10);
+        return text;
+    };
+    for (int i = 0; i < 20000; ++i) {
+        const unsigned most = i % 100 ? 25 : 1000;
+        std::string text = digits(most) + '.' + digits(most) + '1';
+        if (random() % 2) text += (random() % 2 ? "e" : "E-") + std::to_string(random() % 400);
+        EXPECT_EQ(Bits(ReadDouble(text)), Bits(std::strtod(text.c_str(), nullptr))) << text;
+    }
+    // Halves between two doubles, and just above, with more digits than anyone keeps.
+    std::string half = "9007199254740993." + std::string(2000, '0');
+    EXPECT_EQ(ReadDouble(half), 9007199254740992.0);
+    EXPECT_EQ(ReadDouble(half + '1'), 9007199254740994.0);
+    EXPECT_EQ(ReadDouble("0." + std::string(5000, '0') + "25e5001"), 2.5);
+    EXPECT_EQ(ReadDouble(std::string(5000, '1') + "e-4999"), ReadDouble("1." + std::string(30, '1')));
+}
+
+// Intended: decimal-of-double-text
+TEST(XmlValues, DecimalReaderOfDoublesOwnTextIntended) {
+    EXPECT_EQ(Element(L"3ff8000000000000(1.5)").GetDataDouble(), 3);
+    EXPECT_EQ(Element(L"400e000000000000(3.75)").GetDataDouble(), 400);
+}
+
+// Intended: local-decimal-point
+TEST(XmlValues, LocalesMoveOneDecimalPointIntended) {
+    const auto all = [] {
+        std::string texts = Stored(-1234.5) + Stored(CRational(-5, 3)) + Stored(timecode(1LL, 0));
+        for (const Reader& reader : kReaders)
+            for (const wchar_t* text :
+                 {L"1234.5", L"-7/2", L"00:00:01:00 {25/1}Hz", L" 1,5", L"-1,5", L"1.5,5", L"1.234,5"})
+                texts += Read(reader, text) + ' ';
+        return texts;
+    };
+    const std::string inC = all();
+    EXPECT_EQ(ReadDouble("1,5"), 1) << "no comma in C";
+    int found = 0;
+    for (const char* name : {"de_DE.UTF-8", "fr_FR.UTF-8", "German", "French"}) {
+        if (!std::setlocale(LC_ALL, name) || *std::localeconv()->decimal_point != ',') continue;
+        ++found;
+        EXPECT_EQ(all(), inC) << name;
+        for (const char* text : {"1,5", "00,15e1", "1,5x"}) EXPECT_EQ(ReadDouble(text), 1.5) << text;
+        EXPECT_EQ(ReadDouble(",5"), 0.5);
+        std::setlocale(LC_ALL, "C");
+    }
+    if (found == 0) GTEST_SKIP() << "no locale with a decimal comma is installed: run tools/setup";
+}
+
+TEST(XmlValues, FailingAllocationsLeaveElementsUsable) {
+    const CPPoolString kName = L"name";
+    const Bytes bytes(5000, 0x5A);
+    // The pool forgets the values' texts, so that each time they must be made anew.
+    const auto sweep = [] { EXPECT_TRUE(String::CStringPool::Collect(60000) && String::CStringPool::Collect(60000)); };
+    sweep();
+    support::ForEachFailingAllocation([&] {
+        {
+            CPXMLObject element, filled;
+            if (!element.SetName(kName) || !filled.SetName(kName) || !filled.Add(true)) return;
+            const bool added = element.Add(0x123456ULL);
+            EXPECT_EQ(element.GetData().isdef(), added);
+            EXPECT_TRUE(filled.Set(1.25) ? filled.GetDataEDouble() == 1.25 : filled.GetDataBool());
+            const bool replaced = filled.Set(bytes.data(), bytes.size());
+            EXPECT_EQ(filled.GetDataBinarySize(), replaced ? bytes.size() : 0);
+            EXPECT_TRUE(filled.GetData().isdef()) << "what could not be replaced stays";
+            const bool tagged = bool(element.AddTag(kName, 0x7654321u, kMap, kMapCount, L';'));
+            EXPECT_EQ(element.GetNElements(kName), tagged ? 1u : 0u);
+            EXPECT_EQ(element.FindElementFlags(kName, kMap, kMapCount, L';'), tagged ? 0x7654321u : 0u);
+        }
+        sweep();
+    });
+}
