@@ -21,85 +21,6 @@ namespace detail {
 
 namespace {
 
-// A decimal number: its digits * 10^exponent. A double lies between two halves of at most 767 digits; of a number with
-// more it is enough to know whether one of the others is not zero.
-class Decimal {
-public:
-    // Reads a number without sign; `point` is where the text has a decimal point that is no '.'. False without a digit.
-    bool Scan(Text text, const wchar_t* point) {
-        bool hasDigits = ScanDigits(text, 0);
-        if (*text.at == '.' || text.at == point) {
-            ++text.at;
-            hasDigits |= ScanDigits(text, -1);
-        }
-        if (hasDigits && (*text.at | 0x20) == 'e') ScanExponent(text.at + 1);
-        return hasDigits;
-    }
-
-    double Value() {
-        // Short numbers: both operands are exact, so the one operation rounds as it must.
-        constexpr int kExactDigits = 15, kExactPower = 22;
-        if (m_count <= kExactDigits && m_exponent >= -kExactPower && m_exponent <= kExactPower) {
-            const auto number = static_cast<double>(m_number);
-            return m_exponent < 0 ? number / kPowers[-m_exponent] : number * kPowers[m_exponent];
-        }
-        constexpr double kInfinity = std::numeric_limits<double>::infinity();
-        constexpr std::int64_t kFarOut = 400; // digits before the point, or zeros behind it
-        const std::int64_t magnitude = m_count ? m_exponent + m_count : -kFarOut;
-        if (magnitude >= kFarOut) return kInfinity;
-        if (magnitude <= -kFarOut) return 0;
-        if (m_hasMore) {
-            m_digits[m_count++] = '1';
-            --m_exponent;
-        }
-        m_digits[m_count] = 'e';
-        const char* end = std::to_chars(m_digits + m_count + 1, std::end(m_digits), m_exponent).ptr;
-        double value;
-        if (std::from_chars(m_digits, end, value).ec == std::errc()) return value;
-        return magnitude > 0 ? kInfinity : 0;
-    }
-
-private:
-    // `step` is what a digit adds to the exponent.
-    bool ScanDigits(Text& text, int step) {
-        const wchar_t* const first = text.at;
-        for (unsigned digit; (digit = DigitOf(*text.at)) < 10; ++text.at) {
-            if (m_count == kKept) {
-                m_exponent += step + 1;
-                m_hasMore |= digit != 0;
-                continue;
-            }
-            m_exponent += step;
-            if (m_count == 0 && digit == 0) continue;
-            m_digits[m_count++] = static_cast<char>('0' + digit);
-            m_number = m_number * 10 + digit; // used while it fits
-        }
-        return text.at != first;
-    }
-
-    void ScanExponent(const wchar_t* at) {
-        constexpr std::int64_t kEndless = std::numeric_limits<std::int64_t>::max() / 100;
-        const bool negative = *at == '-';
-        if (negative || *at == '+') ++at;
-        std::int64_t exponent = 0;
-        for (unsigned digit; (digit = DigitOf(*at)) < 10; ++at)
-            if (exponent < kEndless) exponent = exponent * 10 + digit;
-        m_exponent += negative ? -exponent : exponent;
-    }
-
-    static unsigned DigitOf(wchar_t unit) { return static_cast<unsigned>(unit) - '0'; }
-
-    static constexpr int kKept = 780;
-    static constexpr double kPowers[] = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-                                         1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
-
-    std::uint64_t m_number = 0;
-    std::int64_t m_exponent = 0;
-    int m_count = 0; // of digits, the first one not being 0
-    bool m_hasMore = false;
-    char m_digits[kKept + 32]; // room for one digit more and the exponent
-};
-
 // The unit behind the digits that lead the text, which may be of any script, if it is the locale's decimal point.
 //
 // Intended (local-decimal-point): blanks and signs do not count as leading digits, so "-1,5" is -1 in a locale with a
@@ -122,17 +43,6 @@ CPPoolString Interned(const char* text, const char* end) {
 }
 
 } // namespace
-
-bool ScanDecimalDouble(Text text, double& value) noexcept {
-    const wchar_t* const point = FindLocalPoint(text);
-    while (numberscan::IsBlank(*text.at)) ++text.at;
-    const bool negative = *text.at == '-';
-    if (negative || *text.at == '+') ++text.at;
-    Decimal number;
-    if (!number.Scan(text, point)) return false;
-    value = negative ? -number.Value() : number.Value();
-    return true;
-}
 
 } // namespace detail
 
@@ -232,7 +142,10 @@ bool ReadEDouble(const CPPoolString& stored, double& value) { return ScanDoubleB
 // Intended (decimal-of-double-text): the digits of a double's own text, which are those of its bits, are a decimal
 // number here: 1.5 is stored as "3ff8000000000000(1.5)" and reads as 3. A textbook reader would match its writer; that
 // is EDouble, and this one is for what others wrote.
-bool ReadDouble(const CPPoolString& stored, double& value) { return ScanDecimalDouble(TextIn(stored), value); }
+bool ReadDouble(const CPPoolString& stored, double& value) {
+    const Text text = TextIn(stored);
+    return ScanDecimalDouble(text, FindLocalPoint(text), value);
+}
 
 bool ReadGUID(const CPPoolString& stored, _acfUID& value) {
     ACF::cacfuid read;
@@ -412,19 +325,18 @@ namespace {
 // have it this way.
 void PutBytes(char* out, const unsigned char* bytes) {
     using namespace Simd;
-    const auto digits = [](Block units) {
-        const Block numbers = Or(And(units, All16(0x0F)), ShiftLeft16<4>(And(units, All16(0xF0))));
-        return Subtract8(Subtract8(numbers, All8(-'0')), And(AtLeast8(numbers, All8(10)), All8('0' + 10 - 'A')));
+    const auto halves = [](Block units) {
+        return Or(And(units, All16(0x0F)), ShiftLeft16<4>(And(units, All16(0xF0))));
     };
     const Block block = Load(bytes);
-    Store(out, digits(WidenLow(block)));
-    Store(out + kBlock, digits(WidenHigh(block)));
+    Store(out, HexCharacters(halves(WidenLow(block)), 'A'));
+    Store(out + kBlock, HexCharacters(halves(WidenHigh(block)), 'A'));
 }
 
 // Eight bytes of 16 digits.
 void TakeBytes(unsigned char* out, const wchar_t* digits) {
     using namespace Simd;
-    const Block numbers = HexDigitsOf(digits).numbers;
+    const Block numbers = HexDigitsOf(NarrowText(digits)).numbers;
     const Block bytes = And(Or(numbers, ShiftRight16<4>(numbers)), All16(0xFF));
     StoreHalf(out, Narrow(bytes, bytes));
 }
@@ -435,7 +347,7 @@ std::size_t CountBytes(Text text) {
     if (units % 2) return 0;
     constexpr std::uint32_t kAll = 0xFFFF;
     for (; text.end - text.at >= 16; text.at += 16)
-        if (HexDigitsOf(text.at).areDigits != kAll) return 0;
+        if (HexDigitsOf(Simd::NarrowText(text.at)).areDigits != kAll) return 0;
     for (; text.at != text.end; ++text.at)
         if (numberscan::DigitOf(*text.at) == numberscan::kNoDigit) return 0;
     return units / 2;
