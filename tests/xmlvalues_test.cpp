@@ -412,6 +412,15 @@ TEST(XmlValues, DecimalTextsReadAsTheStandardLibraryDoes) {
     EXPECT_EQ(ReadDouble(std::string(5000, '1') + "e-4999"), ReadDouble("1." + std::string(30, '1')));
 }
 
+// Intended: hexadecimal-writer
+TEST(XmlValues, NoReaderOfTheUnsignedWriterIntended) {
+    CPXMLObject element = Element();
+    EXPECT_TRUE(element.Add(0x9000000A1ULL));
+    EXPECT_EQ(element.GetDataHex(), 0xA1u);
+    EXPECT_EQ(element.GetDataLUInt(7), 9000000u) << "its digits before the first letter";
+    EXPECT_EQ(Bits(element.GetDataEDouble()), 0x9000000A1u);
+}
+
 // Intended: decimal-of-double-text
 TEST(XmlValues, DecimalReaderOfDoublesOwnTextIntended) {
     EXPECT_EQ(Element(L"3ff8000000000000(1.5)").GetDataDouble(), 3);

@@ -252,7 +252,7 @@ public:
     // --- Typed values: writing ---
     //
     // Every writer makes a text of the value and then does what the writer of that text does. There is one for
-    //   unsigned 64-bit numbers  lower-case hexadecimal, no prefix: 255 is "ff"
+    //   unsigned 64-bit numbers  lower-case hexadecimal, no prefix: 255 is "ff" (Hex reads the low 32 bits back)
     //   float, double            the 64 bits of the double as such a number, then what people read:
     //   "3ff8000000000000(1.5)" bool                     "true" or "false" Math::CRational          numerator and
     //   denominator: "30000/1001"; "1/0" is the undefined value TimeCode::timecode       its exchange form:

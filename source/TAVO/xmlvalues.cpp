@@ -50,6 +50,8 @@ using namespace detail;
 
 // --- Texts of values -----------------------------------------------------------------------------------------------
 
+// Intended (hexadecimal-writer): no integer reader takes all 64 bits back, since those of 64 bits are decimal. A
+// textbook would write what they read; files have these digits.
 CPPoolString CPXMLObject::TextOf(unsigned long long value) noexcept {
     char text[kValueRoom];
     return Interned(text, PutHex(text, value));

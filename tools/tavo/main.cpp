@@ -3,6 +3,7 @@
 #include "commands.h"
 #include "console.h"
 #include "streams.h"
+#include "value.h"
 
 #include <CLI/CLI.hpp>
 #include <functional>
@@ -60,6 +61,12 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
     command->add_option("PATH", get.path, kPathHelp)->required()->type_name("");
     command->add_option("--attribute", get.attribute, "the attribute of this name instead of the text")
         ->type_name("NAME");
+    command
+        ->add_option("--as", get.type,
+                     "the value that the text has as one of the types int, uint, hex, int64, uint64, "
+                     "filetime, double, edouble, rational, bool, timecode, id, binary")
+        ->check(CLI::IsMember(ValueTypeNames()).description(""))
+        ->type_name("TYPE");
 
     command = xml.add_subcommand("set", "Changes the text of an element, or an attribute, and writes the document");
     auto& set = Add<SetOptions>(*command, action, Set);
