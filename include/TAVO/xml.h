@@ -252,13 +252,14 @@ public:
     // --- Typed values: writing ---
     //
     // Every writer makes a text of the value and then does what the writer of that text does. There is one for
-    //   unsigned 64-bit numbers  lower-case hexadecimal, no prefix: 255 is "ff" (Hex reads the low 32 bits back)
-    //   float, double            the 64 bits of the double as such a number, then what people read:
-    //   "3ff8000000000000(1.5)" bool                     "true" or "false" Math::CRational          numerator and
-    //   denominator: "30000/1001"; "1/0" is the undefined value TimeCode::timecode       its exchange form:
-    //   "10:00:00:00 {25/1}Hz" _acfUID, ACF::cacfuid    upper-case groups: "15603CD4-AB81-4D6F-B05F-C6BEA760A789" bytes
-    //   and their number   two upper-case digits a byte, the low half FIRST: 12 AB is "21BA" flags and a map the names
-    //   of the bits between separators, "0x%08x" for bits without a name
+    // - unsigned 64-bit numbers: lower-case hexadecimal without prefix, 255 is "ff" (Hex reads the low 32 bits back);
+    // - float, double: the 64 bits of the double as such a number, then for people: "3ff8000000000000(1.5)";
+    // - bool: "true" or "false";
+    // - Math::CRational: numerator and denominator, "30000/1001"; "1/0" is the undefined value;
+    // - TimeCode::timecode: its exchange form, "10:00:00:00 {25/1}Hz";
+    // - _acfUID, ACF::cacfuid: upper case in groups, "15603CD4-AB81-4D6F-B05F-C6BEA760A789";
+    // - bytes and their number: two upper-case digits a byte, the low half FIRST, 12 AB is "21BA";
+    // - flags and a map: the names of the bits between separators, "0x%08x" for bits without a name.
     // No locale takes part. What cannot be made a text (a null pointer to bytes; memory is out) fails and changes
     // nothing.
     //

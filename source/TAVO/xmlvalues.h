@@ -4,6 +4,7 @@
 #include "numberscan.h"
 #include "simd.h"
 
+#include <algorithm>
 #include <bit>
 #include <charconv>
 #include <iterator>
@@ -195,14 +196,16 @@ inline bool ScanShort(const wchar_t* at, const wchar_t* point, double& value) {
 // Reads a number that ends within the first units of a text of at least 16, by the standard library's scanner.
 inline bool ScanMedium(Text text, const wchar_t* point, double& value) {
     using namespace Simd;
-    constexpr std::ptrdiff_t kMost = 64;
+    constexpr std::ptrdiff_t kMost = 2 * kBlock;
     if (DecimalDigit(*text.at) > 9 && *text.at != '.' && text.at != point) return false; // "inf"
-    const std::ptrdiff_t units = text.end - text.at < kMost ? text.end - text.at : kMost;
-    char narrow[kMost];
-    for (std::ptrdiff_t at = 0; at < units; at += kBlock) Store(narrow + at, NarrowText(text.at + at));
+    const std::ptrdiff_t units = std::min(text.end - text.at, kMost);
+    char narrow[kMost + kBlock];
+    Store(narrow, NarrowText(text.at));
+    const std::ptrdiff_t place = std::min<std::ptrdiff_t>(16, units);
+    Store(narrow + place, NarrowText(text.at + place));
     if (point && point - text.at < units) narrow[point - text.at] = '.';
     const auto [end, error] = std::from_chars(narrow, narrow + units, value);
-    return error == std::errc() && end != narrow + kMost;
+    return error == std::errc() && narrow + kMost - end > 2; // no exponent is cut
 }
 
 // Any number: its digits * 10^exponent. A double lies between two halves of at most 767 digits; of a number with more
