@@ -11,6 +11,7 @@
 #include <string>
 #include <TAVO/acf.h>
 #include <TAVO/xml.h>
+#include <type_traits>
 #include <vector>
 
 namespace {
@@ -101,7 +102,9 @@ private:
 };
 
 // Whether a reader answers `expected`, or each default where nothing is expected.
-template <class Value, class Read> void Check(Read read, const std::optional<Value>& expected, Value one, Value other) {
+template <class Value, class Read>
+void Check(Read read, const std::optional<Value>& expected, std::type_identity_t<Value> one,
+           std::type_identity_t<Value> other) {
     const Value first = read(one), second = read(other);
     Require(std::memcmp(&first, expected ? &*expected : &one, sizeof first) == 0);
     Require(std::memcmp(&second, expected ? &*expected : &other, sizeof second) == 0);

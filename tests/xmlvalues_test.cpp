@@ -2,11 +2,13 @@
 
 #include "support/heapwatch.h"
 
+#include <algorithm>
 #include <bit>
 #include <charconv>
 #include <clocale>
 #include <cmath>
 #include <random>
+#include <sstream>
 #include <TAVO/acf.h>
 #include <TAVO/xml.h>
 
@@ -69,14 +71,6 @@ std::string Shown(const CRational& value) { return Shown(value.num()) + '/' + Sh
 std::string Shown(const _acfUID& value) { return std::string(cacfuid(value).ANSI()).substr(24); }
 std::string Shown(const timecode& value) { return Shown(static_cast<long long>(value)) + ' ' + Shown(value.sys()); }
 
-// What one text reads as: its value, or "-" for the default.
-struct Reader {
-    const char* name;
-    std::string (*data)(const CPXMLObject& element);
-    std::string (*element)(const CPXMLObject& parent);
-    std::string (*attribute)(const CPXMLObject& element);
-};
-
 template <class Value, class Read> std::string Show(Value one, Value other, Read read) {
     const Value first = read(one), second = read(other);
     if (Shown(first) == Shown(one) && Shown(second) == Shown(other)) return "-";
@@ -84,57 +78,49 @@ template <class Value, class Read> std::string Show(Value one, Value other, Read
     return Shown(first);
 }
 
-#define READER_WITH(Suffix, one, other, ...)                                                                           \
-    {                                                                                                                  \
-#Suffix,                                                                                                          \
-     [](const CPXMLObject& e) {                                                                                        \
-         return Show(one, other, [&](const auto& fallback) { return e.GetData##Suffix(__VA_ARGS__ fallback); });       \
-     },                                                                                                                \
-     [](const CPXMLObject& e) {                                                                                        \
-         return Show(one, other,                                                                                       \
-                     [&](const auto& fallback) { return e.FindElement##Suffix(L"e", __VA_ARGS__ fallback); });         \
-     },                                                                                                                \
-     [](const CPXMLObject& e) {                                                                                        \
-         return Show(one, other,                                                                                       \
-                     [&](const auto& fallback) { return e.FindAttribute##Suffix(L"a", __VA_ARGS__ fallback); });       \
-     }    \
-    }
-#define READER(Suffix, one, other) READER_WITH(Suffix, one, other, )
-#define COMMA ,
+// What the first child's data and an attribute read as: a value, or "-" for the default.
+struct Reader {
+    const char* name;
+    std::pair<std::string, std::string> (*read)(const CPXMLObject& parent);
+};
 
+#define READER(Suffix, one, other, ...)                                                                                \
+    {                                                                                                                  \
+#Suffix, [](const CPXMLObject& parent) {                                                                       \
+            const auto show = [](auto read) { return Show(one, other, read); };                                        \
+            const auto data = show([&](auto d) { return parent.item(0).GetData##Suffix(__VA_ARGS__ d); });             \
+            EXPECT_EQ(show([&](auto d) { return parent.FindElement##Suffix(L"e", __VA_ARGS__ d); }), data);            \
+            return std::pair(data, show([&](auto d) { return parent.FindAttribute##Suffix(L"a", __VA_ARGS__ d); }));   \
+        }       \
+    }
 const Reader kReaders[] = {
-    READER(Int, 77, 78),
-    READER(UInt, 77u, 78u),
-    READER(LInt, 77LL, 78LL),
-    READER(LUInt, 77ULL, 78ULL),
-    READER(Hex, 77u, 78u),
-    READER(EDouble, 0.77, 0.78),
-    READER(Double, 0.77, 0.78),
-    READER(FileTime, 77ULL, 78ULL),
-    READER(Rational, CRational(77), CRational(78)),
-    READER(Bool, false, true),
-    READER(GUID, (_acfUID{7, 7, 7, {7, 7, 7}}), (_acfUID{8, 8, 8, {8, 8, 8}})),
-    READER(Timecode, timecode(77LL, 0), timecode(78LL, 1)),
-    READER_WITH(Index, std::size_t(77), std::size_t(78), L"a;bb;c" COMMA L';' COMMA),
-    READER_WITH(Flags, 77u, 78u, kMap COMMA kMapCount COMMA L';' COMMA),
+    READER(Int, 77, 78, ),
+    READER(UInt, 77u, 78u, ),
+    READER(LInt, 77LL, 78LL, ),
+    READER(LUInt, 77ULL, 78ULL, ),
+    READER(Hex, 77u, 78u, ),
+    READER(EDouble, 0.77, 0.78, ),
+    READER(Double, 0.77, 0.78, ),
+    READER(FileTime, 77ULL, 78ULL, ),
+    READER(Rational, CRational(77), CRational(78), ),
+    READER(Bool, false, true, ),
+    READER(GUID, (_acfUID{7, 7, 7, {7, 7, 7}}), (_acfUID{8, 8, 8, {8, 8, 8}}), ),
+    READER(Timecode, timecode(77LL, 0), timecode(78LL, 1), ),
+    READER(Index, std::size_t(77), std::size_t(78), L"a;bb;c", L';', ),
+    READER(Flags, 77u, 78u, kMap, kMapCount, L';', ),
 };
 constexpr std::size_t kDataOnlyReaders = 7; // the first ones
 
 const Reader& Named(const std::string& name) {
-    for (const Reader& reader : kReaders)
-        if (reader.name == name) return reader;
-    throw name;
+    return *std::find_if(std::begin(kReaders), std::end(kReaders), [&](auto& reader) { return reader.name == name; });
 }
 
 std::string Read(const Reader& reader, const CPPoolString& text) {
-    CPXMLObject parent;
-    EXPECT_TRUE(parent.SetName(L"p"));
-    const CPXMLObject element = Element(text);
-    EXPECT_TRUE(parent.AddTag(L"other") && parent.AddAttribute(L"a", text) == text.isdef() && parent.Add(element));
-    const std::string read = reader.data(element);
-    EXPECT_EQ(reader.element(parent), read) << reader.name;
-    EXPECT_EQ(reader.attribute(parent), read) << reader.name;
-    return read;
+    CPXMLObject parent = Element();
+    EXPECT_TRUE(parent.Add(Element(text)) && parent.AddAttribute(L"a", text) == text.isdef());
+    const auto [data, attribute] = reader.read(parent);
+    EXPECT_EQ(attribute, data) << reader.name;
+    return data;
 }
 
 double ReadDouble(const std::string& text) { return Element(text.c_str()).GetDataDouble(0.25); }
@@ -146,24 +132,22 @@ std::uint64_t Bits(double value) { return std::bit_cast<std::uint64_t>(value); }
 // --- writing ---------------------------------------------------------------------------------------------------------
 
 TEST(XmlValues, TextsOfValues) {
-    EXPECT_EQ(Stored(0ULL), "0");
-    EXPECT_EQ(Stored(255ULL), "ff");
-    EXPECT_EQ(Stored(std::size_t(0x123456789ABCDEF0)), "123456789abcdef0");
-    EXPECT_EQ(Stored(CRational(-30000, 1001)), "-30000/1001");
-    EXPECT_EQ(Stored(CRational(1, 0)), "1/0");
-    EXPECT_EQ(Stored(1.5), "3ff8000000000000(1.5)");
-    EXPECT_EQ(Stored(-0.1f), "bfb99999a0000000(-0.1)");
-    EXPECT_EQ(Stored(12345.678), "40c81cd6c8b43958(1.235e+04)");
-    EXPECT_EQ(Stored(0.0), "0(0)");
-    EXPECT_EQ(Stored(-1.7976931348623157e308), "ffefffffffffffff(-1.798e+308)");
-    EXPECT_EQ(Stored(true), "true");
-    EXPECT_EQ(Stored(false), "false");
-    EXPECT_EQ(Stored(timecode(1, 0, 0, 0, 0)), "01:00:00:00 {25/1}Hz");
-    EXPECT_EQ(Stored(timecode()), "--:--:--:-- {25/1}Hz");
-    EXPECT_EQ(Stored(cacfuid(L"15603cd4-ab81-4d6f-b05f-c6bea760a789")), "15603CD4-AB81-4D6F-B05F-C6BEA760A789");
-    EXPECT_EQ(Stored(_acfUID{}), "00000000-0000-0000-0000-000000000000");
-    EXPECT_EQ(Stored(L"text"), "text");
-    EXPECT_EQ(Stored(CPPoolString(-5)), "-5") << "decimal numbers, the explicit way";
+    const std::pair<std::string, const char*> rows[] = {
+        {Stored(0ULL), "0"},
+        {Stored(std::size_t(0x123456789ABCDEF0)), "123456789abcdef0"},
+        {Stored(255ULL), "ff"},
+        {Stored(CRational(-30000, 1001)), "-30000/1001"},
+        {Stored(CRational(1073741823, 1000)) + Stored(CRational(1, 0)), "1073741823/10001/0"},
+        {Stored(1.5), "3ff8000000000000(1.5)"},
+        {Stored(-0.1f) + Stored(0.0), "bfb99999a0000000(-0.1)0(0)"},
+        {Stored(-1.7976931348623157e308), "ffefffffffffffff(-1.798e+308)"},
+        {Stored(true) + Stored(false) + Stored(L"text"), "truefalsetext"},
+        {Stored(timecode(1, 0, 0, 0, 0)) + Stored(timecode()), "01:00:00:00 {25/1}Hz--:--:--:-- {25/1}Hz"},
+        {Stored(cacfuid(L"15603cd4-ab81-4d6f-b05f-c6bea760a789")), "15603CD4-AB81-4D6F-B05F-C6BEA760A789"},
+        {Stored(_acfUID{}), "00000000-0000-0000-0000-000000000000"},
+        {Stored(CPPoolString(-5)), "-5"}, // decimal numbers, the explicit way
+    };
+    for (const auto& [stored, text] : rows) EXPECT_EQ(stored, text);
 }
 
 // Which arguments compile.
@@ -233,111 +217,42 @@ TEST(XmlValues, FlagsByName) {
 // --- reading ---------------------------------------------------------------------------------------------------------
 
 TEST(XmlValues, WhatTextsRead) {
-    const struct {
-        const char* reader;
-        std::vector<std::pair<const wchar_t*, const char*>> rows; // text and value, "-" for the default
-    } tables[] = {
-        {"Int",
-         {{L"42", "42"},
-          {L" \t\n-7x", "-7"},
-          {L"+3", "3"},
-          {L"0x1F", "0"},
-          {L"2147483648", "-2147483648"},
-          {L"4294967297", "1"},
-          {L"-", "-"},
-          {L"+-1", "-"},
-          {L"x1", "-"},
-          {L"1.9", "1"},
-          {L"\x0661", "-"},
-          {L"\xA0\x31", "-"}}},
-        {"UInt",
-         {{L"4294967295", "4294967295"}, {L"-1", "4294967295"}, {L"4294967296", "0"}, {L"/", "-"}, {L":", "-"}}},
-        {"LInt", {{L"-9223372036854775808", "-9223372036854775808"}, {L"9223372036854775808", "-9223372036854775808"}}},
-        {"LUInt",
-         {{L"18446744073709551615", "18446744073709551615"},
-          {L"18446744073709551617", "1"},
-          {L"-1", "18446744073709551615"}}},
-        {"FileTime", {{L" 132539328000000000", "132539328000000000"}, {L"-", "-"}}},
+    // Text>value, with "-" for the default.
+    const std::pair<const char*, const char*> tables[] = {
+        {"Int", "42>42| \t\n-7x>-7|+3>3|0x1F>0|2147483648>-2147483648|4294967297>1|->-|+-1>-|x1>-|1.9>1"},
+        {"UInt", "4294967295>4294967295|-1>4294967295|4294967296>0|/>-|:>-"},
+        {"LInt", "-9223372036854775808>-9223372036854775808|9223372036854775808>-9223372036854775808"},
+        {"LUInt", "18446744073709551615>18446744073709551615|18446744073709551617>1|-1>18446744073709551615"},
+        {"FileTime", " 132539328000000000>132539328000000000|->-"},
         {"Hex",
-         {{L"fF", "255"},
-          {L" -0X10", "4294967280"},
-          {L"123456789", "591751049"},
-          {L"0x", "-"},
-          {L"g", "-"},
-          {L"0x0123456789abcdef", "2309737967"},
-          {L"0000000000000000000000001f", "31"}}},
+         "fF>255| -0X10>4294967280|123456789>591751049|0x>-|g>-|0x0123456789abcdef>2309737967|00000000000000001f>31"},
         {"Rational",
-         {{L"30000/1001", "30000/1001"},
-          {L" -6 \n/ 4 x", "-3/2"},
-          {L"3/-6", "-1/2"},
-          {L"5/0", "1/0"},
-          {L"5", "-"},
-          {L"5/", "-"},
-          {L"/5", "-"},
-          {L"5:6", "-"},
-          {L"4294967299/6", "1/2"},
-          {L"5 / x", "-"}}},
-        {"Bool", {{L"true", "yes"}, {L"false", "no"}, {L"true ", "-"}, {L"1", "-"}, {L"yes", "-"}}},
+         "30000/1001>30000/1001| -6 \n/ 4 x>-3/2|3/-6>-1/2|5/0>1/0|5>-|5/>-|/5>-|5:6>-|4294967299/6>1/2|5 / x>-"},
+        {"Bool", "true>yes|false>no|true >-|1>-|yes>-"},
         {"EDouble",
-         {{L"3ff8000000000000(1.5)", "1.5"},
-          {L" 0x3FF8000000000000", "1.5"},
-          {L"0(0)", "0"},
-          {L"(1.5)", "-"},
-          {L"bff0000000000000", "-1"},
-          {L"53ff8000000000000", "1.5"},
-          {L"3ff8000000000000a", "-1.4044477616111874e+306"}}},
+         "3ff8000000000000(1.5)>1.5| 0x3FF8000000000000>1.5|0(0)>0|(1.5)>-|bff0000000000000>-1|53ff8000000000000>1.5"},
         {"Double",
-         {{L"1.5", "1.5"},
-          {L" -.5e+1x", "-5"},
-          {L"2.", "2"},
-          {L"1e", "1"},
-          {L"1e+", "1"},
-          {L"1e400", "inf"},
-          {L"-1e400", "-inf"},
-          {L"1e-400", "0"},
-          {L"0e99999999999999999999", "0"},
-          {L"1e99999999999999999999", "inf"},
-          {L"inf", "-"},
-          {L"nan", "-"},
-          {L"0x10", "0"},
-          {L".", "-"},
-          {L"-.e1", "-"},
-          {L"e1", "-"},
-          {L"1,5", "1"},
-          {L"\x0661.5", "-"}}},
-        {"GUID", {{L"15603CD4-AB81-4D6F-B05F-C6BEA760A789", "C6BEA760A789"}, {L"1-2-3-4-5", "-"}}},
+         "1.5>1.5| -.5e+1x>-5|2.>2|1e>1|1e+>1|1e400>inf|-1e400>-inf|1e-400>0|0e99999999999999999999>0|1,5>1|.>-|"
+         "-.e1>-|e1>-|1e99999999999999999999>inf|inf>-|nan>-|0x10>0|infinity and beyond>-"},
+        {"GUID", "15603CD4-AB81-4D6F-B05F-C6BEA760A789>C6BEA760A789|1-2-3-4-5>-|15603CD4>000000000000"},
         {"Timecode",
-         {{L"00:00:01:00 {25/1}Hz", "1200 0"},
-          {L"00:00:00:02 {30000/1001}Hz/D", "80 2"},
-          {L"--:--:--:-- {24/1}Hz", "0 131072"},
-          {L"00:00:00:25 {25/1}Hz", "0 65536"},
-          {L"00:00:01:00", "-"},
-          {L"00:00:01:00 {25/3}Hz", "-"},
-          {L"--:--:--:--", "-"},
-          {L"00:00:01:00 {25/1}Hz                           ", "1200 0"},
-          {L"00:00:01:00 {25/1}Hz                            ", "-"}}},
-        {"Index", {{L"a", "0"}, {L"bb", "1"}, {L"c", "2"}, {L"b", "-"}, {L"a;bb", "0"}, {L"c;", "-"}}},
-        {"Flags",
-         {{L"read", "1"},
-          {L"half;0x80", "130"},
-          {L"0xFFFFFFFF;read", "4294967295"},
-          {L"read;", "-"},
-          {L";", "-"},
-          {L"read; write", "-"},
-          {L"0x", "-"},
-          {L"0x000000001", "-"},
-          {L"8", "-"},
-          {L"0x1g", "-"},
-          {L"rea", "-"},
-          {L"none", "-"}}},
+         "00:00:01:00 {25/1}Hz>1200 0|00:00:00:02 {30000/1001}Hz/D>80 2|--:--:--:-- {24/1}Hz>0 131072|--:--:--:-->-|"
+         "00:00:00:25 {25/1}Hz>0 65536|00:00:01:00>-|00:00:01:00 {25/3}Hz>-|"
+         "00:00:01:00 {25/1}Hz                           >1200 0|00:00:01:00 {25/1}Hz                            >-"},
+        {"Index", "a>0|bb>1|c>2|b>-|a;bb>0|c;>-"},
+        {"Flags", "read>1|half;0x80>130|0xFFFFFFFF;read>4294967295|read;>-|;>-|read; "
+                  "write>-|0x>-|0x000000001>-|8>-|0x1g>-|rea>-|none>-"},
     };
-    for (const auto& table : tables) {
-        const Reader& reader = Named(table.reader);
-        EXPECT_EQ(Read(reader, nullptr), "-") << reader.name;
-        for (const auto& [text, value] : table.rows)
-            EXPECT_EQ(Read(reader, text), value) << reader.name << ": " << Narrow(text);
+    for (const auto& [name, table] : tables) {
+        EXPECT_EQ(Read(Named(name), nullptr), "-") << name;
+        std::istringstream rows(table);
+        for (std::string row; std::getline(rows, row, '|');) {
+            const auto mark = row.rfind('>');
+            EXPECT_EQ(Read(Named(name), row.substr(0, mark).c_str()), row.substr(mark + 1)) << name << ": " << row;
+        }
     }
-    EXPECT_EQ(Read(Named("GUID"), L"15603CD4"), "000000000000") << "no four dashes: the null identifier";
+    for (const wchar_t* text : {L"\x0661", L"\xA0\x31", L"\x0131"})
+        EXPECT_EQ(Read(Named("Int"), text) + Read(Named("Hex"), text) + Read(Named("Double"), text), "---");
     CPXMLObject element = Element(L"text");
     EXPECT_TRUE(element.AddTag(L"t", L"x") && element.AddAttribute(L"a", L"y"));
     EXPECT_TRUE(element.FindElementString(L"t") == L"x" && element.FindAttributeString(L"a", L"z") == L"y");
@@ -358,12 +273,9 @@ TEST(XmlValues, ElementsWithChildrenHaveNoNumbersIntended) {
     CPXMLObject mixed = Element(text), parent = Element();
     EXPECT_TRUE(mixed.AddTag(L"child") && parent.Add(mixed) && parent.AddAttribute(L"a", text));
     for (std::size_t i = 0; i < std::size(kReaders); ++i) {
-        const Reader& reader = kReaders[i];
-        const std::string alone = reader.data(Element(text));
-        EXPECT_EQ(reader.data(mixed), i < kDataOnlyReaders ? "-" : alone) << reader.name;
-        EXPECT_EQ(reader.element(parent), i < kDataOnlyReaders ? "-" : alone) << reader.name;
-        EXPECT_EQ(reader.attribute(parent), alone) << reader.name;
-        EXPECT_EQ(reader.data(CPXMLObject()), "-") << reader.name;
+        const std::string alone = Read(kReaders[i], text);
+        EXPECT_EQ(kReaders[i].read(parent), std::pair(i < kDataOnlyReaders ? std::string("-") : alone, alone));
+        EXPECT_EQ(kReaders[i].read(CPXMLObject()).first, "-") << "no element at all";
     }
 }
 
