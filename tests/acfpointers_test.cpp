@@ -78,6 +78,7 @@ TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFails) {
     }
 }
 
+// Intended: wrapper-keeps-stored
 TYPED_TEST(WrapperOfAnyKind, IntendedResolvingKeepsWhatWasStored) {
     Probe& probe = this->probe;
     Probe other;
@@ -132,7 +133,8 @@ TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactoriesIntended) {
     EXPECT_TRUE(wrapper.createComponent(kClass) && wrapper && wrapper.createInstance(kClass) && wrapper);
     CPIACFUnknown::Factory_Release();
     EXPECT_EQ(factory.references, 1);
-    // Intended: creation from no factory is true, and gives nothing.
+    // Creation from no factory is true, and gives nothing.
+    // Intended: create-without-factory
     EXPECT_TRUE(wrapper.createComponent(kClass, nullptr) && !wrapper);
     EXPECT_TRUE(wrapper.createInstance(kClass, nullptr) && !wrapper);
 }
@@ -209,7 +211,7 @@ TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
     }
     EXPECT_EQ(ends, 1);
     Twofold fixed(&ends, false);
-    EXPECT_TRUE(fixed.AddRef() == 0 && fixed.Release() == 0 && ends == 1) << "Intended: static ones are not counted";
+    EXPECT_TRUE(fixed.AddRef() == 0 && fixed.Release() == 0 && ends == 1) << "static ones are not counted";
     EXPECT_FALSE(Twofold::Make(nullptr));
     support::ForEachFailingAllocation([] {
         int once = 0;
@@ -218,6 +220,7 @@ TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
     });
 }
 
+// Intended: static-factory-counts
 TEST(ClassFactory, IntendedCountsAndResults) {
     struct Maker final : _csFactory {
         Mode mode = Mode::Gives;

@@ -57,6 +57,7 @@ void ExpectSource(const char* name, const Unit* abc, std::size_t length, std::si
     });
 }
 
+// Intended: absent-length, ansi-length, wide-length
 TEST(CharsetStrings, LengthsOfEverySource_Intended) {
     // The terminator counts in some, and null of the own kind has no length at all.
     ExpectSource<CACFWChar, CACFWChar>("wide of wide", L"abc", 4, 0, 4);
@@ -121,6 +122,7 @@ TEST(CharsetStrings, OwnTheirText) {
     ExpectOwnText<CANSIChar>();
 }
 
+// Intended: patch-length
 TEST(WideString, PatchesPercentS_Intended) {
     const struct {
         const wchar_t *text, *inserted, *result;

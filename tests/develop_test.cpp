@@ -172,6 +172,7 @@ TEST(Clocks, AgreeWithTheStandardOnes) {
 }
 
 TEST(Numbers, CountBitsAndKnowTheMachine) {
+    // Intended: platform-name
     EXPECT_STREQ(Core::OS::GetPlatformString(), L"Windows");
     EXPECT_EQ(Core::OS::GetStartupPath()[1], Core::OS::GetProcessName()[0]) << "the file name's start";
     for (int bit = 0; bit < 64; ++bit) EXPECT_EQ(bitcount64(~0ULL >> bit), 64u - static_cast<unsigned>(bit));
@@ -206,6 +207,7 @@ struct NaiveTwister {
 
 } // namespace
 
+// Intended: random-first-outputs, random-oddness
 TEST(Random, SequenceOfASeedIsIntended) {
     CMTRandom random;
     for (std::uint32_t seed : {0u, 5489u, 0xFFFFFFFFu}) {

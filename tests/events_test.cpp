@@ -211,6 +211,7 @@ TEST(Events, NeedMemoryOnlyToBeMade) {
     EXPECT_EQ(many.Wait(1), 8u);
 }
 
+// Intended: event-source
 TEST(Events, AssertAboutASourceAndAreSet_Intended) {
     const support::Assertions assertions;
     const CPEvent event(false);

@@ -74,6 +74,7 @@ TEST_F(FileOpen, RefusesWhatIsNoFileAndOnlyReadsWhenAskedTo) {
         << "closed";
 }
 
+// Intended: open-makes-folder
 TEST_F(FileOpen, CreatesOneMissingFolderEvenToRead_Intended) {
     EXPECT_FALSE(file.Open(folder / L"a/b/file", FileAccessWrite, OpenFileCreate)) << "two are missing";
     EXPECT_FALSE(_TestDirExists(folder / L"a"));
@@ -162,6 +163,7 @@ TEST_F(FileActions, TellFilesFromFoldersAndNeverReplace) {
     EXPECT_FALSE(_CreateDir(dir) || _CreateDir(path) || _CreateDir(missing + L"/y")) << "one level only";
     EXPECT_TRUE(_TestFileExists(path) && _TestDirExists(dir) && _TestDirExists(dir + L"/") && _TestDirExists(L"."));
     EXPECT_FALSE(_TestFileExists(dir) || _TestDirExists(path) || _DeleteFile(dir) || _DeleteFile(missing));
+    // Intended: rename-keeps
     EXPECT_FALSE(CFile::RenameFile(missing, dir) || CFile::RenameFile(path, inside) || CFile::RenameFile(path, dir));
     for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""}) {
         EXPECT_FALSE(_TestFileExists(nothing) || _TestDirExists(nothing) || _DeleteFile(nothing));

@@ -131,6 +131,7 @@ TEST(HashTable, BehavesLikeTheModel) {
             } else if (kind == 3 && step % 7 == 0) {
                 table.ClearTable();
                 model = {};
+                // Intended: hash-delete
                 ASSERT_TRUE(table.DeleteItem(hash, item) && table.DeleteIndex(hash) && table.DisposeTable(0));
             } else if (kind < 40) {
                 const auto policy = static_cast<eHashCollision>(random() % 6);

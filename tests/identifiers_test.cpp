@@ -49,6 +49,7 @@ TEST(Identifier, ReadsAndWritesSixteenBytes) {
 }
 
 // The fuzz replay compares any text with a plain reading of the rules; here is what the rules say.
+// Intended: identifier-dashes
 TEST(Identifier, IntendedReadingOfOtherTexts) {
     for (std::size_t length = 24; length < 36; ++length) ExpectRead(std::string(kText, length), nullptr);
     const std::pair<const char*, const char*> rows[] = {

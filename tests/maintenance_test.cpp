@@ -132,6 +132,7 @@ TEST(Maintenance, LeavingWaitsForTheRunAndNothingIsCalledAfterwards) {
 }
 
 // One that does not end in time, and one that unregisters itself from inside its run, side by side: ten seconds once.
+// Intended: unregister-own-run
 TEST(Maintenance, LeavingGivesUpAfterTenSecondsAlsoInTheOwnRunIntended) {
     const Running services;
     CPWork work;

@@ -227,6 +227,7 @@ TEST(PlainMemory, TakesOnlyPlainBytes) {
     }
 }
 
+// Intended: resize-shared
 TEST(PlainMemory, ResizeInPlaceReachesAllHoldersIntended) {
     Buffer buffer("abcdef"), sharer(buffer);
     EXPECT_TRUE(buffer.Resize(2) && sharer.Text() == "ab");
@@ -238,6 +239,7 @@ TEST(PlainMemory, ResizeInPlaceReachesAllHoldersIntended) {
     EXPECT_TRUE(buffer.IsType(reinterpret_cast<std::size_t>(&kCounted))) << "the type stays";
 }
 
+// Intended: reserve-used-size
 TEST(PlainMemory, ReserveLooksAtTheUsedSizeIntended) {
     Buffer buffer;
     EXPECT_TRUE(buffer._Reserve(0, nullptr) && !buffer._Reserve(8, nullptr));
@@ -251,6 +253,7 @@ TEST(PlainMemory, ReserveLooksAtTheUsedSizeIntended) {
     EXPECT_TRUE(buffer.GetAllocSize() == 4 && buffer.Text() == "abc" && sharer.Text() == "abc");
 }
 
+// Intended: memory-header
 TEST(PlainMemory, ContainsItsHeaderTooIntended) {
     Buffer buffer("0123456789");
     ASSERT_TRUE(buffer.Resize(4) && !Buffer().isMemory(&buffer) && !buffer.isMemory(nullptr));

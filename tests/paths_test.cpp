@@ -54,6 +54,9 @@ TEST(ParsePath, FollowsTheTable) {
                   row.parts);
         EXPECT_EQ((Texts{*texts.sRoot, *texts.sFolder, *texts.sStem, *texts.sExtension}), row.parts);
         EXPECT_STREQ(*FU_FormatPath(texts), row.path);
+        texts.sStem = row.path;
+        EXPECT_TRUE(FU_ParsePath(*texts.sStem, texts)) << "a text of the record itself";
+        EXPECT_STREQ(*FU_FormatPath(texts), row.path);
         for (const wchar_t* nothing : {static_cast<const wchar_t*>(nullptr), L""}) {
             EXPECT_FALSE(FU_ParsePath(nothing, parts) || FU_ParsePath(nothing, texts));
             EXPECT_EQ(parts.eRoot + parts.nRoot + parts.nFolder + parts.nStem + parts.nExtension, 0u);

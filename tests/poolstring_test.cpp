@@ -30,6 +30,7 @@ TEST(PooledString, NullEmptyAndTextDiffer) {
     EXPECT_TRUE(CPPoolString().iequals(CPPoolString(L""))) << "both hashes are 0";
 }
 
+// Intended: number-32-bits
 TEST(PooledString, NumbersKeepTheirLow32BitsIntended) {
     using Row = std::pair<CPPoolString, const wchar_t*>;
     for (const auto& [text, expected] :
@@ -66,6 +67,7 @@ TEST(PooledString, IncRaisesTheTrailingNumber) {
     EXPECT_TRUE(CPPoolString().inc().isnull());
 }
 
+// Intended: pool-utf8-size
 TEST(PooledString, Utf8FormIsMadeOnceAndOnlyWhereItFits) {
     const std::pair<CPPoolString, const char*> rows[] = {{L"\U0001F600", "\x01"},
                                                          {L"A\U0001F600B", "A\x01"
@@ -99,6 +101,7 @@ std::vector<int> FoldedUnits(const wchar_t* text, bool fold) {
 }
 int Order(const std::vector<int>& a, const std::vector<int>& b) { return a < b ? -1 : b < a; }
 
+// Intended: pool-null-first
 TEST(PooledString, ComparesLikeASlowReading) {
     for (const wchar_t* first : kTexts)
         for (const wchar_t* second : kTexts) {
@@ -131,6 +134,7 @@ TEST(PooledString, ComparesLikeASlowReading) {
         }
 }
 
+// Intended: pool-length, pool-suffix
 TEST(PooledString, SuffixesCountPairsAsOneIntended) {
     const CPPoolString text(L"a\U0001F600bc");
     EXPECT_EQ(text.len(), 4u);
@@ -167,6 +171,7 @@ TEST(StringArray, SortedOneIsASet) {
         add ? void(model.insert(name)) : void(model.erase(name));
         held |= add;
         const auto place = static_cast<std::size_t>(std::distance(model.begin(), model.lower_bound(name)));
+        // Intended: array-locate
         ASSERT_EQ(array.LocateEntry(text), held ? place : TAVO::Buffers::NotFound);
         ASSERT_EQ(array.GetNItems(), model.size());
     }
@@ -205,6 +210,7 @@ TEST(StringArray, TakesBlocksOfPooledStrings) {
     CPPoolStringArray list(false), set(true);
     list = block, set = block;
     EXPECT_EQ(Elements(list), (Strings{"b", "a", "b"}));
+    // Intended: array-duplicates
     EXPECT_EQ(Elements(set), (Strings{"a", "b", "b"})) << "sorted; duplicates stay";
     list = TAVO::Buffers::CPOMVector(2);
     const support::FailingHeap heap(0);
@@ -220,6 +226,7 @@ TEST(StringArray, JoinsWithTheSeparator) {
         << "all units, not len()";
 }
 
+// Intended: split-trailing
 TEST(StringArray, SplitsAtTheSeparator) {
     struct Row {
         const wchar_t* text;

@@ -18,6 +18,7 @@ auto Both(const CRational& r) { return std::make_pair(r.num(), static_cast<long3
 
 } // namespace
 
+// Intended: rational-low-denominator
 TEST(Rational, BoundaryAndRandomPairsAgainstTheReference) {
     const long32 edges[] = {0,           1,           -1,      2,          3,          -4,
                             6,           1001,        30000,   1073741822, 1073741823, 1073741824,
@@ -59,6 +60,7 @@ TEST(Rational, IntegersAndDoublesOnEitherSide) {
     EXPECT_FALSE(infinite.isNormal() || !CRational() || !infinite);
 }
 
+// Intended: rational-order, rational-product-sign, rational-plus
 TEST(Rational, OrderOfNonNegativeFractionsAndSignOfProductsIntended) {
     EXPECT_TRUE(CRational(3, 4) < CRational(1, 2) && !(CRational(1, 2) < CRational(3, 4)));
     EXPECT_FALSE(CRational(0) < CRational(1, 2));

@@ -60,6 +60,7 @@ Elements RandomElements(std::mt19937& random, std::size_t count, unsigned keys) 
     return elements;
 }
 
+// Intended: sort-equal-elements
 TEST(Sort, PlacesEqualElementsAsStatedIntended) {
     std::mt19937 random(1);
     // A random long range never runs out of patience, so the same holds there.
@@ -209,6 +210,7 @@ TEST(Checksum, AgreesWithBitByBitInEveryWidth) {
     EXPECT_EQ(CMachineCRC(16, 0x1021).Eval("123456789", 9, 0xFFFF), 0x29B1u) << "the well-known check value";
 }
 
+// Intended: crc-eight-bits
 TEST(Checksum, OfEightBitsComputesNothingIntended) {
     for (const unsigned width : {0u, 7u, 8u, 65u, 0xFFFFFFFFu})
         EXPECT_EQ(CMachineCRC(width, 0x07).Eval("abc", 3, 0x1234), 0x1234u) << width;

@@ -148,6 +148,7 @@ Wide WithGenerator(Wide text, std::size_t at) {
     return text;
 }
 
+// Intended: ten-units
 TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
     for (std::size_t at = 0; at < 20; ++at) {
         Wide text(31, L'\u4000');
@@ -219,6 +220,7 @@ TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweepInARow) {
         text.free();
         Sweep();
         EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
+        // Intended: pool-idle
         EXPECT_TRUE(IsKept(L"swept")) << "a look-up does not prolong its life";
     }
     Sweep();

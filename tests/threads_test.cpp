@@ -116,6 +116,7 @@ TEST(Threads, CannotWaitForThemselves) {
     EXPECT_TRUE(interrupted && job.State() == ThreadFailed);
 }
 
+// Intended: thread-runs-on
 TEST(Threads, RunOnWithoutHandles_Intended) {
     const CPEvent go(false);
     bool ended = false;

@@ -120,6 +120,8 @@ TEST(TimecodeRecord, BoundsOfFields) {
 
 TEST(TimecodeRecord, CountsWithDaysAndSigns) {
     EXPECT_EQ(FieldsOf(TCINFO(1LL, 8)), std::make_tuple(0, 0, 0, 0, 1, 8)) << "between two frames of half rate";
+    // Intended: timecode-skipped-label
+    EXPECT_EQ(TCINFO(71939LL, 2).ff(), 29u) << "within frame 28, just before a skipped label";
     EXPECT_TRUE(static_cast<long long>(TCINFO(-1LL, 0)) == 0 && TCINFO(-103680001LL, 0).Clip().dd() == -1);
     ulong32 hh, mm, ss, ff, sys;
     int sign;
@@ -141,6 +143,7 @@ TEST(TimecodeRecord, AnyCountComesBackWithinAFrame) {
         }
 }
 
+// Intended: timecode-record-fields
 TEST(TimecodeRecord, FieldsOfNegativePositionsIntended) {
     EXPECT_EQ(static_cast<long32>(TCINFO(48LL, 0)), 2);
     // (2^64 - 48) / 24, its low 32 bits

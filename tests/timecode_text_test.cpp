@@ -75,6 +75,7 @@ TEST(TimecodeFixedText, Reading) {
         EXPECT_EQ(static_cast<long long>(text), row.count) << row.text;
         EXPECT_EQ(static_cast<long32>(text), static_cast<long32>(TCINFO(text))) << row.text;
     }
+    // Intended: timecode-bad-separators
     for (const char* invalid :
          {" 00.00.00:00", " 1x:00:00:00", " 00:00:00:x0", ">##:##:##:##", "*00:00:00:00", "", " 10:00:00:"})
         EXPECT_EQ(TCINFO(Holding<SZTC>(invalid)).sys(), kInvalid) << invalid;
@@ -97,6 +98,7 @@ TEST(TimecodeFixedText, FreeText) {
     EXPECT_TRUE(timecode(L"00:00:01:00") == timecode(1200LL, 0) && timecode(L">##:##:##:##").sys() == kInvalid);
 }
 
+// Intended: timecode-utf8
 TEST(TimecodeFixedText, Utf8DropsTheSystemIntended) {
     const SZTC text(long32(10), 0, 0, 0, 2);
     EXPECT_EQ(Narrow(String::CACFWChar(text)), " 10.00:00.00");
@@ -144,6 +146,7 @@ TEST(TimecodeExchangeText, Reading) {
     EXPECT_TRUE(timecode(ones).sys() == kUnassigned && timecode(one) == timecode(10 * kHour, 0));
 }
 
+// Intended: timecode-rate-alone
 TEST(TimecodeExchangeText, CanonicalisingAndRatesWithoutFieldsIntended) {
     const std::pair<std::string, const char*> rows[] = {
         {"1:2:3:4 {120/2}Hz", "01:02:03:04 {60/1}Hz"},

@@ -46,6 +46,7 @@ TEST(Timecode, Construction) {
            {"from a skipped label", T(0, 1, 0, 1, 2), {0, kInvalid | 2}}});
 }
 
+// Intended: timecode-count-units, timecode-seconds
 TEST(Timecode, ConversionsWithUnsignedUnitsIntended) {
     const timecode back(-49LL, 0);
     EXPECT_TRUE(long32(T(12LL, 0)) == 1 && double(T(1200LL, 4)) == 1200 * (1.001 / 1200.0));
@@ -54,6 +55,7 @@ TEST(Timecode, ConversionsWithUnsignedUnitsIntended) {
     EXPECT_EQ(T(72LL, 0).Frames(0, 0), 2) << "halves away from zero";
     EXPECT_EQ(T(LLONG_MIN, 0).Frames(0, 1), static_cast<long32>(0 - ((1ULL << 63) + 47) / 48));
     EXPECT_EQ(T(-48LL, 0).Frames(0, -1), static_cast<long32>((0ULL - 48) / 48));
+    // Intended: timecode-defined
     EXPECT_TRUE(!kNothing && kNothing.IsDefined() && !!kBroken);
 }
 
@@ -74,13 +76,18 @@ TEST(Timecode, Arithmetic) {
            {"over zero", film / 0, {0, kInvalid}},
            {"bottom over minus one", bottom / -1, {LLONG_MIN, kInvalid | 3}},
            {"times a double", film * 0.555, {56, 3}},
-           {"Intended: 0.5 is added to negative results too", -pal * 1.0, {-47, 0}},
+           // Intended: timecode-half
+           {"0.5 is added to negative results too", -pal * 1.0, {-47, 0}},
+           // Intended: timecode-divisor
+           {"over a negative double", film / -2.0, {0, kInvalid}},
            {"over the least double", film / 0.000001, {100000000, 3}},
            {"times infinity", film * kInfinity, {LLONG_MAX, kInvalid | 3}},
            {"scaled half up", T::Scale(film, 1, 8, true), {13, 3}},
            {"scaled by a negative denominator", T::Scale(film, 1, -8, true), {-13, 3}},
            {"scaled by the least denominator", T::Scale(film, 1, INT_MIN, true), {0, 3}},
            {"scaled beyond it", T::Scale(T(2147483648LL, 3), 1, 1, false), {2147483648, kInvalid | 3}},
+           // Intended: timecode-scale
+           {"scaled far below zero", T::Scale(T(-9000000000LL, 3), 1, 1, false), {-9000000000LL, 3}},
            {"scaled bottom", T::Scale(bottom, 1, -1, false), {LLONG_MIN, kInvalid | 3}}});
     EXPECT_TRUE(film / T(50LL, 0) == 2.0 && film / T(0LL, 0) == 1e300 && film / kBroken == 1e300);
     timecode t = film;
@@ -99,11 +106,13 @@ TEST(Timecode, OrderIntended) {
     EXPECT_TRUE(kBroken > two && two < kBroken && !(kBroken <= two) && !(two >= kBroken));
     EXPECT_TRUE(T(1200LL, 0) == 1.0 && 2.0 >= T(1200LL, 0) && T(1200LL, 0) != 1.5);
     EXPECT_TRUE(kBroken == 7LL && kBroken == 0 && kBroken == 0.0);
-    // Intended: two invalid values are equal, and each is less than the other.
+    // Two invalid values are equal, and each is less than the other.
+    // Intended: timecode-invalid-order
     EXPECT_TRUE(kBroken == broken2 && kBroken < broken2 && broken2 < kBroken && kBroken <= broken2);
     EXPECT_FALSE(kBroken > broken2 || kBroken >= broken2 || kBroken != broken2);
 }
 
+// Intended: timecode-trunc, timecode-roof
 TEST(Timecode, RoundingToFramesIntended) {
     struct Row {
         long long count, aligned, trunced, roofed;
@@ -156,6 +165,7 @@ TEST(Timecode, DaysAndChoices) {
     EXPECT_EQ(Of(own.Bias(lo, own)), (Whole{3000, 0}));
 }
 
+// Intended: timecode-slip
 TEST(Timecode, SlippingByFieldsIntended) {
     const long long steps[] = {0,          2073600000, 2071526400, 0, 0, 0,          1244160000,
                                1036800000, 1035763200, 0,          0, 0, 2073600000, 1036800000};
@@ -182,12 +192,14 @@ TEST(TimecodeSystem, FactsOfTheTableIntended) {
         const bool drop = sys == 2 || sys == 5 || sys == 8, plain = sys == 1 || sys == 4 || sys == 7;
         EXPECT_EQ(T::GetDFSystem(sys), plain ? sys + 1 : kUnassigned);
         EXPECT_EQ(T::GetNDFSystem(sys), drop ? sys - 1 : kUnassigned);
-        EXPECT_EQ(T::IsDFSystem(sys), drop || sys == 9) << "Intended: PAL(PX), too";
+        // Intended: timecode-pal-px
+        EXPECT_EQ(T::IsDFSystem(sys), drop || sys == 9) << "PAL(PX), too";
     }
     EXPECT_TRUE(*T::GetSystemString(14) == 0 && T::NormalizeSystem(0x1000E) == 0x30000);
     EXPECT_TRUE(!T::IsDFSystem(0x10002) && T(0LL, 0x10002).IsDFSystem());
 }
 
+// Intended: timecode-rate
 TEST(TimecodeSystem, RateLookUpIntended) {
     const std::pair<double, ulong32> rates[] = {{60, 13},   {12.5, 11},           {-1, 11},
                                                 {29.98, 1}, {29.97, kUnassigned}, {25.0, kUnassigned},

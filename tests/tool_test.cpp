@@ -502,3 +502,85 @@ TEST(ToolId, ParsesFormatsAndMakes) {
     ExpectRun(RunTool({"id", "format", "x"}), kBadInput, "", "no identifier");
     EXPECT_EQ(RunTool({"id", "parse", Call("id|new|--count|3").output.substr(74, 36)}).code, kFine);
 }
+
+TEST(ToolUrl, EscapesAndNamesWhatIsNot) {
+    ExpectRows(
+        "url|", "",
+        {{"encode|a b/\xC3\xA9", kFine, "a%20b%2F%C3%A9\n"},
+         {"encode|--keep|/|a/b", kFine, "a/b\n"},
+         {"encode|a%20b", kFine, "a%2520b\n", "escaped already"},
+         {"encode|--keep|%|a%20b", kFine, "a%20b\n", "does not decode to itself"},
+         {"decode|a%20%zz", kFine, "a %zz\n", "character 5 begins no escape"},
+         {"decode|%C3%A9%C3", kFine, "\xC3\xA9\xC3\n", "byte 3 of the decoded text: C3 is truncated"},
+         {"decode|a%00b", kBadInput, "", "character 2 begins %00"},
+         {"from-path|/home/a b", kFine, "file:////home/a%20b\n"},
+         {"from-path|a", kFine, "file:///a\n", "relative"},
+         {"from-path|/\xF0\x9F\x98\x80", kBadInput, "", "above U+FFFF"},
+         {"from-path|", kBadInput, "", "empty"},
+         {"to-path|file:///C:/a%20b", kFine, "C:/a b\n"},
+         {"to-path|file:///\xF0\x9F\x98\x80", kBadInput, "", "byte 9 of the decoded text: U+1F600 comes out"},
+         {"to-path|file:///a%C3%28", kBadInput, "", "byte 10 of the decoded text: C3 is truncated"},
+         {"to-path|file:///%C0%80", kBadInput, "", "a zero ends"},
+         {"to-path|file://localhost", kFine, "//localhost\n"},
+         {"to-path|file://", kBadInput, "", "nothing stands behind"},
+         {"to-path|--json|File:///x|file:/x", kBadInput,
+          "[\n{\"url\":\"File:///x\",\"path\":\"/x\"},\n{\"url\":\"file:/x\",\"reason\":\"it does not begin with "
+          "file://\"}\n]\n"}});
+}
+
+TEST(ToolText, ValidatesByTheStandard) {
+    const struct {
+        const char* encoding;
+        std::string text, told;
+    } rows[] = {
+        {"utf-8", "a\n\xC3\xA9\xC1\x81",
+         ":2:2: invalid utf-8 at byte offset 4: C1 81 is overlong: U+0041 takes 1 byte; "
+         "the library reads all of it; 1 character is changed: at 2:2"},
+        {"utf-8", "\xF0\x8F\xBF\xBF", "1:1: invalid utf-8 at byte offset 0: F0 8F BF BF is overlong: U+FFFF takes 3"},
+        {"utf-8", "\xED\xA0\x80", "ED A0 80 is the surrogate U+D800"},
+        {"utf-8", "ab\xE2\x82",
+         ":1:3: invalid utf-8 at byte offset 2: E2 82 is truncated: 1 more byte belongs to it; "
+         "the library stops at 1:3 (byte offset 2)\n"},
+        {"utf-8", "\xF4\x90\x80\x80", "F4 90 80 80 is U+110000, above U+10FFFF"},
+        {"utf-8", "\x80", "80 continues a character"},
+        {"utf-8", "\xFF", "FF never occurs"},
+        {"utf-16", Utf16("a") + std::string("\x00\xDC", 2), "offset 2: DC00 is a lone low surrogate"},
+        {"utf-16", "\xFE\xFF" + Utf16("a", true) + std::string("\xD8\x00\x00", 3), "4: D800 is a lone high surrogate"},
+        {"utf-16be", Utf16("a", true) + "a", ":1:2: invalid utf-16be at byte offset 2: the text is truncated"},
+        {"utf-32", std::string("\x00\xD8\0\0", 4), "0000D800 is a surrogate"},
+        {"utf-32be", std::string("\0\x11\0\0", 4), "00110000 is above U+10FFFF"},
+    };
+    for (const auto& row : rows) {
+        const Finished run = RunTool({"text", "validate", "--from", row.encoding, "-"}, row.text);
+        EXPECT_TRUE(run.code == kBadInput && Contains(run.output, row.told)) << run.output << run.errors;
+    }
+    ExpectRows("text|validate|-",
+               "\xEF\xBB\xBF"
+               "caf\xC3\xA9",
+               {{"", kFine, "(standard input): valid utf-8, 4 characters; the library reads all of it\n"}});
+    ExpectRows("text|validate|--json|-", "\xFE\xFF\xD8\x3D\xDE",
+               {{"", kBadInput,
+                 "\"encoding\":\"utf-16\",\"valid\":false,\"line\":1,\"column\":1,\"offset\":2,\"reason\":"
+                 "\"D83D is a lone high surrogate"}});
+}
+
+TEST(ToolText, CountsAndRecodes) {
+    const std::string text = "a\xC3\xA9\xF0\x9F\x98\x80", pair("\x3D\xD8\x00\xDE", 4), ours("\x7D\xD8\x00\xDE", 4);
+    ExpectLines("text|count|-", text, {"characters        3\n", "utf16 units       4\n", "lib characters    3\n"});
+    ExpectLines("text|count|--from|utf-16|-", pair, {"utf8 bytes        4\n", "lib utf8 bytes    1\n"});
+    ExpectRows(
+        "text|recode|-|-o|-|--to|", text,
+        {{"utf-8", kFine, text},
+         {"utf-32be", kFine, std::string("\0\0\0a\0\0\0\xE9\0\1\xF6\0", 12)},
+         {"utf-16", kFine, "\xFF\xFE" + Utf16("a\xE9") + ours, "at 1:3 (byte offset 3), U+1F600 is written as U+2F"},
+         {"utf-16le|--strict", kBadInput, "", "not written: 1 character is changed"}});
+    ExpectRows("text|recode|-|-o|-|--from|utf-16|--to|", "\xFF\xFE" + pair + pair,
+               {{"utf-8", kFine, "\1\1",
+                 "2 characters are changed; the first at 1:1 (byte offset 2), U+1F600 is read as U+0001"},
+                {"utf-16be", kFine, std::string("\0\1\0\1", 4), "changed"}});
+    ExpectRows("text|recode|-|-o|-|--to|", "a\xF4\x90\x80\x80",
+               {{"utf-8", kBadInput, "", "above U+10FFFF; nothing is"}});
+    ExpectRows("text|recode|-|-o|-|", "a\nb",
+               {{"--from|ansi|--to|utf-8", kFine, "a\nb"}, {"--to|ansi", kFine, "a\nb"}});
+    ExpectRows("text|count|", "", {{"none", kFileTrouble, "", "does not exist"}, {"-|--from|x", kUsage, "", "--from"}});
+}

@@ -52,6 +52,7 @@ template <class Unit> std::vector<Unit> Terminated(std::vector<Unit> text) {
 }
 template <class Unit, class From> std::vector<Unit> As(const From& units) { return {units.begin(), units.end()}; }
 
+// Intended: utf16-size-limit
 TEST(TranscodingSizes, FollowTheirTables) {
     for (ulong32 value = 0; value <= 0x110001; ++value) {
         ASSERT_EQ(UTF8Size(value), value < 0x110000 ? Encoded8(value).size() : 0) << value;
@@ -65,6 +66,7 @@ TEST(TranscodingSizes, FollowTheirTables) {
     }
 }
 
+// Intended: utf8-sync
 TEST(TranscodingSync, Utf8SkipsLeadsAndNotContinuations_Intended) {
     const unsigned char text[] = {0xC3, 0xDF, 0xA9, 'a', 0}, longer[] = {0xE0, 0};
     const unsigned short units[] = {0xDC00, 0xDFFF, 0xE000, 0};
@@ -131,6 +133,7 @@ TEST(TranscodingStep, Utf8IsTakenAsItIs_Intended) {
     }
 }
 
+// Intended: pair-value, pair-second-unit
 TEST(TranscodingStep, Utf16PairsDecodeToZeroOrOne_Intended) {
     constexpr unsigned short kCorners[] = {0,      0x41,   0x7F,   0x80,   0x7FF,  0x800,  0xD7FF, 0xD800, 0xD83D,
                                            0xDBFE, 0xDBFF, 0xDC00, 0xDE00, 0xDFFF, 0xE000, 0xFC00, 0xFFFF};
@@ -156,6 +159,7 @@ template <class Unit, bool (*kStep)(Unit*&, ulong32)> bool Encode(Unit*& out, co
     return kStep(out, *in++);
 }
 
+// Intended: pair-offset
 TEST(TranscodingStep, EncodesWithoutTheOffset_Intended) {
     for (ulong32 value : {0x0u, 0x7Fu, 0x80u, 0x7FFu, 0x800u, 0xD800u, 0xDFFFu, 0xFFFFu, 0x10000u, 0x1F600u, 0xFFFFFu,
                           0x100000u, 0x10FFFFu, 0x110000u, 0xFFFFFFFFu}) {
@@ -229,6 +233,7 @@ protected:
 };
 
 // Invalid text is cut, or refused with what was written left in place, as Convert tells.
+// Intended: cut-or-fail
 TEST_F(Differential, RandomTextsAtEveryBound_Intended) {
     support::TextSource source(1);
     for (std::uint32_t i = 0; i < 800 && !HasFatalFailure(); ++i) {
@@ -246,6 +251,7 @@ TEST_F(Differential, LongTextsSumUp) {
         Expect(Terminated(Units(40000, static_cast<unsigned short>(unit))), kAll);
 }
 
+// Intended: utf32-bound
 TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {
     const struct {
         Numbers text; // no element behind those given is readable

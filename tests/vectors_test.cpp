@@ -90,6 +90,7 @@ TEST(Vectors, BehaveLikeTheModel) {
     EXPECT_EQ(twins.Find(twins[1], kHuge), 1u) << "equal bytes are not the same block";
 }
 
+// Intended: vector-growth
 TEST(Vectors, GrowBySixteenIntended) {
     Vector vector;
     for (std::size_t count = 1; count <= 49; ++count) {
@@ -110,6 +111,7 @@ int CompareNumbers(const void* a, const void* b) {
     return Numbered::Of(*static_cast<const CPObjectMemory*>(a)) - Numbered::Of(*static_cast<const CPObjectMemory*>(b));
 }
 
+// Intended: vector-shared
 TEST(Vectors, ChangesInPlaceReachAllHoldersIntended) {
     Vector vector = VectorOf({1, 3, 2}), sharer(vector);
     EXPECT_TRUE(vector.Insert(Numbered(9), 1));

@@ -17,6 +17,7 @@ constexpr std::size_t kAll = SIZE_MAX;
 
 unsigned Lower(unsigned c) { return c >= 'A' && c <= 'Z' ? c + 32 : c; }
 
+// Intended: blank-is-space, case-fold
 TEST(WideUtilities, CaseIsAToZAndNothingElse_Intended) {
     for (unsigned unit = 0; unit < 0x10000; ++unit) {
         const auto c = static_cast<wchar_t>(unit);
@@ -35,6 +36,7 @@ TEST(WideUtilities, CaseIsAToZAndNothingElse_Intended) {
     EXPECT_TRUE(wcscount(L"a,b,,c", L',') == 3 && wcscount(nullptr, L',') == 0);
 }
 
+// Intended: null-sorts-last, signed-count
 TEST(WideUtilities, NullSortsLastAndCountsHave32SignedBits_Intended) {
     for (std::size_t n : {std::size_t(0), std::size_t(5), kAll})
         EXPECT_TRUE(wcsncmpi(nullptr, L"a", n) == 1 && wcsncmpi(L"a", nullptr, n) == -1 &&
@@ -47,6 +49,7 @@ TEST(WideUtilities, NullSortsLastAndCountsHave32SignedBits_Intended) {
     EXPECT_EQ(wcscmpi(L"\x00E9", L"\x00C9"), 0x20);
 }
 
+// Intended: empty-part
 TEST(WideUtilities, OnePointerContainsItself_Intended) {
     for (const wchar_t* text : {static_cast<const wchar_t*>(nullptr), L"", L"a"})
         EXPECT_TRUE(wcscnt(text, text) && wcscnti(text, text) && wcsncnt(text, text, 0) && wcsncnti(text, text, 0));

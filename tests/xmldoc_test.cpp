@@ -43,6 +43,7 @@ void Open(Texts texts, Form form = Both) {
 } // namespace
 
 TEST(XmlDocument, TopLevel) {
+    // Intended: xml-no-element
     Open({"<?xml version='1.0'?> -> ", "<!--x--> -> ", " \r\n<a/>\t -> a"});
     Fail(1, {" \t\r\n^"});
     Fail(4, {"<a/></^", "<a/><^"});
@@ -53,6 +54,7 @@ TEST(XmlDocument, TopLevel) {
     EXPECT_EQ(OpenUtf16(u"\xFEFF\xFEFF<a/>").code, 5u);
 }
 
+// Intended: xml-declaration-end
 TEST(XmlDocument, IntendedDeclarationsRunToTheFirstBracketOutsideQuotes) {
     Open({"<!-- don't --><a/><!-- can't --><b/> -> b", "<!-- '>' --><a/> -> a", "<!x \"'>\" '\">'><a/> -> a",
           "<!--><a/> -> a", "<!DOCTYPE a SYSTEM \"a>.dtd\"><a/> -> a", "<![CDATA[x]]><a/> -> a"});
@@ -79,6 +81,7 @@ TEST(XmlDocument, TagsAndAttributes) {
     Open({"<_:a-1.b \t></_:a-1.b\r\n> -> _:a-1.b", "<\xC3\xA9\xE4\xB8\xAD\xCC\x81/> -> \\00E9\\4E2D\\0301",
           "<a b='\"'c=\"'\"d \t=\r\n ' 1 \t\r\n 2 ' >x</a> -> a b='\"' c=''' d='1 2':x",
           "<a b='<c>]]><!-- x --><![CDATA[y]]>'/> -> a b='<c>]]><!-- x --><![CDATA[y]]>'",
+          // Intended: xml-empty-attribute
           "<a b='' c='1' d=\" \n\"/> -> a c='1'", "<a b='&#32;'/> -> a b=' '", "<a b='' b='1'/> -> a b='1'"});
     Fail(1, {"<a>^", "<a><b/> ^"});
     Fail(3, {"<a b=^'1\"/>", "<a b=^\""});
@@ -105,6 +108,7 @@ TEST(XmlDocument, InstructionsAndSections) {
     Fail(4, {"<?a ^", "<?^", "<?a^>", "<?a?^ >", "<?a ^<b/>"});
     Fail(5, {"<?^?>", "<?^ a?>"});
     Fail(6, {"<?a text^?>", "<a><?b c='1' ^c='1'?></a>"});
+    // Intended: xml-text-or-children
     Fail(15, {"<a>x<?b?> ^y</a>", "<a>x<?b?>^<![CDATA[y]]></a>", "<a>x^<b/></a>", "<a><b/>^x</a>", "<a>x<?b?>^</b>"});
 
     Open({"<a><![CDATA[ <&#65; \n ]> ]]></a> -> a: <&#65; \\000A ]> ", "<a>p <![CDATA[ x ]]> q</a> -> a:p  x  q",
@@ -113,6 +117,7 @@ TEST(XmlDocument, InstructionsAndSections) {
     Fail(10, {"<a>^]]></a>", "<a>x ]^]]></a>"});
 }
 
+// Intended: xml-named-references
 TEST(XmlDocument, IntendedReferenceLookUpIsInverted) {
     Open({"<a>&lt;</a> -> a:>", "<a>&gt;</a> -> a:<", "<a>&amp;</a> -> a:<;", "<a>&apos;</a> -> a:<s;",
           "<a b='&quot;'/> -> a b='<t;'", "<a>&xyz</a> -> a:<", "<a>&   x</a> -> a:<x", "<a>&</a></a> -> a:<>",
@@ -127,6 +132,7 @@ TEST(XmlDocument, IntendedReferenceLookUpIsInverted) {
     Check<std::u16string>(u"<a>&\xDC00xzy</a>", kGood, 0, "a:<y");
 }
 
+// Intended: xml-numeric-references
 TEST(XmlDocument, IntendedNumericReferences) {
     Open({"<a b='&#65;'>&#00000000000000000000000000066;</a> -> a b='A':B", "<a>&#6:;&#:;</a> -> a:F\\000A",
           "<a> &#32;&#9;&#10;&#13; </a> -> a: \\0009\\000A\\000D", "<a>x &#32; y</a> -> a:x   y",
@@ -172,6 +178,7 @@ TEST(XmlDocument, CharactersOfUtf16) {
 }
 
 // Bytes that are no UTF-8 are refused before anything is read.
+// Intended: xml-bad-utf8
 TEST(XmlDocument, IntendedBadUtf8IsToldWithoutItsPlace) {
     for (const char* bad : {"\x80", "\xBF", "\xC3", "\xC3x", "\xE4\xB8", "\xE4\xB8x", "\xF0\x9F\x98", "\xF0\x9F\x98x",
                             "\xF5\x80\x80\x80", "\xF8\x88\x80\x80\x80", "\xFE", "\xFF"})

@@ -60,6 +60,7 @@ TEST(XmlTree, NamesAreChecked) {
     }
 }
 
+// Intended: xml-replace-empty
 TEST(XmlTree, NothingWorksOnAnEmptyHandleIntended) {
     CPXMLObject none;
     const CPXMLObject child = Named(L"c");
@@ -73,6 +74,7 @@ TEST(XmlTree, NothingWorksOnAnEmptyHandleIntended) {
     EXPECT_EQ(none.Replace(child, child).sIndex(), NotFound);
 }
 
+// Intended: xml-set-name
 TEST(XmlTree, SetNameDetachesIntended) {
     CPXMLObject element = Named(L"a");
     EXPECT_TRUE(element.AddAttribute(L"x", L"1"));
@@ -103,6 +105,7 @@ TEST(XmlTree, AttributesAndDataOutsideTheModel) {
     EXPECT_TRUE(element.FindAttribute(L"a") == L"4" && element.FindAttribute(L"d").isempty());
 
     EXPECT_TRUE(element.Add(static_cast<const wchar_t*>(nullptr)) && element.Add(L"x") && element.IsData(L"x"));
+    // Intended: xml-content-empty
     EXPECT_TRUE(element.GetContent().isempty()) << "always";
     EXPECT_TRUE(element.Set(Named(L"c")) && element.Set(*element.FindFirstElement(L"c"))) << "the child itself";
     EXPECT_EQ(Children(element), "c");
@@ -111,6 +114,7 @@ TEST(XmlTree, AttributesAndDataOutsideTheModel) {
     EXPECT_TRUE(element.SetTag(L"t", L"y") && element.FindElementData(L"t") == L"y");
 }
 
+// Intended: xml-insert-index
 TEST(XmlTree, InsertAnswersTheIndexAskedForIntended) {
     CPXMLObject parent = Parent({L"a", L"b"});
     EXPECT_EQ(parent.Insert(Named(L"c"), 99).sIndex(), 99u);
@@ -120,10 +124,12 @@ TEST(XmlTree, InsertAnswersTheIndexAskedForIntended) {
     EXPECT_TRUE(CountOf(parent) == 5 && !CanBeWritten(parent)) << "an empty handle is among the children";
 }
 
+// Intended: xml-kind-stays, xml-mixed-content
 TEST(XmlTree, KindStaysAfterSingleDeletesIntended) {
     CPXMLObject parent = Parent({L"a"});
     EXPECT_TRUE(parent.Delete(0) && parent.DeleteElements() && CanBeWritten(parent));
     EXPECT_TRUE(parent.Add(L"text") && !CanBeWritten(parent)) << "counts as children and data";
+    // Intended: xml-insert-beside-data
     EXPECT_FALSE(parent.Insert(Named(L"a"), 0)) << "refused beside data, where Add is not";
     EXPECT_TRUE(parent.Set(L"text") && CanBeWritten(parent));
 }
@@ -141,6 +147,7 @@ TEST(XmlTree, FormattedText) {
         EXPECT_TRUE(element.Sprintf(L"%*d", width, 1) && element.GetData().len() == std::size_t(width));
 }
 
+// Intended: xml-find-prev
 TEST(XmlTree, SearchesGoOnFromAResultIntended) {
     CPXMLObject parent = Parent({L"a", L"b", L"a"});
     EXPECT_TRUE(parent.item(2).Add(L"text") && parent.item(2).AddAttribute(L"k", L"v"));
@@ -196,6 +203,8 @@ TEST(XmlTree, FailingAllocationsLeaveElementsUsable) {
             const bool added = bool(element.Add(leaf));
             ASSERT_EQ(CountOf(element), count + added);
         }
+        // Intended: xml-cadd
+        ASSERT_TRUE(other.CAdd(element)) << "true, also without the memory for it";
         const bool named = element.AddAttribute(kName, kValue);
         ASSERT_EQ(element.GetNAttributes(), named ? 1u : 0u);
         // Setting an attribute anew takes no memory.

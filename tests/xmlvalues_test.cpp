@@ -168,7 +168,7 @@ static_assert(CanTag<unsigned long> == (sizeof(long) == 8), "32 bits on one syst
 static_assert(kNoneFits<void*, const int*, CRational*, const unsigned short*> && !CanTag<const wchar_t*, int>);
 static_assert(CanAdd<std::nullptr_t> && CanTag<const char*> && CanTag<const unsigned char*>, "text, not bool");
 
-// Intended: low-half-first
+// Intended: xml-low-half-first
 TEST(XmlValues, BytesLowHalfFirstIntended) {
     const unsigned char few[] = {0x12, 0xAB};
     EXPECT_EQ(Stored(few, 2ULL), "21BA");
@@ -267,7 +267,7 @@ TEST(XmlValues, BoolsInAnyCaseKeepsBlocks) {
         EXPECT_EQ(Read(Named("Bool"), text), *text == L'T' ? "yes" : "no");
 }
 
-// Intended: numbers-of-mixed-elements
+// Intended: xml-mixed-numbers
 TEST(XmlValues, ElementsWithChildrenHaveNoNumbersIntended) {
     const CPPoolString text = L"3/4";
     CPXMLObject mixed = Element(text), parent = Element();
@@ -324,7 +324,7 @@ TEST(XmlValues, DecimalTextsReadAsTheStandardLibraryDoes) {
     EXPECT_EQ(ReadDouble(std::string(5000, '1') + "e-4999"), ReadDouble("1." + std::string(30, '1')));
 }
 
-// Intended: hexadecimal-writer
+// Intended: xml-hexadecimal-writer
 TEST(XmlValues, NoReaderOfTheUnsignedWriterIntended) {
     CPXMLObject element = Element();
     EXPECT_TRUE(element.Add(0x9000000A1ULL));
@@ -333,13 +333,13 @@ TEST(XmlValues, NoReaderOfTheUnsignedWriterIntended) {
     EXPECT_EQ(Bits(element.GetDataEDouble()), 0x9000000A1u);
 }
 
-// Intended: decimal-of-double-text
+// Intended: xml-double-text
 TEST(XmlValues, DecimalReaderOfDoublesOwnTextIntended) {
     EXPECT_EQ(Element(L"3ff8000000000000(1.5)").GetDataDouble(), 3);
     EXPECT_EQ(Element(L"400e000000000000(3.75)").GetDataDouble(), 400);
 }
 
-// Intended: local-decimal-point
+// Intended: xml-decimal-point
 TEST(XmlValues, LocalesMoveOneDecimalPointIntended) {
     const auto all = [] {
         std::string texts = Stored(-1234.5) + Stored(CRational(-5, 3)) + Stored(timecode(1LL, 0));

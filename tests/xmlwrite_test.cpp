@@ -29,6 +29,7 @@ std::string Written(const CPXMLObject& element) {
 
 } // namespace
 
+// Intended: xml-pair-written
 TEST(XmlWrite, SurrogatesAreNotCombinedIntended) {
     for (const wchar_t* pair : {L"\xD83D\xDE00", L"\xD87D\xDE00", L"\xD83D\xFFFF", L"\xD83D\xDBFF"})
         EXPECT_EQ(Written(WithData(pair)), kDeclaration + "<e>\x01</e>");
@@ -53,6 +54,7 @@ TEST(XmlWrite, FilesAreReplacedOrDeleted) {
     EXPECT_TRUE(root.Write(path, XMLEncodingUTF16, false));
     EXPECT_EQ(support::Get(path).substr(78, 8), std::string("<\0e\0>\0<\0", 8)) << "no mark";
 
+    // Intended: xml-write-replaces
     EXPECT_FALSE(mixed.Write(path, XMLEncodingUTF8, false));
     EXPECT_EQ(support::Get(path), "(no file)");
     support::Put(path, "x");

@@ -51,7 +51,7 @@ struct tagCPATHPARSEINFO {
 /// Takes @p path apart; looks at the text only. The parts point into @p path.
 /// @return false, with an empty record, for a null or empty path.
 TAVO_API bool FU_ParsePath(const wchar_t* path, tagPATHPARSEINFO& info) noexcept;
-/// The same into texts of their own. False, with an empty record, also without memory.
+/// The same into texts of their own; @p path may be one of them. False, with an empty record, also without memory.
 TAVO_API bool FU_ParsePath(const wchar_t* path, tagCPATHPARSEINFO& info) noexcept;
 
 /// Joins the parts. A folder that lacks its last separator gets one before a name: the first one used in the root or

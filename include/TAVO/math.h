@@ -67,7 +67,8 @@ public:
 
     CRational operator-() const noexcept { return Raw(Negated(m_num), m_den); }
     /// The magnitude.
-    // Intended: a textbook's unary plus gives the value itself; hosts use this one as their absolute value.
+    // Intended (rational-plus): a textbook's unary plus gives the value itself; hosts use this one as their absolute
+    // value.
     CRational operator+() const noexcept { return Raw(m_num < 0 ? Negated(m_num) : m_num, m_den); }
     /// The reciprocal; 1/0 for zero, 0/1 for the undefined value.
     CRational operator~() const noexcept { return m_num < 0 ? Raw(Negated(m_den), Negated(m_num)) : Raw(m_den, m_num); }

@@ -273,6 +273,7 @@ public:
     /// The system word without its code.
     ulong32 GetFlags() const noexcept { return m_sys & ~15u; }
     bool IsAssigned() const noexcept { return (m_sys & kUnassigned) == 0; }
+    // Intended (timecode-defined): a textbook, and TCINFO, would not call an unassigned value defined.
     /// Whether the value is not invalid; an unassigned one counts as defined.
     bool IsDefined() const noexcept { return (m_sys & kInvalid) == 0; }
     /// True for count 0 and for unassigned values.

@@ -59,9 +59,9 @@ IACFUnknown* CPIACFUnknown::Resolve() const noexcept {
     // A pointer that lacks the type must not stay: it would be released once more as if it had been checked.
     m_pointer = Marked(queried ? stored : nullptr);
     ReleaseQuietly(stored);
-    // Intended: what was queried is answered, what was stored stays stored. A textbook would store the queried pointer.
-    // The two differ only where a creation call wrote a pointer of another type than the wrapper's, against its
-    // promise.
+    // Intended (wrapper-keeps-stored): what was queried is answered, what was stored stays stored. A textbook would
+    // store the queried pointer. The two differ only where a creation call wrote a pointer of another type than the
+    // wrapper's, against its promise.
     return queried;
 }
 
@@ -88,8 +88,8 @@ std::uint32_t CPIACFUnknown::GetLockCount() const noexcept {
 
 bool CPIACFUnknown::Create(Creation what, const _acfUID& cls, IACFComponentFactory* factory) noexcept {
     free();
-    // Intended: without a factory the answer is true, since the empty word is not zero. A textbook would answer false;
-    // hosts that create through an optional factory look at the wrapper.
+    // Intended (create-without-factory): without a factory the answer is true, since the empty word is not zero. A
+    // textbook would answer false; hosts that create through an optional factory look at the wrapper.
     if (!factory) return true;
     const auto create =
         what == Creation::Component ? &IACFComponentFactory::CreateComponent : &IACFComponentFactory::CreateInstance;

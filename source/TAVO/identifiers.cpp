@@ -69,8 +69,8 @@ template <class Unit> bool Read(const Unit* text, _acfUID& uid) noexcept {
         const Unit* last = nullptr;
         for (const Unit* at = text; *at; ++at)
             if (*at == '-') last = at, ++dashes;
-        // Intended: text that has not four dashes is the null identifier and no error. A textbook would refuse it;
-        // hosts store nothing, or a word of their own, where there is no component.
+        // Intended (identifier-dashes): text that has not four dashes is the null identifier and no error. A textbook
+        // would refuse it; hosts store nothing, or a word of their own, where there is no component.
         if (dashes != 4) return true;
         if (!ReadGroups(text, last, read)) return false;
     }

@@ -80,8 +80,8 @@ bool DeriveProcessFacts(const wchar_t* executablePath, ProcessFacts& facts) noex
     if (!separator) return false;
     CopyText(facts.processName, separator + 1, kFactUnits);
 
-    // Intended: as many units as lead up to the separator, but copied from the separator on. A textbook would copy the
-    // folder from the start of the path; hosts have stored and compare this text.
+    // Intended (startup-path): as many units as lead up to the separator, but copied from the separator on. A textbook
+    // would copy the folder from the start of the path; hosts have stored and compare this text.
     const auto folderUnits = static_cast<std::size_t>(separator - executablePath) + 1;
     CopyText(facts.startupPath, separator, folderUnits < kFactUnits ? folderUnits : kFactUnits);
     for (wchar_t* unit = facts.startupPath; *unit; ++unit)
@@ -118,8 +118,9 @@ bool CountedServices::Enter() noexcept {
     for (;;) {
         std::uint32_t count = m_count;
         if (count != 0) {
-            // Intended: this also counts on after a failed start, whose count stays raised, and then answers true
-            // without trying again. A textbook would take the failed call back; hosts pair every call with one AppExit.
+            // Intended (failed-start-counts): this also counts on after a failed start, whose count stays raised, and
+            // then answers true without trying again. A textbook would take the failed call back; hosts pair every call
+            // with one AppExit.
             if (m_count.compare_exchange_weak(count, count + 1)) return true;
             continue;
         }
@@ -136,8 +137,8 @@ void CountedServices::Leave() noexcept {
     for (;;) {
         std::uint32_t count = m_count;
         if (count != 1) {
-            // Intended: from 0 the count wraps, so that the next AppInit does not reach 1 and starts nothing. A
-            // textbook would refuse; the count is the host's promise of pairs and is taken as it comes.
+            // Intended (exit-wraps): from 0 the count wraps, so that the next AppInit does not reach 1 and starts
+            // nothing. A textbook would refuse; the count is the host's promise of pairs and is taken as it comes.
             if (m_count.compare_exchange_weak(count, count - 1)) return;
             continue;
         }
@@ -174,6 +175,7 @@ tagSWITCHES GetSwitches() noexcept {
 namespace Core::OS {
 
 unsigned long long GetTimeNow() { return Platform::GetUtcMilliseconds(); }
+// Intended (platform-name): on every system; hosts compare it.
 const wchar_t* GetPlatformString() { return L"Windows"; }
 const wchar_t* GetProcessName() { return g_facts.processName; }
 const wchar_t* GetStartupPath() { return g_facts.startupPath; }

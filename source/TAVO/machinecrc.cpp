@@ -20,8 +20,8 @@ CMachineCRC::CMachineCRC(std::uint32_t width, unsigned long long polynomial) noe
 }
 
 unsigned long long CMachineCRC::Eval(const void* data, std::size_t length, unsigned long long initial) const noexcept {
-    // Intended: a shift of 0 means an invalid width or width 8, and neither computes anything. A textbook 8-bit checksum
-    // would; hosts that stored its initial value would notice.
+    // Intended (crc-eight-bits): a shift of 0 means an invalid width or width 8, and neither computes anything. A
+    // textbook 8-bit checksum would; hosts that stored its initial value would notice.
     if (m_shift == 0) return initial;
     // The library's own polynomial is told by entry 1; its long table stands in constants.
     if (m_shift == 56 && m_table[1] == crc64::kPolynomial) return crc64::AddBytes(initial, data, length);

@@ -288,8 +288,8 @@ bool UnregisterRequest(const CPObjectMemory& request) noexcept {
             if (entry) entry->flags |= late ? Entry::Retired | Entry::RemoveAfterRun : Entry::Retired;
         }
         if (late) break;
-        // Intended: also from inside the request's own run, which cannot end meanwhile. A textbook would refuse at
-        // once.
+        // Intended (unregister-own-run): also from inside the request's own run, which cannot end meanwhile. A textbook
+        // would refuse at once.
         Platform::SleepMilliseconds(kStepMilliseconds);
     }
     Develop::_logWrite(acfDebugError, kCategory, kSource, 0,

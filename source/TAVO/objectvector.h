@@ -110,12 +110,15 @@ template <class T> bool CPObjectVector<T>::Resize(std::size_t count) noexcept {
 
 template <class T> bool CPObjectVector<T>::Insert(const T& element, std::size_t position) noexcept {
     T inserted(element); // counted before anything moves: the argument may live in this very vector
-    // Growth is linear by 16 elements on purpose: most vectors are short, and long ones are reserved by their builders.
+    // Intended (vector-growth): by 16 elements, where a textbook grows by a factor. Most vectors are short, and long
+    // ones are reserved by their builders, who read the capacities.
     return InsertMoved(std::move(inserted), position, GetNItems() + 16);
 }
 
 template <class T>
 bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept {
+    // Intended (vector-shared): with room the block changes in place also when it is shared, and every holder sees it.
+    // A textbook would copy first; holders pass lists on that way, and clone() where they must not.
     const std::size_t count = GetNItems();
     if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(capacityWhenFull)) return false;
     SetSize((count + 1) * sizeof(T));

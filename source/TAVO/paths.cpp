@@ -188,8 +188,11 @@ bool FU_ParsePath(const wchar_t* path, tagPATHPARSEINFO& info) noexcept {
 }
 
 bool FU_ParsePath(const wchar_t* path, tagCPATHPARSEINFO& info) noexcept {
+    const std::size_t length = LengthOf(path);
+    Scratch copy(length); // since the path may be one of the record's own texts
+    if (copy.Get()) copy.Append(path, length);
     tagPATHPARSEINFO parts;
-    const bool ok = FU_ParsePath(path, parts) && Assign(info.sRoot, parts.pRoot, parts.nRoot) &&
+    const bool ok = FU_ParsePath(copy.Get(), parts) && Assign(info.sRoot, parts.pRoot, parts.nRoot) &&
                     Assign(info.sFolder, parts.pFolder, parts.nFolder) &&
                     Assign(info.sStem, parts.pStem, parts.nStem) &&
                     Assign(info.sExtension, parts.pExtension, parts.nExtension);

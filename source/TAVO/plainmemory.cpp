@@ -38,13 +38,14 @@ bool CPPlainMemory::_Resize(std::size_t size, const tagCPOVTABL* table) noexcept
         Free(std::exchange(m_pMH, block));
         return true;
     }
-    // Intended: the block changes in place even when it is shared, so every holder sees the new size. A textbook buffer
-    // would copy first; callers that want that call clone().
+    // Intended (resize-shared): the block changes in place even when it is shared, so every holder sees the new size. A
+    // textbook buffer would copy first; callers that want that call clone().
     return SetSize(size);
 }
 
 bool CPPlainMemory::_Reserve(std::size_t capacity, const tagCPOVTABL* table) noexcept {
-    // Intended: compared with the used size, not the capacity, so a reserve within spare capacity takes a new block.
+    // Intended (reserve-used-size): compared with the used size, not the capacity, so a reserve within spare capacity
+    // takes a new block.
     if (capacity <= GetSize()) return true;
     if (GetSize() == 0) return Reserve(capacity, table);
     tagCPOMEMHEADER* grown = NewBlock(capacity, m_pMH->sUsed, table);
@@ -56,7 +57,8 @@ bool CPPlainMemory::_Reserve(std::size_t capacity, const tagCPOVTABL* table) noe
 
 bool CPPlainMemory::isMemory(const void* address) const noexcept {
     if (!m_pMH || !address) return false;
-    // Intended: the lower bound is the header's first byte, so addresses inside the header are accepted too.
+    // Intended (memory-header): the lower bound is the header's first byte, so addresses inside the header are accepted
+    // too.
     const auto at = reinterpret_cast<std::uintptr_t>(address);
     const auto start = reinterpret_cast<std::uintptr_t>(m_pMH);
     return at > start && at < start + sizeof(tagCPOMEMHEADER) + m_pMH->sAllocated;

@@ -59,6 +59,7 @@ CPPoolStringArray& CPPoolStringArray::operator=(const Buffers::CPObjectMemory& b
     else
         m_elements.free();
     if (!m_sorted) return *this;
+    // Intended (array-duplicates): sorted, and yet duplicates stay, which a set would drop; the counts are the block's.
     Sort();
     // Without memory for a copy of its own a shared block stays as it is, and a set out of order finds nothing.
     if (!IsInOrder()) m_elements.free();
@@ -79,6 +80,8 @@ void CPPoolStringArray::Sort() noexcept {
 }
 
 std::size_t CPPoolStringArray::LocateEntry(const CPPoolString& text) const noexcept {
+    // Intended (array-locate): "not found" has no answer here but for arrays that never held anything; others tell
+    // where the text would stand, also when they are empty again.
     if (!m_sorted || !m_elements.key()) return Buffers::NotFound;
     std::size_t count;
     const CPPoolString* elements = m_elements.GetArray(count);
@@ -141,8 +144,8 @@ bool CPPoolStringArray::Inflate(const CPPoolString& text, wchar_t separator) noe
         if (!AddPiece(piece, static_cast<std::size_t>(unit - piece))) return false;
         piece = unit + 1;
     }
-    // Intended: a trailing empty piece adds nothing, while others add the null string. A textbook split would treat all
-    // alike; lists that end in a separator would grow by an element.
+    // Intended (split-trailing): a trailing empty piece adds nothing, while others add the null string. A textbook
+    // split would treat all alike; lists that end in a separator would grow by an element.
     return piece == end || AddPiece(piece, static_cast<std::size_t>(end - piece));
 }
 

@@ -8,7 +8,9 @@
 namespace TAVO::String::pool {
 
 struct Key {
-    std::size_t length = 0;   // 1 per value below 10000, else 2; a pair of wide text is one value (0 or 1)
+    // Intended (pool-length): 1 per value below 10000, else 2. A pair of wide text is one value (0 or 1) and counts 1,
+    // the same character from UTF-8 counts 2, so that the two are different entries. A textbook would count units.
+    std::size_t length = 0;
     std::size_t utf8Size = 0; // bytes of the text in UTF-8
     std::uint64_t hash = 0;   // CRC-64 of the values' low 16 bits, low byte first
     std::uint64_t hashi = 0;  // the same with A to Z folded

@@ -74,7 +74,6 @@ void Lock::EndFavour() noexcept {
     if (m_favourite.load(std::memory_order_relaxed) == 0) return;
     m_favourite.store(0, std::memory_order_relaxed);
     Platform::FlushProcessors();
-    if (m_neededStreak < kLongestStreak) m_neededStreak *= 2;
 }
 
 void Lock::WaitForRival() noexcept {

@@ -11,7 +11,8 @@
 // more: it writes down that it is in, then looks whether it still is the favourite. Any other thread takes the lock as
 // always, which keeps further ones out, ends the favour and makes all processors pass a barrier. After that, either the
 // favourite sees the end and retreats, or the other sees that it is in and waits for it to leave. Without such a
-// barrier there are no favourites.
+// barrier there are no favourites. Each favour has a mark of its own for "in": a thread that was held up before writing
+// down that it is in must not, when it retreats at last, wipe out the mark of a later favourite.
 //
 // Whoever comes by while the lock is free may take it ahead of sleepers. But one that has slept for long gets it handed
 // over by a thread that leaves, so a thread that takes it again and again without a pause keeps nobody out for good.
@@ -62,14 +63,16 @@ public:
         if (std::exchange(m_ownerTook, false))
             m_taken.store(false, std::memory_order_release);
         else
-            m_favouriteIn.store(false, std::memory_order_release);
+            m_in[m_favour].store(false, std::memory_order_release);
         WakeSleepers();
     }
 
 private:
     // Entries in a row that make a favourite, doubled each time a favour ends: ending one costs as much as some
     // thousand exchanges.
-    static constexpr std::uint32_t kFirstStreak = 4096, kLongestStreak = 1u << 30;
+    static constexpr std::uint32_t kFirstStreak = 4096;
+    // After the last one there are no favourites any more; its streak takes two thousand million entries.
+    static constexpr std::uint32_t kFavours = 20;
 
     // Only the owner itself can find its own number there.
     bool IsReentry(std::uint32_t self) noexcept {
@@ -79,11 +82,13 @@ private:
     }
 
     bool EnterFavoured(std::uint32_t self) noexcept {
-        if (m_favourite.load(std::memory_order_relaxed) != self) return false;
-        m_favouriteIn.store(true, std::memory_order_relaxed);
+        const std::uint64_t favourite = m_favourite.load(std::memory_order_relaxed);
+        if (static_cast<std::uint32_t>(favourite) != self) return false;
+        std::atomic<bool>& in = m_in[favourite >> 32];
+        in.store(true, std::memory_order_relaxed);
         std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
-        if (TAVO_UNLIKELY(m_favourite.load(std::memory_order_acquire) != self)) {
-            m_favouriteIn.store(false, std::memory_order_release);
+        if (TAVO_UNLIKELY(m_favourite.load(std::memory_order_acquire) != favourite)) {
+            in.store(false, std::memory_order_release);
             WakeSleepers();
             return false;
         }
@@ -96,7 +101,7 @@ private:
 
     // Asked by the one that took the lock: whether a favourite may come in, or is in.
     bool HasRival() const noexcept {
-        return m_favourite.load(std::memory_order_relaxed) != 0 || m_favouriteIn.load(std::memory_order_acquire);
+        return m_favourite.load(std::memory_order_relaxed) != 0 || m_in[m_favour].load(std::memory_order_acquire);
     }
 
     void Own(std::uint32_t self) noexcept {
@@ -106,8 +111,9 @@ private:
         if (m_latest != self) {
             m_latest = self;
             m_streak = 0;
-        } else if (TAVO_UNLIKELY(++m_streak >= m_neededStreak) && m_flushes) {
-            m_favourite.store(self, std::memory_order_relaxed);
+        } else if (TAVO_UNLIKELY(++m_streak >> m_favour >= kFirstStreak) && m_flushes && m_favour + 1 < kFavours) {
+            m_streak = 0;
+            m_favourite.store(std::uint64_t{++m_favour} << 32 | self, std::memory_order_relaxed);
         }
     }
 
@@ -129,14 +135,15 @@ private:
 
     const bool m_flushes = Platform::CanFlushProcessors();
     std::atomic<bool> m_taken{false};
-    std::atomic<bool> m_favouriteIn{false};    // or about to see that it no longer is the favourite
     std::atomic<std::uint32_t> m_owner{0};     // thread id; 0 when nobody is in
-    std::atomic<std::uint32_t> m_favourite{0}; // thread id; 0: none
     std::atomic<std::uint32_t> m_sleepers{0};  // threads that sleep or are about to
+    std::atomic<std::uint64_t> m_favourite{0}; // number of the favour and thread id; 0: none
+    std::atomic<bool> m_in[kFavours] = {};     // the favourite is in, or about to see that it no longer is one
     // The owner's.
     std::uint32_t m_depth = 0;
     bool m_ownerTook = false; // false for a favourite
-    std::uint32_t m_latest = 0, m_streak = 0, m_neededStreak = kFirstStreak;
+    std::uint32_t m_latest = 0, m_streak = 0;
+    std::uint32_t m_favour = 0; // the latest
 
     boost::mutex m_mutex;
     boost::condition_variable m_left, m_rivalLeft;

@@ -27,7 +27,7 @@ CPPoolString::CPPoolString(const char* text) noexcept
     : CPPoolString(CStringPool::GetStringRef(static_cast<const wchar_t*>(CACFWChar(text)))) {}
 
 CPPoolString::CPPoolString(std::uint32_t number, bool isSigned) noexcept {
-    // Intended: 32 bits, also for 64-bit types: 4294967296 gives "0". Stored names were made so.
+    // Intended (number-32-bits): 32 bits, also for 64-bit types: 4294967296 gives "0". Stored names were made so.
     const bool negative = isSigned && number >> 31;
     std::uint32_t rest = negative ? 0u - number : number;
     unsigned char digits[16], *first = digits + sizeof(digits);
@@ -94,8 +94,8 @@ CPPoolString::operator const unsigned char*() const noexcept {
     const std::size_t size = entry.utf8Size + 1;
     auto* bytes = static_cast<unsigned char*>(Platform::Allocate(size));
     if (!bytes) return kNone;
-    // Intended: len() + 1 is the source length, so a text with two pairs or more, or one interned from UTF-8 with a
-    // character above FFFF, does not come out at its size and has no UTF-8 form.
+    // Intended (pool-utf8-size): len() + 1 is the source length, so a text with two pairs or more, or one interned from
+    // UTF-8 with a character above FFFF, does not come out at its size and has no UTF-8 form.
     if (acfWChar_To_UTF8(entry.text, entry.length + 1, bytes, size) != size) {
         Platform::Release(bytes);
         return kNone;
@@ -144,7 +144,7 @@ Operand Of(const CPPoolString& text) {
 }
 Operand Of(const wchar_t* text) { return {text, text ? detail::WideLength(text) : 0}; }
 
-// Intended: a null text sorts before everything here, while wcscmpi sorts it last.
+// Intended (pool-null-first): a null text sorts before everything here, while wcscmpi sorts it last.
 int Compare(const wchar_t* a, const wchar_t* b) {
     if (a == b) return 0;
     if (!a || !b) return a ? 1 : -1;
@@ -199,6 +199,8 @@ int CPPoolString::cmppi(const wchar_t* other) const noexcept {
     return len() < start.length ? -1 : ComparePrefixFolded(Entry().text, start);
 }
 
+// Intended (pool-suffix): offsets and limits are len() here and below, where a textbook would count units; with pairs
+// in the text they lie one unit per pair too early. Results that hosts sorted by would change.
 int CPPoolString::cmp_p(const CPPoolString& other) const noexcept {
     if (*this == other) return 0;
     if (len() < other.len()) return -1;

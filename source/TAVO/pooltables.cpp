@@ -175,11 +175,12 @@ long32 CCaseSensitiveHash::CompareItems(const CPObjectMemory& first, const CPObj
 }
 
 // The argument, the walk and the table hold the entry: with a count of 3 nobody else does. Then no handle is left to
-// copy from, and look-ups need the lock, so the verdict stays true while the lock is held.
+// copy from, and look-ups need the lock or are kept out, so the verdict stays true while the lock is held.
 bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
     PoolEntry& entry = *Block::PayloadOf<PoolEntry>(item);
     const auto held = static_cast<std::int32_t>(item.lockcnt());
     if (held <= 0) return false; // a static entry
+    // Intended (pool-idle): being looked up does not count as use, as it would in a textbook cache; being held does.
     if (held != 3) {
         entry.idleSweeps = 0;
         return false;
@@ -189,9 +190,19 @@ bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
     return false;
 }
 
+bool CCaseSensitiveHash::Dispose(std::uint32_t budget) noexcept {
+    if (!m_front.Close()) return false;
+    const bool finished = DisposeTable(budget);
+    m_front.Open();
+    return finished;
+}
+
 void CCaseSensitiveHash::Clear() noexcept {
+    if (!m_front.Close()) return;
     m_front.Clear();
+    m_groups.Clear(); // first: it holds entries without counting them
     ClearTable();
+    m_front.Open();
 }
 
 void CCaseSensitiveHash::OnDispose(const CPObjectMemory& item) {

@@ -13,13 +13,18 @@ class CCaseSensitiveHash final : public Lookup::CBaseHashTable {
 public:
     explicit CCaseSensitiveHash(class CCaseInsensitiveHash& groups);
 
-    using CBaseHashTable::DisposeTable;
     using CBaseHashTable::EnumTableBy;
     using CBaseHashTable::Place;
 
-    // The entry of that text; else null, and `place` tells where it would stand.
-    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place) {
-        if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
+    // The entry of that text, counted for the caller, if it can be told without the pool's lock.
+    template <class Text> PoolFront::Shared Share(const Text& text) noexcept { return m_front.Share(text); }
+
+    // The entry of that text; else null, and `place` tells where it would stand. `searched` is what Share told.
+    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, Place& place, bool searched = true) {
+        if (!searched) {
+            m_front.Join();
+            if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
+        }
         Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
         if (found) m_front.Remember(found);
         return found;
@@ -52,7 +57,10 @@ public:
 
     // Enters both tables or none, taking over the reference; false without memory.
     bool Add(const Place& place, Buffers::CPObjectMemory&& entry) noexcept;
-    // Lets everything go.
+    // Drops entries that nobody has held for two sweeps. False when the time was too short, or a thread was stopped in
+    // the middle of a look-up.
+    bool Dispose(std::uint32_t budget) noexcept;
+    // Lets everything go, groups too; nothing when a thread was stopped in the middle of a look-up.
     void Clear() noexcept;
 
 private:

@@ -12,8 +12,9 @@
 
 namespace TAVO::String::pool {
 
-// Intended: once length and both hashes agree, ten units of the actual texts decide, so two texts that agree so far are
-// one entry. A textbook pool would compare them whole; look-ups here never touch more than the first cache lines.
+// Intended (ten-units): once length and both hashes agree, ten units of the actual texts decide, so two texts that
+// agree so far are one entry. A textbook pool would compare them whole; look-ups here never touch more than the first
+// cache lines.
 constexpr std::size_t kComparedUnits = 10;
 
 template <bool folded, class Unit> int CompareFirstUnits(const Unit* text, std::size_t units, const wchar_t* stored) {

@@ -25,7 +25,8 @@ CMTRandom::CMTRandom() : m_modulus(0), m_factor(1.0 / kLargestOutput) { seed(See
 void CMTRandom::seed(std::uint32_t value) {
     m_state[0] = value;
     for (std::uint32_t i = 1; i < kTwisterWords; ++i) m_state[i] = SeedWord(m_state[i - 1], i);
-    // Intended: the seeded words themselves are the first 624 outputs. The reference twister regenerates first.
+    // Intended (random-first-outputs): the seeded words themselves are the first 624 outputs. The reference twister
+    // regenerates first.
     m_index = 0;
 }
 

@@ -17,8 +17,8 @@ constexpr std::uint32_t SeedWord(std::uint32_t previous, std::uint32_t index) {
 // The regenerated word from itself, the one behind it and the one 397 places on.
 constexpr std::uint32_t Twist(std::uint32_t word, std::uint32_t next, std::uint32_t distant) {
     const std::uint32_t value = ((word & 0x80000001u) | (next & 0x7FFFFFFEu)) >> 1 ^ distant;
-    // Intended: the new value is tested for oddness, where the reference twister tests `next`. Seeds that hosts stored
-    // must keep their sequences.
+    // Intended (random-oddness): the new value is tested for oddness, where the reference twister tests `next`. Seeds
+    // that hosts stored must keep their sequences.
     return value & 1 ? value ^ 0x9908B0DFu : value;
 }
 

@@ -84,8 +84,8 @@ void RequestList::Clear() noexcept {
 std::size_t RequestList::Choose(unsigned long long now) noexcept {
     constexpr std::int32_t kHighestBonus = std::numeric_limits<std::int32_t>::max();
     std::size_t best = Buffers::NotFound;
-    // Intended: only what is above the lowest priority can be chosen, so a request of exactly that one waits a pass
-    // until its bonus lifts it. A textbook would take the first that is due.
+    // Intended (lowest-priority): only what is above the lowest priority can be chosen, so a request of exactly that
+    // one waits a pass until its bonus lifts it. A textbook would take the first that is due.
     std::int64_t bestUrgency = std::numeric_limits<std::int32_t>::min();
     for (std::size_t i = 0; i < m_count; ++i) {
         Entry& entry = m_entries[i];

@@ -50,6 +50,13 @@ TAVO_INLINE std::uint32_t Mask(Block a) { return static_cast<std::uint32_t>(_mm_
 // The bytes as 16-bit units, low and high half.
 TAVO_INLINE Block WidenLow(Block a) { return _mm_unpacklo_epi8(a, _mm_setzero_si128()); }
 TAVO_INLINE Block WidenHigh(Block a) { return _mm_unpackhi_epi8(a, _mm_setzero_si128()); }
+// The low or high halves of both, lanes of so many bytes in turns.
+template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Block b) {
+    static_assert(lane == 1 || lane == 4 || lane == 8);
+    if constexpr (lane == 1) return high ? _mm_unpackhi_epi8(a, b) : _mm_unpacklo_epi8(a, b);
+    if constexpr (lane == 4) return high ? _mm_unpackhi_epi32(a, b) : _mm_unpacklo_epi32(a, b);
+    return high ? _mm_unpackhi_epi64(a, b) : _mm_unpacklo_epi64(a, b);
+}
 // Bytes of two blocks of 16-bit units, in order; of units from 100 up 255, from 8000 up 0 or 255.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
@@ -247,6 +254,14 @@ inline Block WidenLow(Block a) {
 inline Block WidenHigh(Block a) {
     Block x{};
     for (int i = 0; i < 8; ++i) x.b[i * 2] = a.b[i + 8];
+    return x;
+}
+template <std::size_t lane, bool high> Block Interleave(Block a, Block b) {
+    Block x;
+    for (std::size_t i = 0, from = high ? 8 : 0; i < 16; i += 2 * lane, from += lane) {
+        std::memcpy(x.b + i, a.b + from, lane);
+        std::memcpy(x.b + i + lane, b.b + from, lane);
+    }
     return x;
 }
 inline Block Narrow(Block a, Block b) {

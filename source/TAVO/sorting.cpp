@@ -28,8 +28,9 @@ namespace Sort {
 
 namespace {
 
-// The one sort behind both spellings. Ranges are inclusive, in element indexes; the order of equal elements is visible
-// to callers, so every step is fixed.
+// The one sort behind both spellings. Ranges are inclusive, in element indexes.
+// Intended (sort-equal-elements): not stable, and yet every step is fixed, since the order of equal elements is visible
+// to callers. A textbook sort would promise one or nothing.
 template <class Order> class Sorter {
 public:
     Sorter(void* base, std::size_t size, Order order)

@@ -18,8 +18,8 @@ using SteadyClock = boost::chrono::steady_clock;
 SteadyClock::time_point DeadlineIn(ulong32 ms) { return SteadyClock::now() + boost::chrono::milliseconds(ms); }
 
 struct ThreadState {
-    // Intended: a thread whose last handle goes runs on by itself. A textbook would wait for it or end the process; but
-    // the last handle may go on the thread itself, and hosts start threads that they never look after.
+    // Intended (thread-runs-on): a thread whose last handle goes runs on by itself. A textbook would wait for it or end
+    // the process; but the last handle may go on the thread itself, and hosts start threads that they never look after.
     ~ThreadState() { thread.detach(); }
 
     bool IsCurrent() const { return thread.get_id() == boost::this_thread::get_id(); }
@@ -153,8 +153,8 @@ void SetThreadPriority(eThreadPriority priority) noexcept {
 eThreadPriority GetThreadPriority() noexcept {
     const int priority = Platform::GetThreadPriority();
     if (priority == 0) return ThreadPriorityNormal;
-    // Intended: one step above or below normal reads as high or low, which would be set as two steps. A textbook would
-    // give back what it can set; hosts compare with the five levels.
+    // Intended (priority-levels): one step above or below normal reads as high or low, which would be set as two steps.
+    // A textbook would give back what it can set; hosts compare with the five levels.
     if (priority > 0) return priority <= 2 ? ThreadPriorityHigh : ThreadPriorityTimeCritical;
     return priority >= -2 ? ThreadPriorityLow : ThreadPriorityIdle;
 }

@@ -29,7 +29,8 @@ long long RoundAway(double value) noexcept { return Truncate(value < 0 ? value -
 // count / unit: 1 rounds away from zero, -1 divides without a sign, everything else rounds halves away from zero.
 long32 CountUnits(long long count, ulong32 unit, int mode) noexcept {
     const auto bits = static_cast<unsigned long long>(count);
-    // Intended: a textbook would round a negative count down; its unsigned quotient is what hosts have stored.
+    // Intended (timecode-count-units): a textbook would round a negative count down; its unsigned quotient is what
+    // hosts have stored.
     if (mode == -1) return static_cast<long32>(bits / unit);
     const unsigned long long magnitude = count < 0 ? 0 - bits : bits;
     const unsigned long long units = (magnitude + (mode == 1 ? unit - 1 : unit / 2)) / unit;
@@ -139,7 +140,8 @@ timecode& timecode::Multiply(long long factor) noexcept {
     return __builtin_mul_overflow(m_count, factor, &m_count) ? Invalidate() : *this;
 }
 
-// Intended: 0.5 is added to negative results too, so that they are not rounded half away from zero as a textbook would.
+// Intended (timecode-half): 0.5 is added to negative results too, so that they are not rounded half away from zero as a
+// textbook would.
 timecode& timecode::Multiply(double factor) noexcept {
     return SetTruncated(static_cast<double>(m_count) * factor + 0.5);
 }
@@ -152,7 +154,7 @@ timecode& timecode::Divide(long long divisor) noexcept {
 }
 
 timecode& timecode::Divide(double divisor) noexcept {
-    // Intended: negative divisors are refused with the small ones.
+    // Intended (timecode-divisor): negative divisors are refused with the small ones.
     if (!(divisor >= 0.000001)) return *this = timecode(0LL, kInvalid);
     return SetTruncated(static_cast<double>(m_count) / divisor + 0.5);
 }
@@ -173,7 +175,7 @@ timecode& timecode::Scale(long32 num, long32 den, bool rounding) noexcept {
         AddCount(m_count < 0 ? -half : half);
     }
     Divide(static_cast<long long>(den));
-    // Intended: only large positive results are marked, as they are the ones that fields cannot hold.
+    // Intended (timecode-scale): only large positive results are marked, as they are the ones that fields cannot hold.
     return m_count > 2147483647 ? Invalidate() : *this;
 }
 
@@ -184,8 +186,8 @@ bool timecode::operator==(const timecode& right) const noexcept {
     return m_count == right.m_count && m_sys == right.m_sys;
 }
 
-// Intended: two invalid values are each "less" than the other, which no strict order allows; sorts that meet several of
-// them must not rely on their order.
+// Intended (timecode-invalid-order): two invalid values are each "less" than the other, which no strict order allows;
+// sorts that meet several of them must not rely on their order.
 bool timecode::operator<(const timecode& right) const noexcept {
     if (!right.IsDefined()) return true;
     return IsDefined() && m_count < right.m_count;
@@ -232,7 +234,8 @@ timecode& timecode::TruncToSystem(ulong32 sys) noexcept {
     const long long rest = m_count % frame;
     if (rest == 0) return *this;
     m_count -= rest;
-    // Intended: a textbook would go one frame down from every negative count; less than one frame below zero becomes 0.
+    // Intended (timecode-trunc): a textbook would go one frame down from every negative count; less than one frame
+    // below zero becomes 0.
     if (m_count >= 0) return *this;
     if (m_count < kMin + frame) return Invalidate();
     m_count -= frame;
@@ -247,7 +250,8 @@ timecode& timecode::RoofToSystem(ulong32 sys) noexcept {
     const long long rest = m_count % frame;
     if (rest == 0) return *this;
     m_count -= rest;
-    // Intended: the frame is added to negative counts too, which lands one above the boundary a textbook would take.
+    // Intended (timecode-roof): the frame is added to negative counts too, which lands one above the boundary a
+    // textbook would take.
     if (m_count > kMax - frame) return Invalidate();
     m_count += frame;
     return *this;
@@ -312,8 +316,8 @@ timecode& timecode::Wrap() noexcept {
     return *this;
 }
 
-// Intended: the day's base units are passed as fields. A textbook would pass a day, but exchange texts with a day mark
-// have always been read this way, and the systems whose bound it exceeds have no largest timecode.
+// Intended (timecode-slip): the day's base units are passed as fields. A textbook would pass a day, but exchange texts
+// with a day mark have always been read this way, and the systems whose bound it exceeds have no largest timecode.
 timecode timecode::GetMaxTC(ulong32 sys) noexcept { return timecode(static_cast<long32>(RowOf(sys).Day()), sys); }
 
 timecode& timecode::Slip(long32 n) noexcept {

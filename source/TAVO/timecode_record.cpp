@@ -60,7 +60,8 @@ template <DropRule rule, bool isHalved> inline Fields SplitDrop(unsigned long lo
     ulong32 ss = inMinute / kSecond;
     ulong32 ff = inMinute % kSecond / rule.unit;
     if (ff < 2 && ss == 0 && minutes % rule.block != 0) { // a skipped label: the estimate came a minute too far
-        // Intended: always the minute's last frame, so that a position between frame starts may show its neighbour.
+        // Intended (timecode-skipped-label): always the minute's last frame, so that a position between frame starts
+        // may show its neighbour.
         --minutes;
         ss = 59;
         ff = kSecond / rule.unit - 1;
@@ -148,8 +149,8 @@ TCINFO& TCINFO::Clip() noexcept {
     return *this;
 }
 
-// Intended: the division is unsigned, so that a negative position gives the low half of a huge quotient where a
-// textbook would give the negative number of fields. Hosts that store it know it so.
+// Intended (timecode-record-fields): the division is unsigned, so that a negative position gives the low half of a huge
+// quotient where a textbook would give the negative number of fields. Hosts that store it know it so.
 TCINFO::operator long32() const noexcept {
     const auto count = static_cast<unsigned long long>(static_cast<long long>(*this));
     return static_cast<long32>(count / RowOf(m_sys).Field());

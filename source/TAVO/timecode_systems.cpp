@@ -21,7 +21,8 @@ static_assert(std::size(kByRate) == kSystemCount, "every system has its place");
 
 ulong32 timecode::NormalizeSystem(ulong32 sys) noexcept { return Normalize(sys); }
 
-// Intended: "PAL(PX)" is no drop-frame system, but its exchange text has always ended in "/D", and readers expect it.
+// Intended (timecode-pal-px): "PAL(PX)" is no drop-frame system, but its exchange text has always ended in "/D", and
+// readers expect it.
 bool timecode::IsDFSystem(ulong32 sys) noexcept {
     return sys < kSystemCount && (kSystems[sys].IsDrop() || sys == eSystemPALPX);
 }
@@ -58,8 +59,9 @@ ulong32 timecode::GetFramerateTCList(ulong32* list, ulong32 capacity) noexcept {
     return count;
 }
 
-// Intended: a textbook would answer the nearest rate. Here the nearest candidate must be a drop-frame system and its
-// non-drop sibling is the answer; texts with other rates are refused by readers, and would be accepted after a change.
+// Intended (timecode-rate): a textbook would answer the nearest rate. Here the nearest candidate must be a drop-frame
+// system and its non-drop sibling is the answer; texts with other rates are refused by readers, and would be accepted
+// after a change.
 ulong32 timecode::GetBestTCSystem(double rate) noexcept {
     if (rate >= kSystems[eSystemHD60].Rate()) return eSystemHD60;
     if (rate <= kSystems[eSystemPALPX].Rate()) return eSystemFilmPX;
@@ -72,7 +74,7 @@ ulong32 timecode::GetBestTCSystem(double rate) noexcept {
 
 ulong32 timecode::GetTCSystemOf(ulong32 num, ulong32 den) noexcept {
     if (den == 0) return kUnassigned;
-    // Intended: the last system is left to the search by rate, as it always was; the answer is the same.
+    // The last system is left to the search by rate, which gives the same answer.
     const auto* last = std::end(kSystems) - 1;
     const auto* row = std::find_if(std::begin(kSystems), last,
                                    [=](const System& s) { return s.numerator == num && s.denominator == den; });

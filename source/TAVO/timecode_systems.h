@@ -41,8 +41,8 @@ struct System {
     constexpr ulong32 Hour() const { return 60 * Minute() + 60 / drop.block * Dropped(); }
     constexpr ulong32 Day() const { return 24 * Hour(); }
 
-    // Intended: a double, and this one, is the unit of all conversions to and from seconds; an exact 1001/1000 would
-    // differ from stored results in halves of a base unit.
+    // Intended (timecode-seconds): a double, and this one, is the unit of all conversions to and from seconds; an exact
+    // 1001/1000 would differ from stored results in halves of a base unit.
     constexpr double UnitLength() const { return denominator == 1001 ? 1.001 / 1200.0 : 1.0 / 1200.0; }
     constexpr double Rate() const { return static_cast<double>(numerator) / denominator; }
 };

@@ -83,7 +83,7 @@ constexpr SeparatorTable kSystemOfSeparators = [] {
         const wchar_t* s = kSystems[code].separators;
         table.word[ClassOf(s[0])][ClassOf(s[1])][ClassOf(s[2])] = code;
     }
-    // Intended: the one combination that is an error and not just unknown.
+    // Intended (timecode-bad-separators): the one combination that is an error and not just unknown.
     table.word[ClassOf(L'.')][ClassOf(L'.')][ClassOf(L':')] = kInvalid;
     return table;
 }();
@@ -234,7 +234,8 @@ SZTC::operator String::CACFWChar() const { return String::CACFWChar(FixedText(*t
 
 SZTC::operator String::CUTF8Char() const {
     FixedText fixed(*this);
-    // Intended: the system is dropped, so that readers of the UTF-8 form see one style of timecode only.
+    // Intended (timecode-utf8): the system is dropped, so that readers of the UTF-8 form see one style of timecode
+    // only.
     for (std::size_t i : {3, 6, 9})
         if (fixed.text[i]) fixed.text[i] = L':';
     return String::CUTF8Char(fixed.text);
@@ -331,8 +332,9 @@ SZUTC::SZUTC(const wchar_t* freeText) noexcept : text{} {
         return;
     }
 
-    // Intended: fields that cannot be read leave the rate alone, but only where its fraction fills the five characters
-    // before the unit, and drop frame is forgotten. Readers of such texts look at the rate's numbers only.
+    // Intended (timecode-rate-alone): fields that cannot be read leave the rate alone, but only where its fraction
+    // fills the five characters before the unit, and drop frame is forgotten. Readers of such texts look at the rate's
+    // numbers only.
     constexpr std::ptrdiff_t kFraction = 5;
     if (unit == end || unit - freeText < kFraction) return;
     Scanner scan(unit - kFraction, end);

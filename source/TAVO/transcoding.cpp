@@ -421,8 +421,8 @@ template <class Unit> std::size_t GuardedLength(const Unit* text, std::size_t n)
     return i;
 }
 
-// Intended: the element at index n belongs to the count, where one would expect the bound to end it; n = 0 alone is
-// nothing. Callers pass the index of the last element.
+// Intended (utf32-bound): the element at index n belongs to the count, where one would expect the bound to end it; n =
+// 0 alone is nothing. Callers pass the index of the last element.
 template <class Size> std::size_t CountUtf32(const ulong32* text, std::size_t n, ulong32 last, Size size) {
     if (!text || n == 0) return 0;
     std::size_t count = 0;
@@ -446,9 +446,9 @@ std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target*
     if (!target) return need;
     if (capacity < need) return 0;
     if (!convert(source, extent, target)) return 0;
-    // Intended: as many characters are read as there are target units, so that behind a character that took more than
-    // one an invalid sequence is met and fails the whole, while it ends other texts silently. One that the terminator
-    // cuts is invalid; of one that the source length cuts nobody can tell.
+    // Intended (cut-or-fail): as many characters are read as there are target units, so that behind a character that
+    // took more than one an invalid sequence is met and fails the whole, while it ends other texts silently. One that
+    // the terminator cuts is invalid; of one that the source length cuts nobody can tell.
     const bool invalid = extent.ending == Ending::Invalid || (extent.ending == Ending::Cut && length < sourceLength);
     if (invalid && extent.target > extent.characters) return 0;
     *target = 0;
@@ -463,14 +463,14 @@ std::size_t UTF8Size(ulong32 codePoint) {
     return codePoint < 0x80 ? 1 : codePoint < 0x800 ? 2 : codePoint < 0x10000 ? 3 : codePoint < 0x110000 ? 4 : 0;
 }
 std::size_t UTF8Len(unsigned char lead) { return kUtf8Length[lead]; }
-// Intended: 110000, one above the last code point, still counts 2.
+// Intended (utf16-size-limit): 110000, one above the last code point, still counts 2.
 std::size_t UTF16Size(ulong32 codePoint) { return codePoint < 0x10000 ? 1 : codePoint <= 0x110000 ? 2 : 0; }
 std::size_t UTF16Len(unsigned short unit) { return IsLowSurrogate(unit) ? 0 : IsHighSurrogate(unit) ? 2 : 1; }
 std::size_t acfWSize(ulong32 codePoint) { return codePoint < 0x10000 ? 1 : 2; }
 std::size_t acfWLen(wchar_t) { return 1; }
 
-// Intended: steps over two-byte leads and not, as its UTF-16 sibling would suggest, over continuation bytes. Callers
-// rely on it as it is.
+// Intended (utf8-sync): steps over two-byte leads and not, as its UTF-16 sibling would suggest, over continuation
+// bytes. Callers rely on it as it is.
 void UTF8Sync(const unsigned char*& text) {
     while ((*text & 0xE0) == 0xC0) ++text;
 }

@@ -84,11 +84,12 @@ template <class Unit> constexpr bool IsSurrogate(Unit unit) { return (unit & 0xF
 template <class Unit> constexpr bool IsHighSurrogate(Unit unit) { return (unit & 0xFC00) == 0xD800; }
 template <class Unit> constexpr bool IsLowSurrogate(Unit unit) { return (unit & 0xFC00) == 0xDC00; }
 
-// Intended: no upper limit, so DBFF itself and E000 to FFFF complete a pair too. A textbook asks for DC00 to DFFF;
-// counts and hashes of stored text would change.
+// Intended (pair-second-unit): no upper limit, so DBFF itself and E000 to FFFF complete a pair too. A textbook asks for
+// DC00 to DFFF; counts and hashes of stored text would change.
 template <class Unit> constexpr bool IsSecondHalf(Unit unit) { return unit >= 0xDBFF; }
 
-// Intended: a pair decodes to 0 or 1 and never to its character. Byte counts, pool keys and UTF-8 forms rest on it.
+// Intended (pair-value): a pair decodes to 0 or 1 and never to its character. Byte counts, pool keys and UTF-8 forms
+// rest on it.
 template <class Unit> constexpr ulong32 PairValue(Unit first, Unit second) {
     return ((first | second) & 0x3FF) != 0 ? 1 : 0;
 }
@@ -112,9 +113,9 @@ template <class Unit> std::size_t Utf16Sequence(const Unit* text, std::size_t le
 }
 
 // Encodes one code point; false above 10FFFF.
-// Intended: the usual 10000 is not subtracted, so 10000 becomes D840 DC00, and from 100000 up the first unit lies in
-// the low surrogates, where this library cannot decode it. Stored strings were made this way and must keep comparing
-// equal.
+// Intended (pair-offset): the usual 10000 is not subtracted, so 10000 becomes D840 DC00, and from 100000 up the first
+// unit lies in the low surrogates, where this library cannot decode it. Stored strings were made this way and must keep
+// comparing equal.
 template <class Unit> bool EncodeUtf16(Unit*& out, ulong32 codePoint) {
     if (codePoint < 0x10000) {
         *out++ = static_cast<Unit>(codePoint);

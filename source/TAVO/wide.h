@@ -8,7 +8,8 @@
 
 namespace TAVO::String::detail {
 
-// The one case mapping of the library: A to Z, nothing else. Stored hashes rest on it.
+// The one case mapping of the library.
+// Intended (case-fold): A to Z and nothing else, whatever the locale or the script. Stored hashes rest on it.
 template <class Unit> constexpr Unit FoldUnit(Unit c) {
     return static_cast<Unit>(c + (static_cast<unsigned>(c) - 'A' < 26u ? 'a' - 'A' : 0));
 }

@@ -18,7 +18,7 @@ template <wchar_t (*map)(wchar_t)> void MapText(wchar_t* text) {
 }
 
 // Settles the pointers: true when `result` is the answer.
-// Intended: null sorts after every text, the reverse of the ordinal comparison of pooled strings.
+// Intended (null-sorts-last): null sorts after every text, the reverse of the ordinal comparison of pooled strings.
 bool ComparePointers(const wchar_t* a, const wchar_t* b, int& result) {
     result = a == b ? 0 : !a ? 1 : -1;
     return a == b || !a || !b;
@@ -34,6 +34,8 @@ int CompareFolded(const wchar_t* a, const wchar_t* b, std::size_t n) {
 
 // Whether `part` occurs in the first `n` units of `text`, each unit seen through `map`.
 template <wchar_t (*map)(wchar_t)> bool Contains(const wchar_t* text, const wchar_t* part, std::size_t n) {
+    // Intended (empty-part): an empty text occurs in none but itself, where a textbook finds it everywhere; and null in
+    // null.
     if (text == part) return true;
     if (!text || !part || !*part) return false;
     const std::size_t partLength = WideLength(part);
@@ -65,7 +67,7 @@ int wcscmpi(const wchar_t* a, const wchar_t* b) {
 int wcsncmpi(const wchar_t* a, const wchar_t* b, std::size_t n) {
     int result;
     if (ComparePointers(a, b, result)) return result;
-    // Intended: n is a 32-bit signed count, so SIZE_MAX does not mean the whole text but nothing.
+    // Intended (signed-count): n is a 32-bit signed count, so SIZE_MAX does not mean the whole text but nothing.
     const auto count = static_cast<long32>(n);
     return count < 1 ? 0 : CompareFolded(a, b, static_cast<std::size_t>(count));
 }
@@ -83,7 +85,7 @@ std::size_t wcscount(const wchar_t* text, wchar_t c) {
 }
 
 bool _isSlash(wchar_t c) { return c == L'/' || c == L'\\'; }
-// Intended: the space alone; a textbook's blank includes the tab.
+// Intended (blank-is-space): the space alone; a textbook's blank includes the tab.
 bool _isblank(wchar_t c) { return c == L' '; }
 bool _iswhitespace(wchar_t c) { return c == L' ' || c == L'\n' || c == L'\r' || c == L'\t'; }
 bool _isCRLF(wchar_t c) { return c == L'\n' || c == L'\r'; }

@@ -193,8 +193,8 @@ bool CXMLDoc::Refuse() noexcept {
 template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t units, bool isAscii) noexcept {
     Close();
     if constexpr (sizeof(Unit) == 1) {
-        // Intended: where the bad sequence lies is not told, neither by the offset nor by the message, and nothing is
-        // logged.
+        // Intended (xml-bad-utf8): where the bad sequence lies is not told, neither by the offset nor by the message,
+        // and nothing is logged.
         if (!isAscii && MeasureUtf8(text, units).ending != Ending::Length) {
             m_errorCode = kBadCharacterEncoding;
             m_errorText = StoreText(L"Offset: 0, Illegal UTF8 character");
@@ -203,6 +203,7 @@ template <class Unit> bool CXMLDoc::ParseUnits(const Unit* text, std::size_t uni
     }
     ParseResult result = Parse(text, units);
     m_errorCode = result.code;
+    // Intended (xml-no-element): also without any element, which a textbook refuses; callers look at the root.
     if (result.code == kSuccess) {
         m_root = std::move(result.root);
         return true;

@@ -91,8 +91,8 @@ const wchar_t* FindSurrogate(const wchar_t* text, const wchar_t* end) {
 }
 
 // Takes one character off the text; false at a surrogate that has no other half.
-// Intended: a pair is taken as 0 or 1 and not as its character, which a textbook would write. Readers of these files
-// know them that way.
+// Intended (xml-pair-written): a pair is taken as 0 or 1 and not as its character, which a textbook would write.
+// Readers of these files know them that way.
 bool TakeCharacter(ulong32& character, const wchar_t*& text, const wchar_t* end) {
     const std::size_t units = String::detail::Utf16Sequence(text, static_cast<std::size_t>(end - text));
     if (units == 0) return false;
@@ -157,7 +157,7 @@ bool _CXMLOut::Write(const wchar_t* text, std::size_t count) { return Put(text, 
 
 bool _CXMLOut::EndLine() {
     if (!m_pretty) return true;
-    if (!Put("\r\n")) SetFailed(); // Intended: not told here, where a textbook would; the mark voids the result
+    if (!Put("\r\n")) SetFailed(); // not told here; the mark voids the result
     m_atLineStart = true;
     return true;
 }
@@ -187,8 +187,8 @@ bool _CXMLOut::Encode(const wchar_t* text, std::size_t count) {
 }
 
 // Encodes in the room that is left, which a character may cross: it then goes out byte by byte.
-// Intended: on that path FFFF takes four bytes, where a textbook encodes it in three as everywhere else. Files compared
-// byte by byte would differ.
+// Intended (xml-ffff): on that path FFFF takes four bytes, where a textbook encodes it in three as everywhere else.
+// Files compared byte by byte would differ.
 bool _CXMLOut::PutCharacter(ulong32 character) {
     if (m_free == 0 && !Flush()) return false;
     unsigned char bytes[kLongest];
@@ -260,6 +260,8 @@ _CFileOut::~_CFileOut() {
     if (m_isOpen) Discard();
 }
 
+// Intended (xml-write-replaces): a file that stood at the path is gone by now, where a textbook would write beside it
+// and rename. Hosts that look for the file after a failure would notice.
 void _CFileOut::Discard() {
     m_isOpen = false;
     m_file.Close();
@@ -467,7 +469,8 @@ private:
         case kData:
             return m_out.Put(">") && PutData(node) && PutEndTag(node);
         default:
-            return false; // Intended: children and data together, which a textbook writes, would not read back.
+            // Intended (xml-mixed-content): children and data together, which a textbook writes, would not read back.
+            return false;
         }
     }
 

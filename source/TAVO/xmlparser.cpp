@@ -177,9 +177,10 @@ private:
     // --- rules that differ from the XML recommendation, each in one place
     // -----------------------------------------------
 
-    // Intended: "<!" runs to the next '>' outside quotes, comments at top level included, so an apostrophe in a comment
-    // opens a string and a DOCTYPE's internal subset ends at its first '>'. A textbook would look for "-->" and "]>";
-    // licence texts in comments are the usual victims, and documents that pass today are accepted by this rule.
+    // Intended (xml-declaration-end): "<!" runs to the next '>' outside quotes, comments at top level included, so an
+    // apostrophe in a comment opens a string and a DOCTYPE's internal subset ends at its first '>'. A textbook would
+    // look for "-->" and "]>"; licence texts in comments are the usual victims, and documents that pass today are
+    // accepted by this rule.
     bool SkipDeclaration() {
         const Unit* start = m_at;
         const bool comment = Stands(start, "<!--");
@@ -206,10 +207,10 @@ private:
         return true;
     }
 
-    // Intended: the look-up of the five predefined references stops at the first that does NOT match in full and takes
-    // its character: "&lt;" gives '>', every other reference '<', and three units are skipped either way. A textbook
-    // would stop at the match; stored documents were read, and their texts compared, by this rule. Requires: m_at at
-    // the '&'. The character goes to `value`.
+    // Intended (xml-named-references): the look-up of the five predefined references stops at the first that does NOT
+    // match in full and takes its character: "&lt;" gives '>', every other reference '<', and three units are skipped
+    // either way. A textbook would stop at the match; stored documents were read, and their texts compared, by this
+    // rule. Requires: m_at at the '&'. The character goes to `value`.
     bool PredefinedReference(ulong32& value) {
         const Unit* body = m_at + 1;
         constexpr std::ptrdiff_t kSkipped = 3; // "lt;" and "gt;"
@@ -225,9 +226,9 @@ private:
         return at == m_at || Fail(kIllegalCharacter, m_at);
     }
 
-    // Intended: the hexadecimal form begins its digits at the 'x', finds none and yields 0, so it always fails; and ':'
-    // counts as a digit of value 10. A textbook would read hexadecimal digits and refuse the colon.
-    // Requires: m_at at the '&' of "&#".
+    // Intended (xml-numeric-references): the hexadecimal form begins its digits at the 'x', finds none and yields 0, so
+    // it always fails; and ':' counts as a digit of value 10. A textbook would read hexadecimal digits and refuse the
+    // colon. Requires: m_at at the '&' of "&#".
     bool NumericReference(ulong32& value) {
         const Unit* start = m_at;
         const Unit* at = start + 2;
@@ -241,7 +242,8 @@ private:
         return true;
     }
 
-    // Content is children or data; text beside children is refused. After a child nothing but markup may come.
+    // Intended (xml-text-or-children): a textbook reads text between children. Here content is one or the other, as the
+    // tree and the writer know it; after a child nothing but markup may come.
     bool MixedContent(const Unit* at) { return Fail(kMixedContent, at); }
 
     // --- names
@@ -335,7 +337,8 @@ private:
         if (attribute.name.isnull()) return OutOfMemory();
         if (!Value(attribute.value)) return false;
         if (IsDuplicate(attribute.name)) return Fail(kBadAttribute, name);
-        // An empty value is dropped: an attribute that is missing reads the same.
+        // Intended (xml-empty-attribute): an empty value is dropped, where a textbook keeps it: hosts take it for
+        // missing.
         if (!attribute.value.isdef()) return true;
         return Keep(std::move(attribute)) || OutOfMemory();
     }
@@ -506,7 +509,7 @@ private:
     // --- text
     // ----------------------------------------------------------------------------------------------------------
 
-    // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone between other
+    // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone among other
     // units, a control, a character above 7F, '&', or one of the two stops; the end when there is none.
     // Requires: `start` is not at a blank.
     const Unit* RunEnd(const Unit* start, Unit stop1, Unit stop2) const {
@@ -531,8 +534,8 @@ private:
             }
             at -= spaceBefore;
         }
-        while (at != m_end && (IsPlain(*at, stop1, stop2) ||
-                               (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
+        while (at != m_end &&
+               (IsPlain(*at, stop1, stop2) || (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
             ++at;
         return at;
     }

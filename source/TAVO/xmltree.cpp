@@ -179,8 +179,9 @@ const CPXMLObject* FindNext(const CPXMLObject& element, const CPXMLObject* start
     return nullptr;
 }
 
-// Intended: the way back from `start` begins with the child behind it, so that it can answer `start` again and finds
-// nothing from the last child. A textbook search would begin before `start`; loops of callers count on the repeat.
+// Intended (xml-find-prev): the way back from `start` begins with the child behind it, so that it can answer `start`
+// again and finds nothing from the last child. A textbook search would begin before `start`; loops of callers count on
+// the repeat.
 template <class Matches>
 const CPXMLObject* FindPrev(const CPXMLObject& element, const CPXMLObject* start, Matches matches) {
     const Node* node = NamedNode(element);
@@ -328,8 +329,8 @@ bool CPXMLObject::setName(const CPPoolString& name) noexcept {
     return true;
 }
 
-// Intended: the handle leaves its node for a new one. A textbook setter would change the node; that is Rename, and
-// holders of the old node count on keeping it.
+// Intended (xml-set-name): the handle leaves its node for a new one. A textbook setter would change the node; that is
+// Rename, and holders of the old node count on keeping it.
 bool CPXMLObject::SetName(const CPPoolString& name) noexcept { return IsGoodName(name) && setName(name); }
 
 bool CPXMLObject::Rename(const CPPoolString& name) noexcept {
@@ -492,7 +493,8 @@ bool CPXMLObject::CAdd(const CPXMLObject& child) noexcept {
     if (child.IsDefault() || child.IsNamedDefault()) return true;
     Node* node = NamedNode(*this);
     if (!node) return false;
-    AppendChild(*node, child); // Intended: a failure is not told. A textbook would; callers count on true here.
+    // Intended (xml-cadd): a failure is not told. A textbook would; callers count on true here.
+    AppendChild(*node, child);
     return true;
 }
 
@@ -520,11 +522,13 @@ xmlret CPXMLObject::SetTag(const CPPoolString& name, const wchar_t* value) noexc
 
 xmlret CPXMLObject::Insert(const CPXMLObject& child, std::size_t index) noexcept {
     Node* node = NamedNode(*this);
+    // Intended (xml-insert-beside-data): an element with data takes no child here, though Add gives it one.
     if (!node || node->data.isdef()) return Failed();
     const std::size_t count = Elements::Count(node->elements);
     if (!Elements::Insert(node->elements, index < count ? index : count, CPXMLObject(child))) return Failed();
     RaiseForChild(*node);
-    // Intended: the index asked for, where a textbook would answer the child's. Callers compare it with their own.
+    // Intended (xml-insert-index): the index asked for, where a textbook would answer the child's. Callers compare it
+    // with their own.
     return xmlret(index);
 }
 
@@ -537,7 +541,8 @@ bool CPXMLObject::ReplaceAt(const CPXMLObject& child, std::size_t index) noexcep
 
 xmlret CPXMLObject::Replace(const CPXMLObject& child, const CPXMLObject* position) noexcept {
     Node* node = NamedNode(*this);
-    if (!node) return xmlret(0); // Intended: reads as success; a textbook would fail. Callers see index 0 here.
+    // Intended (xml-replace-empty): reads as success; a textbook would fail. Callers see index 0 here.
+    if (!node) return xmlret(0);
     const std::size_t index = SlotFor(*node, position);
     if (index != NotFound) Elements::First(node->elements)[index] = child;
     return xmlret(index);
@@ -551,8 +556,8 @@ xmlret CPXMLObject::Replace(const CPXMLObject& child, const CPXMLObject& old) no
     return xmlret(index);
 }
 
-// Intended: the kind stays, also when this was the last child. A textbook would lower it; what is added afterwards and
-// the writer depend on it.
+// Intended (xml-kind-stays): the kind stays, also when this was the last child. A textbook would lower it; what is
+// added afterwards and the writer depend on it.
 bool CPXMLObject::DeleteAt(std::size_t index) noexcept {
     Node* node = NamedNode(*this);
     if (!node || index >= Elements::Count(node->elements)) return false;
@@ -642,7 +647,8 @@ bool CPXMLObject::Set(const CPPoolString& text) noexcept { return DeleteContent(
 
 bool CPXMLObject::Set(const wchar_t* text) noexcept { return SetText(Interned(text)); }
 
-// Intended: empty always. A textbook would give the element's inner text; callers that want the data ask GetData.
+// Intended (xml-content-empty): empty always. A textbook would give the element's inner text; callers that want the
+// data ask GetData.
 CPXMLObject::CPPoolString CPXMLObject::GetContent() const noexcept { return CPPoolString::pempty; }
 
 CPXMLObject::CPPoolString CPXMLObject::FindElementData(const CPPoolString& name) const noexcept {

@@ -23,7 +23,7 @@ namespace {
 
 // The unit behind the digits that lead the text, which may be of any script, if it is the locale's decimal point.
 //
-// Intended (local-decimal-point): blanks and signs do not count as leading digits, so "-1,5" is -1 in a locale with a
+// Intended (xml-decimal-point): blanks and signs do not count as leading digits, so "-1,5" is -1 in a locale with a
 // comma. A textbook would take the comma everywhere or nowhere; hosts have values that were read so.
 const wchar_t* FindLocalPoint(Text text) {
     const auto isDigit = [](wchar_t unit) { return unit < 0x80 ? numberscan::DigitOf(unit) < 10 : IsDigit(unit); };
@@ -50,7 +50,7 @@ using namespace detail;
 
 // --- Texts of values -----------------------------------------------------------------------------------------------
 
-// Intended (hexadecimal-writer): no integer reader takes all 64 bits back, since those of 64 bits are decimal. A
+// Intended (xml-hexadecimal-writer): no integer reader takes all 64 bits back, since those of 64 bits are decimal. A
 // textbook would write what they read; files have these digits.
 CPPoolString CPXMLObject::TextOf(unsigned long long value) noexcept {
     char text[kValueRoom];
@@ -89,7 +89,7 @@ enum class From { DataOnly, Any };
 // The text that a reader looks at; null when there is none.
 const CPPoolString* DataOf(const CPXMLObject& element, From from) {
     const Node* node = NamedNode(element);
-    // Intended (numbers-of-mixed-elements): an element with children too has no number. A textbook would read the data
+    // Intended (xml-mixed-numbers): an element with children too has no number. A textbook would read the data
     // that GetData gives.
     if (!node || (from == From::DataOnly && node->contentKind != kData)) return nullptr;
     return &node->data;
@@ -141,7 +141,7 @@ bool ReadBool(const CPPoolString& stored, bool& value) {
 
 bool ReadEDouble(const CPPoolString& stored, double& value) { return ScanDoubleBits(TextIn(stored), value); }
 
-// Intended (decimal-of-double-text): the digits of a double's own text, which are those of its bits, are a decimal
+// Intended (xml-double-text): the digits of a double's own text, which are those of its bits, are a decimal
 // number here: 1.5 is stored as "3ff8000000000000(1.5)" and reads as 3. A textbook reader would match its writer; that
 // is EDouble, and this one is for what others wrote.
 bool ReadDouble(const CPPoolString& stored, double& value) {
@@ -323,8 +323,8 @@ namespace {
 
 // Sixteen bytes as 32 digits.
 //
-// Intended (low-half-first): the low half of a byte stands first. A textbook writes the high one first; stored files
-// have it this way.
+// Intended (xml-low-half-first): the low half of a byte stands first. A textbook writes the high one first; stored
+// files have it this way.
 void PutBytes(char* out, const unsigned char* bytes) {
     using namespace Simd;
     const auto halves = [](Block units) {

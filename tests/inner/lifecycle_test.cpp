@@ -7,6 +7,7 @@
 
 using namespace TAVO;
 
+// Intended: failed-start-counts, exit-wraps
 TEST(Services, FailedStartStaysCountedAndTheCountWraps_Intended) {
     static int starts, stops;
     CountedServices services({[]() noexcept { return ++starts, false; }, []() noexcept { ++stops; },
@@ -25,6 +26,7 @@ TEST(Services, FailedStartStaysCountedAndTheCountWraps_Intended) {
     EXPECT_TRUE(starts == 2 && stops == 2);
 }
 
+// Intended: startup-path
 TEST(ProcessFacts, StartupPathStartsAtTheSeparator_Intended) {
     const wchar_t* const rows[][3] = {{L"C:\\Apps\\host.exe", L"host.exe", L"/host.ex"},
                                       {L"/usr/lib/media/bin/h", L"h", L"/h"},

@@ -14,6 +14,7 @@ using namespace TAVO::String;
 
 namespace {
 
+// Intended: collect-priority
 TEST(PoolSweepInner, OnlyThreadsOfNormalPrioritySweepIntended) {
     for (const int priority : {-15, -1, 1, 15, 0})
         std::thread([=] {

@@ -79,6 +79,7 @@ TEST(MaintenanceChoice, RunsTheMostUrgentAndAgesTheRest) {
         EXPECT_EQ(Order(row.rows, static_cast<int>(std::string(row.order).size())), row.order) << row.what;
 }
 
+// Intended: lowest-priority
 TEST(MaintenanceChoice, LowestPriorityWaitsAPassIntended) { EXPECT_EQ(Order({{kLowest, 0, 100}}, 3), ".A."); }
 
 TEST(MaintenanceChoice, ListKeepsItsOrderAndSurvivesFailingHeaps) {

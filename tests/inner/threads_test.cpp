@@ -9,6 +9,7 @@
 using namespace TAVO::Threading;
 namespace Platform = TAVO::Platform;
 
+// Intended: priority-levels
 TEST(ThreadPriority, HasFiveLevelsOfMany_Intended) {
     // The level, and what the system gets, should the level be set; then what the system has, and the level told.
     constexpr int kLevels[][2] = {{-3, 0}, {-2, -15}, {-1, -2}, {0, 0}, {1, 2}, {2, 15}, {3, 0}, {-15, 0}};

@@ -115,6 +115,7 @@ TEST(XmlWriter, RandomTreesAgainstTheNaiveWriter) {
     EXPECT_TRUE(written > 200 && written < 400) << "most trees can be written, and some cannot";
 }
 
+// Intended: xml-ffff
 TEST(XmlWriter, CharactersAcrossTheEndOfTheBufferIntended) {
     // FFFF takes four bytes where fewer than four are free, and three everywhere else.
     for (const Text character : {u"a", u"\xE9", u"\x4E00", u"\xFFFF", u"\xD83D\xDE00", u"&"})

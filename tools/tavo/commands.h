@@ -117,6 +117,31 @@ struct IdTextOptions {
 int IdParse(const IdTextOptions& options);
 int IdFormat(const IdTextOptions& options);
 
+struct UrlTextOptions {
+    std::vector<std::string> texts;
+    std::string keep; // bytes that stay as they are
+    bool json = false;
+};
+int UrlEncode(const UrlTextOptions& options);
+int UrlDecode(const UrlTextOptions& options);
+int UrlFromPath(const UrlTextOptions& options);
+int UrlToPath(const UrlTextOptions& options);
+
+// An encoding is one of TextFormatNames; an empty one is that of the text's mark, or UTF-8.
+struct TextOptions {
+    std::vector<std::string> files;
+    std::string from;
+    bool json = false;
+};
+int TextCount(const TextOptions& options);
+int TextValidate(const TextOptions& options);
+
+struct TextRecodeOptions {
+    std::string file, from, to, output;
+    bool strict = false; // what comes out changed is not written
+};
+int TextRecode(const TextRecodeOptions& options);
+
 int About();
 
 } // namespace tool

@@ -2,6 +2,8 @@
 
 #include "commands.h"
 #include "console.h"
+#include "encodings.h"
+#include "reference.h"
 #include "streams.h"
 #include "value.h"
 
@@ -34,7 +36,7 @@ void AddOutput(CLI::App& command, OutputOptions& output) {
     command
         .add_option("--encoding", output.encoding, "utf-8 (the default), utf-16, or utf-16-raw, which writes any text")
         ->check(CLI::IsMember(EncodingNames()).description(""))
-        ->type_name("NAME");
+        ->type_name("ENCODING");
     command.add_flag("--pretty", output.pretty, "one element per line, indented");
     command.add_flag("--strict", output.strict, "write nothing when some text would not read back as it is");
 }
@@ -61,11 +63,8 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
     command->add_option("PATH", get.path, kPathHelp)->required()->type_name("");
     command->add_option("--attribute", get.attribute, "the attribute of this name instead of the text")
         ->type_name("NAME");
-    command
-        ->add_option("--as", get.type,
-                     "the value that the text has as one of the types int, uint, hex, int64, uint64, "
-                     "filetime, double, edouble, rational, bool, timecode, id, binary")
-        ->check(CLI::IsMember(ValueTypeNames()).description(""))
+    command->add_option("--as", get.type, "the value that the library's readers of this type find in the text")
+        ->check(CLI::IsMember(ValueTypeNames()))
         ->type_name("TYPE");
 
     command = xml.add_subcommand("set", "Changes the text of an element, or an attribute, and writes the document");
@@ -184,31 +183,105 @@ void AddIdCommands(CLI::App& id, Action& action) {
     addTexts("format", "Shows the ways to write an identifier", IdFormat);
 }
 
-int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, and makes\n"
-                 "identifiers, with the library TAVO.\n"
-                 "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
-                 "tavo");
-    app.allow_windows_style_options(false); // a name may begin with '/'
-    app.set_version_flag("--version", TAVO_VERSION);
-    app.require_subcommand(1);
-    Action action;
+void AddUrlCommands(CLI::App& url, Action& action) {
+    url.require_subcommand(1);
+    const auto add = [&](const char* name, const char* does, const char* what, const char* help,
+                         int (*run)(const UrlTextOptions&)) -> UrlTextOptions& {
+        auto* command = url.add_subcommand(name, does);
+        auto& options = Add<UrlTextOptions>(*command, action, run);
+        command->add_option(what, options.texts, help)->required()->type_name("");
+        AddJson(*command, options.json);
+        return options;
+    };
+    auto& encode = add("encode", "Escapes texts: %20 for a blank", "TEXT", "bytes, as they are given", UrlEncode);
+    url.get_subcommand("encode")
+        ->add_option("--keep", encode.keep, "characters that stay as they are, beside letters, digits and - _ . ~")
+        ->type_name("SET");
+    add("decode", "Reads escaped texts", "TEXT", "what is no escape stays as it is", UrlDecode);
+    add("from-path", "Tells the URLs of paths", "PATH", "any absolute path, of Windows or of POSIX systems",
+        UrlFromPath);
+    add("to-path", "Tells the paths of URLs", "URL", "begins with file://", UrlToPath);
+}
 
-    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
-    auto* pool = app.add_subcommand("pool", "The pool of strings")->require_subcommand(1);
-    auto* command = pool->add_subcommand("stat", "Tells what the pool holds before, with and after documents");
-    auto& poolStat = Add<PoolStatOptions>(*command, action, PoolStat);
-    command->add_option("FILE", poolStat.files, kFileHelp)->type_name("");
+void AddTextCommands(CLI::App& text, Action& action) {
+    text.require_subcommand(1);
+    const auto addEncoding = [](CLI::App& command, const char* option, std::string& name, const char* help) {
+        return command.add_option(option, name, help)->check(CLI::IsMember(TextFormatNames()))->type_name("CHARSET");
+    };
+    constexpr const char* kTextHelp = "a text; - is standard input";
+    constexpr const char* kFromHelp = "its encoding; without it the one that its mark tells, else utf-8";
+
+    auto* command = text.add_subcommand("recode", "Writes a text in another encoding");
+    auto& recode = Add<TextRecodeOptions>(*command, action, TextRecode);
+    command->add_option("FILE", recode.file, kTextHelp)->required()->type_name("");
+    addEncoding(*command, "--from", recode.from, kFromHelp);
+    addEncoding(*command, "--to", recode.to, "the new one")->required();
+    command->add_option("-o,--output", recode.output, "where to write; - is standard output")
+        ->required()
+        ->type_name("FILE");
+    command->add_flag("--strict", recode.strict, "write nothing when some character would come out as another");
+
+    const auto add = [&](const char* name, const char* does, int (*run)(const TextOptions&)) {
+        auto* looks = text.add_subcommand(name, does);
+        auto& options = Add<TextOptions>(*looks, action, run);
+        looks->add_option("FILE", options.files, kTextHelp)->required()->type_name("");
+        addEncoding(*looks, "--from", options.from, kFromHelp);
+        AddJson(*looks, options.json);
+    };
+    add("count", "Counts bytes, units and characters, by the standard and by the library", TextCount);
+    add("validate", "Tells the first fault by the standard, and what the library makes of the text", TextValidate);
+}
+
+void AddPoolCommands(CLI::App& pool, Action& action) {
+    pool.require_subcommand(1);
+    auto* command = pool.add_subcommand("stat", "Tells what the pool holds before, with and after documents");
+    auto& stat = Add<PoolStatOptions>(*command, action, PoolStat);
+    command->add_option("FILE", stat.files, kFileHelp)->type_name("");
     command
-        ->add_option("--watch", poolStat.watch,
+        ->add_option("--watch", stat.watch,
                      "Look once a second how the library sweeps the pool by itself, so many seconds at most (60)")
         ->type_name("SECONDS")
         ->expected(0, 1)
         ->default_str("60");
+}
+
+// For the build, which installs what they print; not listed in the help.
+void AddReferenceCommands(const CLI::App& app, CLI::App& help, Action& action) {
+    help.group("")->require_subcommand(1);
+    const auto add = [&](CLI::App& command, std::function<std::string()> make) {
+        command.callback([make, &action] { action = [make] { return Print(make()), kFine; }; });
+    };
+    add(*help.add_subcommand("man", "Prints the man page"), [&app] { return ManPage(app); });
+    auto* completion = help.add_subcommand("completion", "Prints the script that completes commands in a shell");
+    const auto shell = std::make_shared<std::string>();
+    completion->add_option("SHELL", *shell, "the shell")->required()->check(CLI::IsMember(ShellNames()))->type_name("");
+    add(*completion, [&app, shell] { return Completion(app, *shell); });
+}
+
+// Everything that can be asked; who adds a command adds it here.
+void AddCommands(CLI::App& app, Action& action) {
+    app.allow_windows_style_options(false); // a name may begin with '/'
+    app.set_version_flag("--version", TAVO_VERSION);
+    app.require_subcommand(1);
+
+    AddXmlCommands(*app.add_subcommand("xml", "Documents"), action);
+    AddPoolCommands(*app.add_subcommand("pool", "The pool of strings"), action);
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
+    AddUrlCommands(*app.add_subcommand("url", "URLs: escaping, and those of paths"), action);
+    AddTextCommands(*app.add_subcommand("text", "Encodings of texts"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
+    AddReferenceCommands(app, *app.add_subcommand("help", "The tool's reference"), action);
+}
+
+int Run(std::vector<std::string> arguments) {
+    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, makes\n"
+                 "identifiers, escapes URLs and recodes texts, with the library TAVO.\n"
+                 "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
+                 "tavo");
+    Action action;
+    AddCommands(app, action);
 
     std::reverse(arguments.begin(), arguments.end()); // the order that the parser wants
     try {

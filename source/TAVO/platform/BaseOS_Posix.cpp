@@ -565,6 +565,11 @@ TAVO_NOINLINE std::uint32_t TakeThreadId() noexcept {
 
 #undef TAVO_THREAD_FIELD
 
+std::uint64_t GetSystemThread() noexcept { return static_cast<std::uint64_t>(syscall(SYS_gettid)); }
+bool HasThreadEnded(std::uint64_t thread) noexcept {
+    return syscall(SYS_tgkill, getpid(), static_cast<pid_t>(thread), 0) != 0 && errno == ESRCH;
+}
+
 int GetThreadPriority() noexcept { return t_priority; }
 void SetThreadPriority(int priority) noexcept { t_priority = priority; }
 

@@ -181,6 +181,15 @@ bool IsReadable(const void* address) noexcept {
 
 std::uint32_t GetThreadId() noexcept { return GetCurrentThreadId(); }
 
+std::uint64_t GetSystemThread() noexcept { return GetCurrentThreadId(); }
+bool HasThreadEnded(std::uint64_t thread) noexcept {
+    const HANDLE handle = OpenThread(SYNCHRONIZE, FALSE, static_cast<DWORD>(thread));
+    if (!handle) return GetLastError() == ERROR_INVALID_PARAMETER; // no thread has that number
+    const bool ended = WaitForSingleObject(handle, 0) == WAIT_OBJECT_0;
+    CloseHandle(handle);
+    return ended;
+}
+
 int GetThreadPriority() noexcept {
     const int priority = ::GetThreadPriority(GetCurrentThread());
     return priority == THREAD_PRIORITY_ERROR_RETURN ? THREAD_PRIORITY_NORMAL : priority;

@@ -94,6 +94,11 @@ std::uint32_t TakeThreadId() noexcept;
 inline std::uint32_t GetThreadId() noexcept { return TAVO_LIKELY(t_id != 0) ? t_id : TakeThreadId(); }
 #endif
 
+// The system's own name of the calling thread, and whether the thread of that name has ended. A name that was given
+// again counts as that of a living thread.
+std::uint64_t GetSystemThread() noexcept;
+bool HasThreadEnded(std::uint64_t thread) noexcept;
+
 // The calling thread's priority in the system's words (0 normal, -15 idle, 15 time critical). POSIX: the level that was
 // last set here, since an ordinary user's thread could not be raised again.
 int GetThreadPriority() noexcept;
