@@ -191,7 +191,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     }
     CheckText(CStringPool::GetStringRefn(units.data(), units.size()), plain);
     std::uint64_t bits = 0;
-    std::memcpy(&bits, data, size < 8 ? size : 8);
+    if (size) std::memcpy(&bits, data, size < 8 ? size : 8);
     CheckValues(bits);
     static unsigned runs = 0;
     if (++runs % 1024 == 0) CStringPool::Collect(60000); // or the pool would grow for ever
