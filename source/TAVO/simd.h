@@ -59,6 +59,7 @@ template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Blo
 }
 // Bytes of two blocks of 16-bit units, in order; of units from 100 up 255, from 8000 up 0 or 255.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
+TAVO_INLINE Block Add16(Block a, Block b) { return _mm_add_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
 // 32-bit lanes.
 TAVO_INLINE Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
@@ -67,6 +68,7 @@ TAVO_INLINE Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std
 TAVO_INLINE Block All32(std::uint32_t value) { return _mm_set1_epi32(static_cast<int>(value)); }
 template <int bits> TAVO_INLINE Block ShiftLeft32(Block a) { return _mm_slli_epi32(a, bits); }
 template <int bits> TAVO_INLINE Block ShiftRight32(Block a) { return _mm_srli_epi32(a, bits); }
+template <int bits> TAVO_INLINE Block ShiftLeft64(Block a) { return _mm_slli_epi64(a, bits); }
 template <int bits> TAVO_INLINE Block ShiftRight64(Block a) { return _mm_srli_epi64(a, bits); }
 // The low 16 bits of the four 32-bit lanes, in the low half.
 TAVO_INLINE Block Low16Of32(Block a) {
@@ -190,6 +192,9 @@ inline Block Below8(Block a, Block b) {
 inline Block Subtract8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x - y; });
 }
+inline Block Add16(Block a, Block b) {
+    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x + y; });
+}
 inline Block Subtract16(Block a, Block b) {
     return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x - y; });
 }
@@ -203,6 +208,9 @@ template <int bits> Block ShiftLeft32(Block a) {
 }
 template <int bits> Block ShiftRight32(Block a) {
     return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x >> bits; });
+}
+template <int bits> Block ShiftLeft64(Block a) {
+    return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x << bits; });
 }
 template <int bits> Block ShiftRight64(Block a) {
     return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x >> bits; });
