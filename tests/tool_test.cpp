@@ -165,6 +165,43 @@ TEST(ToolGet, FindsTextsAndAttributes) {
                 {".|--attribute|1", kUsage, "", "no attribute"}});
 }
 
+TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
+    const char* const values[][3] = {
+        {"int", " -7 of 9", "-7"},
+        {"uint", "-1", "4294967295"},
+        {"hex", "FF", "0xff"},
+        {"int64", "-9223372036854775808", "-9223372036854775808"},
+        {"double", "-1.50e1", "-15"},
+        {"edouble", "3ff8000000000000(1.5)", "1.5"},
+        {"rational", "50 / 2", "25/1"},
+        {"bool", "TRUE", "true"},
+        {"timecode", "10:00:00:00 {25/1}Hz", "10:00:00:00 {25/1}Hz"},
+        {"id", "00000000-0000-0000-0000-000000000000", "00000000-0000-0000-0000-000000000000"},
+        {"binary", "21BA", "12ab"}};
+    for (const auto& [type, text, value] : values)
+        ExpectRun(Call(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>"), kFine,
+                  std::string(value) + '\n', "");
+    const char* const faults[][3] = {{"int", "+x7", "character 2 is \"x\", where a digit belongs"},
+                                     {"hex", "0xg", "character 3 is \"g\", where a hexadecimal digit"},
+                                     {"double", "-.", "it ends where character 3, a digit, belongs"},
+                                     {"edouble", "(1.5)", "character 1 is \"(\""},
+                                     {"rational", "50:2", "character 3 is \":\", where \"/\" belongs"},
+                                     {"rational", "5/\xC3\xA9", "character 3 is \"\xC3\xA9\", where a digit"},
+                                     {"bool", "falsch", "character 5 is \"c\", where \"true\" or \"false\""},
+                                     {"timecode", "10:00:00:25 {25/1}Hz", "the frames are 25"},
+                                     {"timecode", "10:00:00:00", "does not tell the rate"},
+                                     {"id", "{15603cd4-ab81-4d6f-b05f-c6bea760a789}", "without braces"},
+                                     {"binary", "21B", "it ends where character 4, the second digit"},
+                                     {"binary", "", "it ends where character 1, a hexadecimal digit"}};
+    for (const auto& [type, text, fault] : faults)
+        ExpectRows(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>",
+                   {{"", kBadInput, "", fault}});
+    ExpectRows("xml|get|" + kTimeline + "|bins/bin/clip|--attribute|", "",
+               {{"rate|--as|rational", kFine, "50/1\n"},
+                {"rate|--as|number", kUsage, "", "not in"},
+                {"name|--as|int", kBadInput, "", "clip name: \"Harbour 01\""}});
+}
+
 TEST(ToolSet, ChangesTextsAndAttributes) {
     const std::string head = "UTF-8\"?><a x=\"1\"><b>", rest = "</b><c><d/></c></a>";
     ExpectRows("xml|set|-o|-|-|", "<a x=\"1\"><b>old</b><c><d/></c></a>",
