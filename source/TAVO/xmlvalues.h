@@ -44,34 +44,47 @@ inline char* PutHex(char* out, std::uint64_t number) {
     return out + digits;
 }
 
-// The characters of the numbers below 100, two each, the first one in the low byte.
-inline constexpr std::array<std::uint16_t, 100> kPairs = [] {
-    std::array<std::uint16_t, 100> pairs{};
-    for (unsigned i = 0; i < 100; ++i) pairs[i] = static_cast<std::uint16_t>('0' + i / 10 + ('0' + i % 10) * 256);
-    return pairs;
+// The characters of the numbers below 1000: three digits in the lower bytes, the first one lowest, and in the highest
+// byte how many bits the zeros before the number take.
+inline constexpr std::array<std::uint32_t, 1000> kTriples = [] {
+    std::array<std::uint32_t, 1000> triples{};
+    for (std::uint32_t i = 0; i < triples.size(); ++i) {
+        const std::uint32_t zeros = i > 99 ? 0 : i > 9 ? 8 : 16;
+        triples[i] = ('0' + i / 100) | ('0' + i / 10 % 10) << 8 | ('0' + i % 10) << 16 | zeros << 24;
+    }
+    return triples;
 }();
 
 inline char* PutDecimal(char* out, long32 number) {
-    constexpr ulong32 kGroup = 10000;
-    const auto putGroup = [&out](ulong32 group, unsigned digits) {
-        const std::uint32_t text =
-            (kPairs[group / 100] | static_cast<std::uint32_t>(kPairs[group % 100]) << 16) >> (32 - 8 * digits);
+    constexpr ulong32 kGroup = 1000;
+    const auto putFirst = [&out](ulong32 group) {
+        const std::uint32_t zeros = kTriples[group] >> 24, text = kTriples[group] >> zeros;
         std::memcpy(out, &text, sizeof text);
-        out += digits;
+        out += 3 - zeros / 8;
     };
-    const auto putFirst = [&](ulong32 group) { putGroup(group, 1u + (group > 9) + (group > 99) + (group > 999)); };
+    const auto putNext = [&out](ulong32 group) {
+        std::memcpy(out, &kTriples[group], sizeof kTriples[group]);
+        out += 3;
+    };
     auto rest = static_cast<ulong32>(number);
     if (number < 0) *out++ = '-', rest = 0 - rest;
     if (rest < kGroup) {
         putFirst(rest);
-    } else if (rest < kGroup * kGroup) {
-        putFirst(rest / kGroup);
-        putGroup(rest % kGroup, 4);
-    } else {
-        putFirst(rest / (kGroup * kGroup));
-        putGroup(rest / kGroup % kGroup, 4);
-        putGroup(rest % kGroup, 4);
+        return out;
     }
+    if (rest < kGroup * kGroup) {
+        putFirst(rest / kGroup);
+    } else {
+        const ulong32 millions = rest / (kGroup * kGroup);
+        if (millions < kGroup) {
+            putFirst(millions);
+        } else {
+            putFirst(millions / kGroup);
+            putNext(millions % kGroup);
+        }
+        putNext(rest / kGroup % kGroup);
+    }
+    putNext(rest % kGroup);
     return out;
 }
 
@@ -167,15 +180,124 @@ inline bool ScanDoubleBits(Text text, double& value) {
     return true;
 }
 
-// --- decimal fractions: three ways, each for what the one before leaves ----------------------------------------------
+// --- decimal fractions: two ways, the second one for what the first one leaves
+// ----------------------------------------------
 
 inline unsigned DecimalDigit(wchar_t unit) { return static_cast<unsigned>(unit) - '0'; }
 
-// Reads a number without sign and exponent that has few digits: both operands of the one operation are exact then, so
-// it rounds as it must. `point` is where the text has a decimal point that is no '.'.
-inline bool ScanShort(const wchar_t* at, const wchar_t* point, double& value) {
+// Reads eight digits, if all of these units are.
+inline bool ReadEight(const wchar_t* text, std::uint64_t& number) {
+    using namespace Simd;
+    const Block units = Load(text);
+    std::uint64_t digits = LowHalf(Narrow(units, units)); // the first one lowest
+    const std::uint64_t beyondNine = digits + 0x0606060606060606;
+    if (((digits & 0xF0F0F0F0F0F0F0F0) | (beyondNine & 0xF0F0F0F0F0F0F0F0) >> 4) != 0x3333333333333333) return false;
+    digits -= 0x3030303030303030;
+    digits = digits * 10 + (digits >> 8); // in every other byte a number of two digits
+    constexpr std::uint64_t kLanes = 0x000000FF000000FF;
+    number = ((digits & kLanes) * (100 + (1000000ull << 32)) + (digits >> 16 & kLanes) * (1 + (10000ull << 32))) >> 32;
+    return true;
+}
+
+__extension__ using Wide = unsigned __int128; // both compilers have it
+
+// The powers of ten by which doubles are scaled: the highest 128 bits of 5^n, since the rest of 10^n only moves the
+// exponent. Cut for n above 55; rounded up for negative n, whose digits never end.
+class FivePowers {
+public:
+    static constexpr int kFar = 64;
+
+    constexpr FivePowers() {
+        Number power{1};
+        for (int n = 0; n <= kFar; ++n, power.MultiplyByFive()) {
+            m_bits[kFar + n] = power.Highest();
+            if (n > 0) m_bits[kFar - n] = power.Reciprocal() + 1;
+        }
+    }
+    constexpr Wide operator[](int n) const { return m_bits[kFar + n]; }
+
+private:
+    // 256 bits, the lowest first: 5^64 has 149.
+    struct Number {
+        std::uint64_t words[4];
+
+        constexpr void MultiplyByFive() {
+            Wide carry = 0;
+            for (std::uint64_t& word : words) {
+                carry += static_cast<Wide>(word) * 5;
+                word = static_cast<std::uint64_t>(carry);
+                carry >>= 64;
+            }
+        }
+        constexpr int Bits() const {
+            int word = 3;
+            while (words[word] == 0) --word;
+            return 64 * (word + 1) - std::countl_zero(words[word]);
+        }
+        constexpr bool Bit(int place) const { return place >= 0 && (words[place / 64] >> place % 64 & 1); }
+        constexpr Wide Highest() const {
+            Wide bits = 0;
+            for (int place = Bits() - 1, i = 0; i < 128; ++i, --place) bits = bits << 1 | Bit(place);
+            return bits;
+        }
+        constexpr bool TakeAway(const Number& other) { // if it is not larger
+            Number left{};
+            std::uint64_t borrow = 0;
+            for (int i = 0; i < 4; ++i) {
+                const Wide difference = static_cast<Wide>(words[i]) - other.words[i] - borrow;
+                left.words[i] = static_cast<std::uint64_t>(difference);
+                borrow = static_cast<std::uint64_t>(difference >> 64) & 1;
+            }
+            if (borrow == 0) *this = left;
+            return borrow == 0;
+        }
+        constexpr void Double() {
+            for (int i = 3; i >= 0; --i) words[i] = words[i] << 1 | (i ? words[i - 1] >> 63 : 0);
+        }
+        // The highest 128 bits of 1 / this.
+        constexpr Wide Reciprocal() const {
+            Number rest{};
+            rest.words[Bits() / 64] = 1ull << Bits() % 64; // the first power of two above: the first bit is set
+            Wide bits = 0;
+            for (int i = 0; i < 128; ++i, rest.Double()) bits = bits << 1 | rest.TakeAway(*this);
+            return bits;
+        }
+    };
+
+    Wide m_bits[2 * kFar + 1] = {};
+};
+inline constexpr FivePowers kFivePowers;
+
+// number * 10^power, rounded once, half to even: the published way of Eisel and Lemire, who also prove that the highest
+// 128 bits of the power suffice for every number of 64. Requires: number > 0, |power| <= kFar, which keeps the result
+// away from both ends of the doubles' range.
+inline double Scaled(std::uint64_t number, int power) {
+    const int up = std::countl_zero(number);
+    number <<= up;
+    const Wide five = kFivePowers[power];
+    Wide product = static_cast<Wide>(number) * static_cast<std::uint64_t>(five >> 64);
+    constexpr std::uint64_t kBelowRounding = 0x1FF; // all set: what is missing may carry into the bits that count
+    if ((static_cast<std::uint64_t>(product >> 64) & kBelowRounding) == kBelowRounding)
+        product += static_cast<Wide>(number) * static_cast<std::uint64_t>(five) >> 64;
+    const auto high = static_cast<std::uint64_t>(product >> 64), low = static_cast<std::uint64_t>(product);
+    const int carried = static_cast<int>(high >> 63);
+    std::uint64_t mantissa = high >> (carried + 9); // 53 bits and one to round by
+    // Halfway between two doubles, which only small powers reach: down when the upper one is odd.
+    const bool isHalf = low <= 1 && power >= -4 && power <= 23 && mantissa << (carried + 9) == high;
+    if (isHalf && (mantissa & 3) == 1) mantissa &= ~1ull;
+    mantissa = (mantissa + (mantissa & 1)) >> 1;
+    // The mantissa's highest bit, and a carry above it, add themselves to the exponent.
+    constexpr int kBitsOfTen = 217706; // of 2^16: log2(10)
+    const int exponent = (kBitsOfTen * power >> 16) + 63 + carried - up + 1023;
+    return std::bit_cast<double>((static_cast<std::uint64_t>(exponent - 1) << 52) + mantissa);
+}
+
+// Reads a number of few digits. `point` is where the text has a decimal point that is no '.'.
+inline bool ScanShort(Text text, const wchar_t* point, double& value) {
     constexpr double kPowers[] = {1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6, 1e7, 1e8, 1e9, 1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
-    constexpr std::ptrdiff_t kMostDigits = 15;
+    constexpr std::ptrdiff_t kExactDigits = 15; // of numbers that are doubles, as their powers of ten are
+    constexpr std::ptrdiff_t kMostDigits = 19;  // of numbers of 64 bits
+    const wchar_t* at = text.at;
     std::uint64_t number = 0;
     const auto scan = [&] {
         const wchar_t* const start = at;
@@ -184,28 +306,33 @@ inline bool ScanShort(const wchar_t* at, const wchar_t* point, double& value) {
     };
     std::ptrdiff_t digits = scan(), fraction = 0;
     if (*at == '.' || at == point) {
-        ++at;
-        fraction = scan();
+        const wchar_t* const start = ++at;
+        for (std::uint64_t eight; text.end - at >= 8 && ReadEight(at, eight); at += 8)
+            number = number * 100000000 + eight;
+        scan();
+        fraction = at - start;
         digits += fraction;
     }
-    if (digits == 0 || digits > kMostDigits || (*at | 0x20) == 'e') return false;
-    value = static_cast<double>(number) / kPowers[fraction];
+    if (digits == 0 || digits > kMostDigits) return false;
+    const bool hasExponent = (*at | 0x20) == 'e';
+    if (digits <= kExactDigits && !hasExponent) {
+        value = static_cast<double>(number) / kPowers[fraction];
+        return true;
+    }
+    int power = -static_cast<int>(fraction);
+    if (hasExponent) {
+        const bool negative = *++at == '-';
+        if (negative || *at == '+') ++at;
+        constexpr int kFewDigits = 3;
+        int exponent = 0, count = 0;
+        for (unsigned digit; (digit = DecimalDigit(*at)) < 10 && count <= kFewDigits; ++at, ++count)
+            exponent = exponent * 10 + static_cast<int>(digit);
+        if (count > kFewDigits) return false;
+        power += negative ? -exponent : exponent;
+    }
+    if (power < -FivePowers::kFar || power > FivePowers::kFar) return false;
+    value = number ? Scaled(number, power) : 0;
     return true;
-}
-
-// Reads a number that ends within the first units of a text of at least 16, by the standard library's scanner.
-inline bool ScanMedium(Text text, const wchar_t* point, double& value) {
-    using namespace Simd;
-    constexpr std::ptrdiff_t kMost = 2 * kBlock;
-    if (DecimalDigit(*text.at) > 9 && *text.at != '.' && text.at != point) return false; // "inf"
-    const std::ptrdiff_t units = std::min(text.end - text.at, kMost);
-    char narrow[kMost + kBlock];
-    Store(narrow, NarrowText(text.at));
-    const std::ptrdiff_t place = std::min<std::ptrdiff_t>(16, units);
-    Store(narrow + place, NarrowText(text.at + place));
-    if (point && point - text.at < units) narrow[point - text.at] = '.';
-    const auto [end, error] = std::from_chars(narrow, narrow + units, value);
-    return error == std::errc() && narrow + kMost - end > 2; // no exponent is cut
 }
 
 // Any number: its digits * 10^exponent. A double lies between two halves of at most 767 digits; of a number with more
@@ -280,9 +407,7 @@ inline bool ScanDecimalDouble(Text text, const wchar_t* point, double& value) {
     while (numberscan::IsBlank(*text.at)) ++text.at;
     const bool negative = *text.at == '-';
     if (negative || *text.at == '+') ++text.at;
-    constexpr std::ptrdiff_t kShort = 16;
-    const bool isShort = text.end - text.at <= kShort;
-    if (!(isShort ? ScanShort(text.at, point, value) : ScanMedium(text, point, value))) {
+    if (!ScanShort(text, point, value)) {
         Decimal number;
         if (!number.Scan(text, point)) return false;
         value = number.Value();
