@@ -1,8 +1,8 @@
 // Events: who is let go, and which signals are used.
 
-#include "support/assertions.h"
 #include "support/heapwatch.h"
 #include "support/jobs.h"
+#include "support/log.h"
 
 #include <algorithm>
 #include <chrono>
