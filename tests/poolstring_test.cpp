@@ -192,18 +192,6 @@ TEST(StringArray, UnsortedOneIsAList) {
     EXPECT_EQ(Elements(holder)[0], "b") << "copies never change each other";
 }
 
-TEST(StringArray, CopiesNeverChangeEachOther) {
-    const CPPoolStringArray set = ArrayOf(true, {L"c", L"a", L"b"});
-    for (int change = 0; change < 3; ++change) {
-        CPPoolStringArray copy(false);
-        copy = set;
-        EXPECT_TRUE(change == 0 ? copy.Delete(L"a") : change == 1 ? copy.Add(L"d") : copy.Inflate(L"x,y", L','));
-        EXPECT_TRUE(copy.IsSorted()) << "the flag comes along";
-        EXPECT_NE(Elements(copy), Elements(set));
-        EXPECT_EQ(Elements(set), (Strings{"a", "b", "c"}));
-    }
-}
-
 TEST(StringArray, TakesBlocksOfPooledStrings) {
     TAVO::Buffers::CPObjectVector<CPPoolString> block;
     for (const wchar_t* text : {L"b", L"a", L"b"}) ASSERT_TRUE(block.Insert(text, SIZE_MAX));
