@@ -112,24 +112,6 @@ TEST(Events, NoSignalIsLostOrUsedTwice) {
     }
 }
 
-TEST(Events, LetThoseWhoWaitSeeWhatWasWrittenBefore) {
-    for (int round = 0; round < 50; ++round) {
-        const CPEvent gate(true), one(false);
-        int written = 0; // plain: the events alone order it
-        const auto pass = [&] {
-            written += gate.Wait(60000) == 0 && gate.Wait(0) == 0 && one.Wait(WaitForever) == 0;
-            one.Set();
-        };
-        {
-            Job a(pass), b(pass), c(pass);
-            gate.Set();
-            written = 1;
-            one.Set();
-        }
-        ASSERT_EQ(written, 4);
-    }
-}
-
 TEST(Events, AnInterruptedWaitUsesNoSignal) {
     std::mt19937 random(3);
     for (int round = 0; round < 100; ++round) {

@@ -202,4 +202,16 @@ TEST(Maintenance, StartingAndRegisteringSurviveAFailingHeap) {
     });
 }
 
+TEST(Maintenance, PoolSweepsStartOnce) {
+    EXPECT_TRUE(String::CStringPool::AppInit() && !String::CStringPool::AppInit());
+    EXPECT_FALSE(AppInit()) << "the sweeps were started by themselves";
+    EXPECT_TRUE(IsRunning()) << "what did start stays started";
+    EXPECT_TRUE(AppInit()) << "counts on";
+    AppExit();
+    AppExit();
+    EXPECT_FALSE(IsRunning());
+    EXPECT_TRUE(String::CStringPool::AppInit()) << "the stop let go of them";
+    String::CStringPool::AppExit();
+}
+
 } // namespace

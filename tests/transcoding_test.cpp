@@ -240,6 +240,14 @@ TEST_F(Differential, RandomTextsAtEveryBound_Intended) {
     }
 }
 
+TEST_F(Differential, LongTextsSumUp) {
+    Bytes text;
+    for (int i = 0; i < 5000; ++i) text.insert(text.end(), {'a', 0xC3, 0xA9, 0xE4, 0xB8, 0xAD, 0xF0, 0x9F, 0x98, 0x80});
+    for (const Bytes& bytes : {text, Bytes(50000, 'x')}) Expect(Terminated(bytes), kAll);
+    for (const int unit : {0x78, 0xE9, 0x4E2D})
+        Expect(Terminated(Units(40000, static_cast<unsigned short>(unit))), kAll);
+}
+
 // Intended: utf32-bound
 TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {
     const struct {
