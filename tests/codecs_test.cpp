@@ -65,7 +65,6 @@ TEST_F(Codecs, FollowTheirDefinition) {
     EXPECT_EQ(Encoded<C3FEncoder>({0}), (Units{0x0102, 0x21, 0x21, 0x21, 0x21}));
     EXPECT_EQ(Encoded<C3FEncoder>({0, 0x0E}), (Units{0x0101, 0x21, 0x01, 0x21, 0x21}));
     EXPECT_EQ(Encoded<C3FFFEncoder>(Bytes(7, 0)), (Units{0x0307, 0x4000, 0x4000, 0x4000, 0x4000}));
-    EXPECT_EQ(Encoded<C3FFFEncoder>({1, 2, 3}), (Units{0x0304, 0x4201, 0x400C, 0x4000, 0x4000}));
 }
 
 // Intended: 3f-wrap, 3f-multiples, codec-announced

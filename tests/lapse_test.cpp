@@ -60,18 +60,10 @@ TEST(Stopwatch, RunsFromItsStart) {
         EXPECT_EQ(Word(watch), start) << "laps add up";
         wait();
         EXPECT_TRUE(watch.lapse_double() >= 0.019 && watch.lapse_double() < 5) << watch.lapse_double();
-        unnamed.Stop();
-        const auto kept = unnamed.lapse_nano();
-        wait();
-        EXPECT_TRUE(kept >= 19000000 && unnamed.lapse_nano() == kept);
-        unnamed.Start();
-        unnamed.Stop();
-        EXPECT_LT(unnamed.lapse_nano(), kept) << "from 0";
-        unnamed.Start();
     }
     const support::Texts lines = log.Take();
     ASSERT_EQ(lines.size(), 2u) << "a watch without a name has no total";
     EXPECT_EQ(lines[0].substr(lines[0].find("ms")), "ms none:0 lap");
     EXPECT_EQ(lines[1].substr(lines[1].find("ms")), "ms none:0 Total");
-    EXPECT_GE(std::stod(lines[1].substr(lines[1].find(" - ") + 3)), 29.0);
+    EXPECT_GE(std::stod(lines[1].substr(lines[1].find(" - ") + 3)), 19.0);
 }

@@ -151,6 +151,43 @@ TEST(ToolGet, FindsTextsAndAttributes) {
                 {".|--attribute|1", kUsage, "", "no attribute"}});
 }
 
+TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
+    const char* const values[][3] = {
+        {"int", " -7 of 9", "-7"},
+        {"uint", "-1", "4294967295"},
+        {"hex", "FF", "0xff"},
+        {"int64", "-9223372036854775808", "-9223372036854775808"},
+        {"double", "-1.50e1", "-15"},
+        {"edouble", "3ff8000000000000(1.5)", "1.5"},
+        {"rational", "50 / 2", "25/1"},
+        {"bool", "TRUE", "true"},
+        {"timecode", "10:00:00:00 {25/1}Hz", "10:00:00:00 {25/1}Hz"},
+        {"id", "00000000-0000-0000-0000-000000000000", "00000000-0000-0000-0000-000000000000"},
+        {"binary", "21BA", "12ab"}};
+    for (const auto& [type, text, value] : values)
+        ExpectRun(Call(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>"), kFine,
+                  std::string(value) + '\n', "");
+    const char* const faults[][3] = {{"int", "+x7", "character 2 is \"x\", where a digit belongs"},
+                                     {"hex", "0xg", "character 3 is \"g\", where a hexadecimal digit"},
+                                     {"double", "-.", "it ends where character 3, a digit, belongs"},
+                                     {"edouble", "(1.5)", "character 1 is \"(\""},
+                                     {"rational", "50:2", "character 3 is \":\", where \"/\" belongs"},
+                                     {"rational", "5/\xC3\xA9", "character 3 is \"\xC3\xA9\", where a digit"},
+                                     {"bool", "falsch", "character 5 is \"c\", where \"true\" or \"false\""},
+                                     {"timecode", "10:00:00:25 {25/1}Hz", "the frames are 25"},
+                                     {"timecode", "10:00:00:00", "does not tell the rate"},
+                                     {"id", "{15603cd4-ab81-4d6f-b05f-c6bea760a789}", "without braces"},
+                                     {"binary", "21B", "it ends where character 4, the second digit"},
+                                     {"binary", "", "it ends where character 1, a hexadecimal digit"}};
+    for (const auto& [type, text, fault] : faults)
+        ExpectRows(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>",
+                   {{"", kBadInput, "", fault}});
+    ExpectRows("xml|get|" + kTimeline + "|bins/bin/clip|--attribute|", "",
+               {{"rate|--as|rational", kFine, "50/1\n"},
+                {"rate|--as|number", kUsage, "", "not in"},
+                {"name|--as|int", kBadInput, "", "clip name: \"Harbour 01\""}});
+}
+
 TEST(ToolSet, ChangesTextsAndAttributes) {
     const std::string head = "UTF-8\"?><a x=\"1\"><b>", rest = "</b><c><d/></c></a>";
     ExpectRows("xml|set|-o|-|-|", "<a x=\"1\"><b>old</b><c><d/></c></a>",
@@ -376,19 +413,16 @@ TEST(ToolCodec, TellsThePlaceOfFaults) {
         const char* code;
         std::string text, complaint;
     } rows[] = {
-        {"3fff", "", "1, at offset 0: the text ends where its header belongs"},
         {"3fff", "\xEF\xBB\xBFx", "1, at offset 3: U+0078 is no header: that is U+0301 to U+0307"},
         {"3fff", header + unit + unit + unit + '\n', "5, at offset 11: the text ends within a group of four units"},
         {"3fff", header + unit + "\xE4\x80", "3, at offset 5: E4 80 is truncated"},
         {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+1F600 belongs to no code"},
-        {"3fff", utf16 + "\1\x80", "2, at offset 4: U+8001 does not belong there"},
         {"3fff", utf16 + "@", "2, at offset 4: the text ends within a unit"},
         {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
         {"hex", "4F 4", "5, at offset 4: the text ends within a byte"},
     };
     for (const auto& row : rows)
         ExpectRun(Call("codec|decode|" + std::string(row.code), row.text), kBadInput, "", "unit " + row.complaint);
-    ExpectRun(Call("codec|encode|base64"), kUsage, "", "base64");
 }
 
 TEST(ToolCrc, GivesTheCheckValueOfEachName) {
@@ -414,8 +448,6 @@ TEST(ToolCrc, ReadsFilesAndNumbers) {
     const std::string empty = folder.Put("empty", ""), large = folder.Put("large", std::string(3000000, 'x'));
     ExpectRun(Call("crc|--name|crc-16|" + empty + "|no such file|" + large), kFileTrouble,
               "0000  " + empty + "\n" + "cb0b  " + large + '\n', "no such file: does not exist");
-    ExpectRun(Call("crc|--name|crc-32|--json|" + empty), kFine,
-              "[\n{\"file\":\"" + empty + "\",\"crc\":\"00000000\",\"bytes\":0}\n]\n", "");
     ExpectRows("crc|", "",
                {{"--name|crc-99", kUsage, "", "\"crc-99\" is no name"},
                 {"--width|8", kUsage, "", "--poly HEX"},

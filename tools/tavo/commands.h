@@ -20,6 +20,7 @@ int Tree(const TreeOptions& options);
 
 struct GetOptions {
     std::string file, path, attribute;
+    std::string type; // one of ValueTypeNames; empty for the text as it is
 };
 int Get(const GetOptions& options);
 

@@ -5,6 +5,7 @@
 #include "encodings.h"
 #include "reference.h"
 #include "streams.h"
+#include "value.h"
 
 #include <CLI/CLI.hpp>
 #include <functional>
@@ -62,6 +63,9 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
     command->add_option("PATH", get.path, kPathHelp)->required()->type_name("");
     command->add_option("--attribute", get.attribute, "the attribute of this name instead of the text")
         ->type_name("NAME");
+    command->add_option("--as", get.type, "the value that the library's readers of this type find in the text")
+        ->check(CLI::IsMember(ValueTypeNames()))
+        ->type_name("TYPE");
 
     command = xml.add_subcommand("set", "Changes the text of an element, or an attribute, and writes the document");
     auto& set = Add<SetOptions>(*command, action, Set);
