@@ -71,6 +71,8 @@ TEST(Timecode, Arithmetic) {
            {"over, truncating", -film / 3, {-33, 3}},
            {"over zero", film / 0, {0, kInvalid}},
            {"bottom over minus one", bottom / -1, {LLONG_MIN, kInvalid | 3}},
+           {"times a double", film * 0.555, {56, 3}},
+           {"over the least double", film / 0.000001, {100000000, 3}},
            // Intended: timecode-half
            {"0.5 is added to negative results too", -pal * 1.0, {-47, 0}},
            // Intended: timecode-divisor
@@ -120,6 +122,8 @@ TEST(Timecode, RoundingToFramesIntended) {
         EXPECT_EQ(Of(t.Trunced()), (Whole{row.trunced, 0})) << row.count;
         EXPECT_EQ(Of(t.Roofed()), (Whole{row.roofed, 0})) << row.count;
         EXPECT_EQ(t.AssertAligned(), row.count % 48 == 0);
+        EXPECT_LE(static_cast<long long>(t.MappedTo(0, -1)), row.count);
+        EXPECT_GE(static_cast<long long>(t.MappedTo(0, 1)), row.count);
         EXPECT_EQ(Of(t.MappedTo(0, 0)), Of(t.Aligned()));
     }
     const long long top = LLONG_MAX - LLONG_MAX % 48;

@@ -262,6 +262,8 @@ TEST(ToolTimecode, TakesSystemsByNameCodeAndRate) {
                 {"5", kFine, "system            5 HDFILM(DF)\n", "warning: no standard knows HDFILM(DF)"},
                 {"30000/1001", kUsage, "", "that of NTSC and of NTSC(DF), so write 30000/1001/ND or 30000/1001/D"},
                 {"25/1/D", kUsage, "", "no drop frame at this rate"},
+                {"0/0", kUsage, "", "no system has this rate"},
+                {"30000/1001/X", kUsage, "", "behind the rate stands /D"},
                 {"14", kUsage, "", "codes go from 0 to 13"},
                 {"29.97", kUsage, "", "give a name, a code, or a rate"},
                 {"\xFF", kUsage, "", "\"\xEF\xBF\xBD\" is no system"}});
@@ -354,6 +356,8 @@ TEST(ToolTimecode, Computes) {
 TEST(ToolRational, Approximates) {
     ExpectRows("rational|approx|--max-den|", "",
                {{"3|--|-0.3333", kFine, "fraction          -1/3\n"},
+                {"1|", kBadInput, "", "character 1"},
+                {"1|1e999", kBadInput, "", "out of the range"},
                 {"1|1073741825", kBadInput, "", "magnitude goes to 1073741823"},
                 {"1|1x", kBadInput, "", "character 2"},
                 {"1073741824|1", kUsage, "", "--max-den"},
@@ -389,6 +393,7 @@ TEST(ToolId, ParsesFormatsAndMakes) {
         {{"", kBadInput, ends + "1, a hexadecimal digit, belongs; the library reads the null identifier"},
          {id + "\xC3\xA9", kBadInput, "character 37 is \"\xC3\xA9\", where the end belongs; the library reads 1"},
          {'{' + id, kBadInput, ends + "38, \"}\", belongs; the library refuses it"}});
+    ExpectRows("id|format|x", "", {{"", kBadInput, "", "no identifier"}});
     EXPECT_EQ(RunTool({"id", "parse", Call("id|new|--count|3").output.substr(74, 36)}).code, kFine);
 }
 
@@ -419,6 +424,7 @@ TEST(ToolCodec, TellsThePlaceOfFaults) {
         {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+1F600 belongs to no code"},
         {"3fff", utf16 + "@", "2, at offset 4: the text ends within a unit"},
         {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
+        {"3f", "\xC4\x82!%!!", "3, at offset 3: U+0025 does not belong there"},
         {"hex", "4F 4", "5, at offset 4: the text ends within a byte"},
     };
     for (const auto& row : rows)
@@ -461,6 +467,7 @@ TEST(ToolUrl, EscapesAndNamesWhatIsNot) {
                 {"encode|--keep|%|a%20b", kFine, "a%20b\n", "does not decode to itself"},
                 {"decode|%C3%A9%C3", kFine, "\xC3\xA9\xC3\n", "byte 3 of the decoded text: C3 is truncated"},
                 {"from-path|a", kFine, "file:///a\n", "relative"},
+                {"from-path|", kBadInput, "", "empty"},
                 {"from-path|/\xF0\x9F\x98\x80", kBadInput, "", "above U+FFFF"},
                 {"to-path|file:///\xF0\x9F\x98\x80", kBadInput, "", "byte 9 of the decoded text: U+1F600 comes out"},
                 {"to-path|file:///%C0%80", kBadInput, "", "a zero ends"},
