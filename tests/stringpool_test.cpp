@@ -1,8 +1,10 @@
 // Interning against a slow reading of its rules: keys, identity, cut texts, case groups, sweeps, submitters.
 
+#include "plugin/pool.h"
 #include "support/guardpage.h"
 #include "support/heapwatch.h"
 #include "support/log.h"
+#include "support/machine.h"
 #include "support/texts.h"
 
 #include <algorithm>
@@ -360,6 +362,19 @@ struct HostStatic {
     }
 } g_static;
 
-TEST(Pool, ServesStaticObjects) { EXPECT_EQ(Entry(CPPoolString(L"made by a static constructor")), g_static.entry); }
+TEST(Pool, ServesStaticObjects) {
+    EXPECT_EQ(Entry(CPPoolString(L"made by a static constructor")), g_static.entry);
+    CPPoolString mine;
+    const wchar_t* late = nullptr;
+    {
+        const support::Plugin plugin("TAVOTestPlugin");
+        const auto held = plugin.Find<plugin::HeldEntry>(plugin::kHeldEntry);
+        ASSERT_NE(held, nullptr);
+        mine = plugin::kHeldText;
+        Sweep(2);
+        EXPECT_EQ(held(&late), Entry(mine));
+    }
+    EXPECT_EQ(Entry(CStringPool::QueryStringRef(plugin::kLateText)), late) << "its destructor ran, and interned";
+}
 
 } // namespace

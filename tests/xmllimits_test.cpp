@@ -45,6 +45,14 @@ TEST(XmlLimits, AMillionNestedElementsOnASmallStack) {
     });
 }
 
+TEST(XmlLimits, AMillionSiblings) {
+    CXMLDoc document;
+    ASSERT_TRUE(Open(document, "<r>" + Repeated("<a b='1'>x</a>", kMillion) + "</r>"));
+    CPXMLObject& root = document.GetRootElement();
+    EXPECT_EQ(Outline(Plain(root.item(kMillion - 1))), "a b='1':x");
+    EXPECT_EQ(root.AddTag(L"z").sIndex(), kMillion) << "an array built at once still grows";
+}
+
 // Nothing that a text holds may cost more than its length.
 TEST(XmlLimits, LongRunsTakeLinearTime) {
     std::string attributes = "<a";
