@@ -2,15 +2,10 @@
 // Input: bytes to encode; the same bytes as the units of a text to decode.
 
 #include "codecs_reference.h"
-
-#include <cstdlib>
+#include "require.h"
 
 using namespace reference;
 using namespace TAVO::String;
-
-static void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     const Bytes bytes(data, data + size);

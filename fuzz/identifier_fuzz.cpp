@@ -1,18 +1,15 @@
 // Identifier text, narrow and wide, against a plain reading of its rules.
 // Input: bytes as narrow text; the same bytes as the units of wide text.
 
+#include "require.h"
+
 #include <cstdint>
-#include <cstdlib>
 #include <TAVO/acf.h>
 #include <vector>
 
 namespace {
 
 using TAVO::ACF::cacfuid;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 int Digit(unsigned c) {
     if (c >= '0' && c <= '9') return static_cast<int>(c - '0');

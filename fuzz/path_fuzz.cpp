@@ -1,9 +1,10 @@
 // Path texts: what is taken apart joins to the same text, and straight paths against a naive reading.
 // Input: the units of a path, one byte each.
 
+#include "require.h"
+
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
 #include <string>
 #include <TAVO/files.h>
 #include <vector>
@@ -11,10 +12,6 @@
 namespace {
 
 using namespace TAVO::Files;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 struct Root {
     ePathRoot kind;

@@ -2,8 +2,9 @@
 // Input: per operation one byte (what to do), one byte (which text or handle), for a new text a length byte and the
 // text.
 
+#include "require.h"
+
 #include <cstdint>
-#include <cstdlib>
 #include <map>
 #include <string>
 #include <TAVO/string.h>
@@ -14,10 +15,6 @@ namespace {
 
 using namespace TAVO::String;
 using Units = std::vector<wchar_t>;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 class Input {
 public:

@@ -2,20 +2,16 @@
 // Input: records of four 32-bit integers, two fractions each; their bits are taken as a double as well.
 
 #include "rational_reference.h"
+#include "require.h"
 
 #include <cmath>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 
 using TAVO::long32;
 using TAVO::Math::CRational;
 
 namespace {
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 void CheckPair(const CRational& a, const CRational& b) { Require(reference::AgreesOn(a, b)); }
 

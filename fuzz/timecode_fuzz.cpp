@@ -1,9 +1,10 @@
 // Timecode texts: any text gives one of the forms, a form is read as what it says, and nothing behind the end is
 // touched. Input: 16-bit units, used as free text and put into the characters of both forms as they are.
 
+#include "require.h"
+
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <TAVO/timecode.h>
 #include <vector>
@@ -12,10 +13,6 @@ namespace {
 
 using namespace TAVO;
 using namespace TAVO::TimeCode;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 bool SameText(const wchar_t* a, const wchar_t* b) {
     while (*a && *a == *b) ++a, ++b;

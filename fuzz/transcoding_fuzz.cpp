@@ -1,8 +1,9 @@
 // Transcoders: what is measured is written, nothing more is touched, every step advances or fails.
 // Input: the first byte chooses the bound, the rest is text (UTF-8, and once more as UTF-16).
 
+#include "require.h"
+
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <TAVO/string.h>
 #include <vector>
@@ -11,10 +12,6 @@ namespace {
 
 using namespace TAVO::String;
 using TAVO::ulong32;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 // A whole-string converter at exactly the size it asked for, and at one less.
 template <class Target, class Source, class Function>

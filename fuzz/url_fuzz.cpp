@@ -1,10 +1,11 @@
 // Escaping: round trips, and what is checked is what encoding leaves alone. File URLs: absolute paths come back.
 // Input: the first byte says how many bytes the extra set takes, the rest is text (bytes, and once more as UTF-16).
 
+#include "require.h"
+
 #include <algorithm>
 #include <cctype>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <string>
 #include <TAVO/internetional.h>
@@ -14,10 +15,6 @@ namespace {
 
 using namespace TAVO::Internetional;
 using Bytes = std::vector<unsigned char>; // terminated, so that a sanitizer sees the end
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 Bytes Terminated(const std::string& text) {
     Bytes bytes(text.begin(), text.end());

@@ -2,9 +2,9 @@
 // with a second reader written from the rules, and between UTF-8 and UTF-16. Input: the bytes, as they are.
 
 #include "../tests/support/xmlreference.h"
+#include "require.h"
 
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 
 namespace {
@@ -13,10 +13,6 @@ using namespace support;
 using namespace TAVO;
 
 constexpr std::size_t kLongest = 2048; // what the second reader is asked to read
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 // Long texts that differ only in pairs, or in 01 in their place, may be one entry of the pool: they are all one here.
 std::string WithoutPairs(const std::string& outline) {

@@ -4,9 +4,9 @@
 // no line ends, no pairs.
 
 #include "../tests/support/xmlreference.h"
+#include "require.h"
 
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <vector>
 
@@ -18,10 +18,6 @@ using String::CPPoolString;
 using String::CStringPool;
 
 constexpr std::size_t kDeepest = 100; // the comparison below is recursive
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 class Program {
 public:

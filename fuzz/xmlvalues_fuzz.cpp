@@ -1,11 +1,12 @@
 // Typed values: what the readers make of any text, against readers written from their rules, and what comes back of
 // values. Input: a text, byte by byte; its first bytes are values as well. Bytes from 80 up become units from all over.
 
+#include "require.h"
+
 #include <algorithm>
 #include <array>
 #include <bit>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <optional>
 #include <string>
@@ -21,10 +22,6 @@ using namespace TAVO::XML;
 using Math::CRational;
 using String::CPPoolString;
 using String::CStringPool;
-
-void Require(bool condition) {
-    if (!condition) std::abort();
-}
 
 // --- readers by the rules, on texts whose other characters are 80 ----------------------------------------------------
 

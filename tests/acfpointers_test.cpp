@@ -1,8 +1,8 @@
 // Wrappers of interface pointers, and the bases of components, over fakes that count.
 
 #include "support/acffakes.h"
-#include "support/assertions.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 
 #include <gtest/gtest.h>
 

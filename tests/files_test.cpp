@@ -145,16 +145,6 @@ TEST_F(File, MovesItsHandle) {
     EXPECT_TRUE(third.Flush() && third.Close() && !_TestFileExists(path)) << "still for writing, still temporary";
 }
 
-TEST_F(FileActions, TakeNamesOfEveryPlane) {
-    for (const wchar_t* name : {L"Gr\u00FC\u00DFe \u20AC.txt", L"\u65E5\u672C", L"\U0001F600\U00010000\U0010FFFD.x"}) {
-        Put(folder / name, "abc");
-        EXPECT_EQ(List(folder.Path()), std::vector<WideText>{name});
-        EXPECT_TRUE(CFile::RenameFile(folder / name, path) && CFile::RenameFile(path, folder / name));
-        EXPECT_EQ(Contents(folder / name), "abc");
-        EXPECT_TRUE(CFile::DeleteFileW(folder / name));
-    }
-}
-
 TEST_F(FileActions, TellFilesFromFoldersAndNeverReplace) {
     const WideText dir = folder / L"dir", missing = folder / L"x", inside = dir + L"/file";
     EXPECT_TRUE(_CreateDir(dir));

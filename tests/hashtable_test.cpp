@@ -1,7 +1,7 @@
 // The hash table against a model: collisions by every policy, visitors that change or throw, disposal in instalments.
 
-#include "support/assertions.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 
 #include <algorithm>
 #include <chrono>

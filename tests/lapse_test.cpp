@@ -1,5 +1,7 @@
 // The stopwatch: its times, and what it tells the log.
 
+#include "support/log.h"
+
 #include <cstring>
 #include <gtest/gtest.h>
 #include <string>
@@ -12,28 +14,6 @@ using TAVO::String::CPPoolString;
 
 namespace {
 
-using Lines = std::vector<std::string>;
-Lines g_lines;
-
-void KeepLine(_acfDebugLevel level, const wchar_t* category, const char* source, TAVO::long32 line,
-              const wchar_t* format, std::va_list arguments) {
-    EXPECT_TRUE(level == 16 && !source && line == 0);
-    std::string kept;
-    for (; *category; ++category) kept += static_cast<char>(*category);
-    kept += ": ";
-    for (; *format; ++format) kept += static_cast<char>(*format);
-    if (kept.find('%') != kept.npos) kept.append("|").append(std::to_string(va_arg(arguments, int)));
-    g_lines.push_back(kept);
-}
-
-struct Stopwatch : testing::Test {
-    Stopwatch() {
-        g_lines.clear();
-        SetExternalLogger(KeepLine);
-    }
-    ~Stopwatch() override { SetExternalLogger(nullptr); }
-};
-
 // Its word comes first.
 void SetWord(CHFLapse& watch, unsigned long long word) { std::memcpy(static_cast<void*>(&watch), &word, sizeof word); }
 unsigned long long Word(const CHFLapse& watch) {
@@ -45,7 +25,8 @@ unsigned long long Word(const CHFLapse& watch) {
 } // namespace
 
 // Intended: lapse-count
-TEST_F(Stopwatch, KeepsAndReportsTimesAndIntendedCountsTwiceThem) {
+TEST(Stopwatch, KeepsAndReportsTimesAndIntendedCountsTwiceThem) {
+    const support::Log log;
     {
         CHFLapse watch(L"import"), unnamed(CPPoolString::pempty);
         EXPECT_EQ(Word(unnamed), 0u) << "stands";
@@ -61,12 +42,13 @@ TEST_F(Stopwatch, KeepsAndReportsTimesAndIntendedCountsTwiceThem) {
         SetWord(unnamed, 3600000004999999ULL << 1);
         unnamed.Lapse(L"100%%%d", 7);
     }
-    EXPECT_EQ(g_lines,
-              (Lines{"import - 10.75ms: %d clips|3", "import - 10.75ms: ", "CHFLapse - 3600000005.00ms: 100%%%d|7"}))
+    EXPECT_EQ(log.Take(), (support::Texts{"16 import - 10.75ms none:0 %d clips|3", "16 import - 10.75ms none:0 ",
+                                          "16 CHFLapse - 3600000005.00ms none:0 100%%%d|7"}))
         << "and no totals";
 }
 
-TEST_F(Stopwatch, RunsFromItsStart) {
+TEST(Stopwatch, RunsFromItsStart) {
+    const support::Log log;
     const auto wait = [] { std::this_thread::sleep_for(std::chrono::milliseconds(10)); };
     {
         CHFLapse watch(L"import"), unnamed{CPPoolString()};
@@ -79,8 +61,9 @@ TEST_F(Stopwatch, RunsFromItsStart) {
         wait();
         EXPECT_TRUE(watch.lapse_double() >= 0.019 && watch.lapse_double() < 5) << watch.lapse_double();
     }
-    ASSERT_EQ(g_lines.size(), 2u) << "a watch without a name has no total";
-    EXPECT_EQ(g_lines[0].substr(g_lines[0].find("ms")), "ms: lap");
-    EXPECT_EQ(g_lines[1].substr(g_lines[1].find("ms")), "ms: Total");
-    EXPECT_GE(std::stod(g_lines[1].substr(9)), 19.0);
+    const support::Texts lines = log.Take();
+    ASSERT_EQ(lines.size(), 2u) << "a watch without a name has no total";
+    EXPECT_EQ(lines[0].substr(lines[0].find("ms")), "ms none:0 lap");
+    EXPECT_EQ(lines[1].substr(lines[1].find("ms")), "ms none:0 Total");
+    EXPECT_GE(std::stod(lines[1].substr(lines[1].find(" - ") + 3)), 19.0);
 }

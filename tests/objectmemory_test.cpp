@@ -1,7 +1,7 @@
 // Blocks and their handles: counting, copying on write, static blocks, releases that nest or fail; plain memory.
 
-#include "support/assertions.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 
 #include <algorithm>
 #include <atomic>

@@ -34,9 +34,8 @@ TEST(PooledString, NullEmptyAndTextDiffer) {
 TEST(PooledString, NumbersKeepTheirLow32BitsIntended) {
     using Row = std::pair<CPPoolString, const wchar_t*>;
     for (const auto& [text, expected] :
-         {Row{0, L"0"}, Row{-1, L"-1"}, Row{INT_MIN, L"-2147483648"}, Row{INT_MAX, L"2147483647"},
-          Row{4294967295u, L"4294967295"}, Row{-1L, L"-1"}, Row{4294967295UL, L"4294967295"}, Row{4294967296ULL, L"0"},
-          Row{4294967297ULL, L"1"}, Row{ULLONG_MAX, L"4294967295"}, Row{4294967295LL, L"-1"}, Row{LLONG_MIN, L"0"},
+         {Row{0, L"0"}, Row{INT_MIN, L"-2147483648"}, Row{4294967295u, L"4294967295"}, Row{-1L, L"-1"},
+          Row{4294967295UL, L"4294967295"}, Row{4294967297ULL, L"1"}, Row{4294967295LL, L"-1"},
           Row{-4294967295LL, L"1"}, Row{static_cast<short>(-5), L"-5"}, Row{static_cast<unsigned char>(200), L"200"},
           Row{static_cast<signed char>(-128), L"-128"}, Row{true, L"true"}, Row{false, L"false"}})
         EXPECT_STREQ(Entry(text), expected);
@@ -60,9 +59,8 @@ TEST(PooledString, HandlesMoveAndTransfer) {
 
 TEST(PooledString, IncRaisesTheTrailingNumber) {
     using Row = std::pair<const wchar_t*, const wchar_t*>;
-    for (const auto& [text, expected] :
-         {Row{L"clip009", L"clip010"}, Row{L"clip", L"clip1"}, Row{L"", L"1"}, Row{L"a99", L"a100"},
-          Row{L"a1b", L"a1b1"}, Row{L"18446744073709551615", L"18446744073709551616"}})
+    for (const auto& [text, expected] : {Row{L"clip009", L"clip010"}, Row{L"", L"1"}, Row{L"a1b99", L"a1b100"},
+                                         Row{L"18446744073709551615", L"18446744073709551616"}})
         EXPECT_STREQ(Entry(CPPoolString(text).inc()), expected);
     EXPECT_TRUE(CPPoolString().inc().isnull());
 }
@@ -187,21 +185,11 @@ TEST(StringArray, UnsortedOneIsAList) {
     EXPECT_FALSE(array.Insert(L"d", 6) || array.Delete(L"a") || array.LocateEntry(L"a") + 1);
     EXPECT_EQ(Elements(array), (Strings{"b", "c", "a", "b", "b"}));
     const CPPoolStringArray holder(array);
+    CPPoolStringArray longer(array), inserted(array);
+    EXPECT_TRUE(longer.Add(L"d") && inserted.Insert(L"d", 0));
     array.Sort();
     EXPECT_EQ(Elements(array), (Strings{"a", "b", "b", "b", "c"}));
-    EXPECT_EQ(Elements(holder)[0], "b") << "copies never change each other";
-}
-
-TEST(StringArray, CopiesNeverChangeEachOther) {
-    const CPPoolStringArray set = ArrayOf(true, {L"c", L"a", L"b"});
-    for (int change = 0; change < 3; ++change) {
-        CPPoolStringArray copy(false);
-        copy = set;
-        EXPECT_TRUE(change == 0 ? copy.Delete(L"a") : change == 1 ? copy.Add(L"d") : copy.Inflate(L"x,y", L','));
-        EXPECT_TRUE(copy.IsSorted()) << "the flag comes along";
-        EXPECT_NE(Elements(copy), Elements(set));
-        EXPECT_EQ(Elements(set), (Strings{"a", "b", "c"}));
-    }
+    EXPECT_EQ(Elements(holder), (Strings{"b", "c", "a", "b", "b"})) << "copies never change each other";
 }
 
 TEST(StringArray, TakesBlocksOfPooledStrings) {

@@ -1,9 +1,9 @@
 // Interning against a slow reading of its rules: keys, identity, cut texts, case groups, sweeps, submitters.
 
 #include "plugin/pool.h"
-#include "support/assertions.h"
 #include "support/guardpage.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 #include "support/machine.h"
 #include "support/texts.h"
 

@@ -1,7 +1,7 @@
 // Vectors of handles against std::vector, what their holders share, and the set of one object per type.
 
-#include "support/assertions.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 
 #include <algorithm>
 #include <gtest/gtest.h>

@@ -83,10 +83,6 @@ TEST(XmlTree, SetNameDetachesIntended) {
     EXPECT_TRUE(other.IsName(L"a") && other.HasAttribute(L"x"));
     CPXMLObject third(other);
     EXPECT_TRUE(third.Rename(L"c") && other.IsName(L"c")) << "a renamed node is renamed for all its holders";
-
-    EXPECT_EQ(CPXMLObject(static_cast<const TAVO::Buffers::CPObjectMemory&>(other)).key(), other.key());
-    TAVO::Buffers::CPPlainMemory bytes;
-    EXPECT_TRUE(bytes.Alloc(64) && !CPXMLObject(bytes).key()) << "handles take elements alone";
 }
 
 TEST(XmlTree, AttributesAndDataOutsideTheModel) {

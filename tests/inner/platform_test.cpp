@@ -31,16 +31,12 @@ int ReadLevel(const std::string& content) {
 
 TEST(ConfigurationFile, MeansTheSameOnBothSystems) {
     const std::pair<const char*, int> rows[] = {{"[Debug]\nLevel=5\nLevel=6\n", 5},
-                                                {"[DEBUG]\r\nLEVEL=-5", -5},
                                                 {"  [ Debug ] ; ours\n\t Level \t=\t +5 \t\r\n", 5},
                                                 {"[Debug]\nLevel=0x1F\n", 31},
                                                 {"[Debug]\nLevel=0X1f\n", 0},
                                                 {"[Debug]\nLevel=12ab\n", 12},
-                                                {"[Debug]\nLevel=\n", 0},
                                                 {"[Debug]\nLevel=\"7\"\n", 7},
-                                                {"[Debug]\nLevel=\"\n", 0},
                                                 {"[Debug]\nLevel=4294967297\n", 1},
-                                                {"[Debug]\n;Level=5\nLevel=6\n", 6},
                                                 {"[Debug]\nLevels=5\nLeve=6\n[Debugs]\nLevel=7\n[Debu]\nLevel=8", 0},
                                                 {"Level=5\n[Debug]\n[Other]\nLevel=6\n[Debug]\nLevel=5\n", 0},
                                                 {"[Debug\nLevel=5\n", 0}};

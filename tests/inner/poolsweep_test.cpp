@@ -2,11 +2,9 @@
 
 #include "platform/platform.h"
 #include "poolentry.h"
+#include "support/log.h"
 
-#include <cstdarg>
 #include <gtest/gtest.h>
-#include <string>
-#include <TAVO/develop.h>
 #include <thread>
 
 using namespace TAVO;
@@ -23,29 +21,16 @@ TEST(PoolSweepInner, OnlyThreadsOfNormalPrioritySweepIntended) {
         }).join();
 }
 
-std::string g_lines;
-unsigned g_referenced;
-void KeepLine(_acfDebugLevel level, const wchar_t*, const char* source, long32, const wchar_t* format,
-              std::va_list arguments) {
-    g_lines += std::to_string(level) + " " + source + " ";
-    for (; *format; ++format) {
-        g_lines += static_cast<char>(*format);
-        if (*format == L'%') g_referenced = va_arg(arguments, unsigned);
-    }
-    g_lines += "\n";
-}
-
 // Kept: texts that are held while the tables go stand in no table afterwards, so no sweep finds them.
 TEST(PoolUnload, TellsHowManyTextsAreHeldAndLetsThemLive) {
     const CPPoolString first(L"Held at the end"), second(L"HELD AT THE END");
     std::thread([] {
-        Develop::SetExternalLogger(KeepLine);
+        const support::Log log;
         pool::Unload();
-        Develop::SetExternalLogger(nullptr);
+        const std::string start = "8 TAVO source/TAVO/cstringpool:0 SPool ClearTable: ";
+        EXPECT_EQ(log.Take(),
+                  (support::Texts{start + "Diagnosis started", start + "diagnosis done, %u items still referenced|2"}));
     }).join();
-    EXPECT_EQ(g_lines, "8 source/TAVO/cstringpool SPool ClearTable: Diagnosis started\n"
-                       "8 source/TAVO/cstringpool SPool ClearTable: diagnosis done, %u items still referenced\n");
-    EXPECT_EQ(g_referenced, 2u);
     EXPECT_EQ(CStringPool::GetNItems(), 0u);
     EXPECT_STREQ(static_cast<const wchar_t*>(first), L"Held at the end");
     EXPECT_TRUE(CPPoolString(L"HELD AT THE END") != second) << "interning goes on, with entries of its own";
