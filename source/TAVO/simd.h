@@ -65,22 +65,6 @@ template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Blo
 // Bytes of two blocks of 16-bit units below 100, in order.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
-// 32-bit lanes.
-TAVO_INLINE Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
-    return _mm_set_epi32(static_cast<int>(d), static_cast<int>(c), static_cast<int>(b), static_cast<int>(a));
-}
-TAVO_INLINE Block All32(std::uint32_t value) { return _mm_set1_epi32(static_cast<int>(value)); }
-template <int bits> TAVO_INLINE Block ShiftLeft32(Block a) { return _mm_slli_epi32(a, bits); }
-template <int bits> TAVO_INLINE Block ShiftRight32(Block a) { return _mm_srli_epi32(a, bits); }
-template <int bits> TAVO_INLINE Block ShiftRight64(Block a) { return _mm_srli_epi64(a, bits); }
-// The low 16 bits of the four 32-bit lanes, in the low half.
-TAVO_INLINE Block Low16Of32(Block a) {
-    a = _mm_shufflehi_epi16(_mm_shufflelo_epi16(a, _MM_SHUFFLE(3, 3, 2, 0)), _MM_SHUFFLE(3, 3, 2, 0));
-    return _mm_shuffle_epi32(a, _MM_SHUFFLE(3, 3, 2, 0));
-}
-// The 16-bit units as 32-bit lanes, low and high half.
-TAVO_INLINE Block Widen32Low(Block a) { return _mm_unpacklo_epi16(a, _mm_setzero_si128()); }
-TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzero_si128()); }
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
 // The bytes moved to higher or lower places, zeros behind them.
 template <int places> TAVO_INLINE Block MoveUp(Block a) { return _mm_slli_si128(a, places); }
@@ -201,30 +185,6 @@ inline Block Subtract8(Block a, Block b) {
 inline Block Subtract16(Block a, Block b) {
     return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x - y; });
 }
-inline Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
-    const std::uint32_t lanes[] = {a, b, c, d};
-    return Load(lanes);
-}
-inline Block All32(std::uint32_t value) { return Lanes32(value, value, value, value); }
-template <int bits> Block ShiftLeft32(Block a) {
-    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x << bits; });
-}
-template <int bits> Block ShiftRight32(Block a) {
-    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x >> bits; });
-}
-template <int bits> Block ShiftRight64(Block a) {
-    return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x >> bits; });
-}
-inline Block Low16Of32(Block a) {
-    Block x{};
-    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 2, a.b + i * 4, 2);
-    return x;
-}
-inline Block Widen32Low(Block a) {
-    Block x{};
-    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 4, a.b + i * 2, 2);
-    return x;
-}
 inline Block Pair(std::uint64_t low, std::uint64_t high) {
     Block x;
     std::memcpy(x.b, &low, 8);
@@ -248,7 +208,6 @@ template <int places> Block MoveDown(Block a) {
     return x;
 }
 inline Block HighHalf(Block a) { return MoveDown<8>(a); }
-inline Block Widen32High(Block a) { return Widen32Low(HighHalf(a)); }
 template <int bits> Block ShiftLeft16(Block a) {
     return detail::Map<std::uint16_t>(a, a, [](int x, int) { return x << bits; });
 }
@@ -314,12 +273,13 @@ template <class Word> TAVO_INLINE void Write(unsigned char* p, std::uint64_t val
 // The beginning and the end of texts that fill no block: two words that may overlap, so that nothing else is touched
 // and no byte is handled by itself. The lower byte comes first, as on every processor with blocks.
 
-// `count` bytes, 1 to 15; those behind are 0.
+// `count` bytes, 1 to 16; those behind are 0.
 TAVO_INLINE Block LoadPart(const void* from, std::size_t count) {
     const auto* const p = static_cast<const unsigned char*>(from);
-    if (count >= 8)
-        return Pair(detail::Read<std::uint64_t>(p),
-                    detail::Read<std::uint64_t>(p + count - 8) >> 8 * (15 - count) >> 8);
+    if (count >= 8) {
+        const std::size_t half = 4 * (16 - count); // a shift by 64 in one step would be undefined
+        return Pair(detail::Read<std::uint64_t>(p), detail::Read<std::uint64_t>(p + count - 8) >> half >> half);
+    }
     if (count >= 4)
         return Pair(detail::Read<std::uint32_t>(p) | detail::Read<std::uint32_t>(p + count - 4) << 8 * (count - 4), 0);
     return Pair(p[0] | static_cast<std::uint64_t>(p[count / 2]) << count / 2 * 8 |
@@ -332,7 +292,7 @@ TAVO_INLINE void StorePart(void* to, Block x, std::size_t count) {
     auto* const p = static_cast<unsigned char*>(to);
     const std::uint64_t low = LowWord(x);
     if (count > 8) {
-        const std::size_t half = 4 * (count - 8); // a shift by 64 in one step would be undefined
+        const std::size_t half = 4 * (count - 8);
         detail::Write<std::uint64_t>(p, low);
         detail::Write<std::uint64_t>(p + count - 8, HighWord(x) << 8 * (16 - count) | low >> half >> half);
     } else if (count == 8) {
@@ -430,8 +390,9 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n, bool
 #define TAVO_LINE_INLINE TAVO_LINE TAVO_INLINE
 
 constexpr bool kLines = true;
+inline bool g_hideLines = false; // set by tests, which also run what other processors do
 inline bool HasLines() {
-    return __builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vl") &&
+    return !g_hideLines && __builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vl") &&
            __builtin_cpu_supports("avx512vbmi") && __builtin_cpu_supports("avx512vbmi2") &&
            __builtin_cpu_supports("bmi2") && __builtin_cpu_supports("popcnt");
 }
@@ -446,8 +407,11 @@ TAVO_LINE_INLINE std::size_t Count(std::uint64_t mask) { return static_cast<std:
 
 // The lanes of the mask; the others are 0 and not touched.
 TAVO_LINE_INLINE Line LoadLine8(const void* p, std::uint64_t mask) { return _mm512_maskz_loadu_epi8(mask, p); }
+// The same from `back` bytes before p, which need not be anywhere.
+TAVO_LINE_INLINE Line LoadLine8Before(const void* p, std::size_t back, std::uint64_t mask) {
+    return LoadLine8(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(p) - back), mask);
+}
 TAVO_LINE_INLINE Line LoadLine16(const void* p, std::uint32_t mask) { return _mm512_maskz_loadu_epi16(mask, p); }
-TAVO_LINE_INLINE HalfLine LoadHalf8(const void* p, std::uint32_t mask) { return _mm256_maskz_loadu_epi8(mask, p); }
 // The lanes of the mask one after the other.
 TAVO_LINE_INLINE void StoreLanes8(void* p, std::uint64_t mask, Line x) {
     _mm512_mask_storeu_epi8(p, First64(Count(mask)), _mm512_maskz_compress_epi8(mask, x));
@@ -455,7 +419,6 @@ TAVO_LINE_INLINE void StoreLanes8(void* p, std::uint64_t mask, Line x) {
 TAVO_LINE_INLINE void StoreLanes16(void* p, std::uint32_t mask, Line x) {
     _mm512_mask_storeu_epi16(p, First32(Count(mask)), _mm512_maskz_compress_epi16(mask, x));
 }
-TAVO_LINE_INLINE void StoreFirst16(void* p, std::uint32_t mask, Line x) { _mm512_mask_storeu_epi16(p, mask, x); }
 TAVO_LINE_INLINE void StoreHalf8(void* p, std::uint32_t mask, HalfLine x) { _mm256_mask_storeu_epi8(p, mask, x); }
 
 TAVO_LINE_INLINE Line Line16(int value) { return _mm512_set1_epi16(static_cast<short>(value)); }
@@ -466,14 +429,14 @@ template <int bits> TAVO_LINE_INLINE Line ShiftLeft16(Line a) { return _mm512_sl
 template <int bits> TAVO_LINE_INLINE Line ShiftRight16(Line a) { return _mm512_srli_epi16(a, bits); }
 template <int bits> TAVO_LINE_INLINE Line ShiftLeft32(Line a) { return _mm512_slli_epi32(a, bits); }
 template <int bits> TAVO_LINE_INLINE Line ShiftRight32(Line a) { return _mm512_srli_epi32(a, bits); }
-// b where the mask has a bit, elsewhere a or 0.
+// b where the mask has a bit, elsewhere a.
 TAVO_LINE_INLINE Line Select16(std::uint32_t mask, Line a, Line b) { return _mm512_mask_mov_epi16(a, mask, b); }
 TAVO_LINE_INLINE Line Select32(std::uint16_t mask, Line a, Line b) { return _mm512_mask_mov_epi32(a, mask, b); }
+// a where the mask has a bit, elsewhere 0.
 TAVO_LINE_INLINE Line Keep16(std::uint32_t mask, Line a) { return _mm512_maskz_mov_epi16(mask, a); }
 // Byte i of the result is byte index[i].
 TAVO_LINE_INLINE Line Gather8(Line a, Line index) { return _mm512_permutexvar_epi8(index, a); }
 TAVO_LINE_INLINE Line LoadLine(const void* p) { return _mm512_loadu_si512(p); }
-TAVO_LINE_INLINE Line Widen16(HalfLine bytes) { return _mm512_cvtepu8_epi16(bytes); }
 TAVO_LINE_INLINE Line Widen32(HalfLine units) { return _mm512_cvtepu16_epi32(units); }
 TAVO_LINE_INLINE HalfLine Narrow(Line units) { return _mm512_cvtepi16_epi8(units); }
 TAVO_LINE_INLINE HalfLine LowHalf(Line a) { return _mm512_castsi512_si256(a); }
@@ -481,21 +444,12 @@ TAVO_LINE_INLINE HalfLine HighHalf(Line a) { return _mm512_extracti64x4_epi64(a,
 
 TAVO_LINE_INLINE std::uint64_t High8(Line a) { return _mm512_movepi8_mask(a); }
 TAVO_LINE_INLINE std::uint64_t NonZero8(Line a) { return _mm512_test_epi8_mask(a, a); }
-TAVO_LINE_INLINE std::uint64_t Equals8(Line a, int b) {
-    return _mm512_cmpeq_epi8_mask(a, _mm512_set1_epi8(static_cast<char>(b)));
-}
 // Signed a < b, and unsigned comparisons.
 TAVO_LINE_INLINE std::uint64_t IsBelow8(Line a, int b) {
     return _mm512_cmplt_epi8_mask(a, _mm512_set1_epi8(static_cast<char>(b)));
 }
-TAVO_LINE_INLINE std::uint32_t IsBelow8(HalfLine a, int b) {
-    return _mm256_cmplt_epi8_mask(a, _mm256_set1_epi8(static_cast<char>(b)));
-}
 TAVO_LINE_INLINE std::uint64_t IsAtLeast8(Line a, int b) {
     return _mm512_cmpge_epu8_mask(a, _mm512_set1_epi8(static_cast<char>(b)));
-}
-TAVO_LINE_INLINE std::uint32_t IsAtLeast8(HalfLine a, int b) {
-    return _mm256_cmpge_epu8_mask(a, _mm256_set1_epi8(static_cast<char>(b)));
 }
 TAVO_LINE_INLINE std::uint32_t IsBelow16(Line a, int b) { return _mm512_cmplt_epu16_mask(a, Line16(b)); }
 TAVO_LINE_INLINE std::uint32_t IsEqual16(Line a, int b) { return _mm512_cmpeq_epi16_mask(a, Line16(b)); }
@@ -505,6 +459,7 @@ TAVO_LINE_INLINE std::uint16_t IsBelow32(Line a, int b) { return _mm512_cmplt_ep
 
 #define TAVO_LINE
 constexpr bool kLines = false;
+inline bool g_hideLines = false;
 inline bool HasLines() { return false; }
 #endif
 

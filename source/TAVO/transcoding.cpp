@@ -14,27 +14,28 @@ using namespace Simd;
 
 // --- Measuring UTF-8: 64 bytes at a time, one mask bit per byte ------------------------------------------------------
 
-// Up to 64 bytes in four blocks, which overlap if they are fewer.
+// Up to 64 bytes in four blocks, which overlap if there are fewer. Its masks have zeros behind its end.
 struct Chunk {
     Block parts[4];
     std::size_t at[4] = {0, 16, 32, 48}; // where each begins
-    std::size_t skipped = 0;             // bytes that stand before the chunk in the first block
+    std::size_t skipped = 0;             // bytes of the blocks that stand before the chunk
 };
 
 TAVO_INLINE Chunk LoadChunk(const unsigned char* text) {
     return {{Load(text), Load(text + 16), Load(text + 32), Load(text + 48)}};
 }
 
-// The last bytes of a text, fewer than a chunk. Its masks have zeros behind them, which stand for a character each.
+// The last bytes of a text, fewer than a chunk.
 TAVO_INLINE Chunk LoadRest(const unsigned char* text, std::size_t length, std::size_t rest) {
-    if (length >= kChunk) {
-        Chunk chunk = LoadChunk(text + length - kChunk);
-        chunk.skipped = kChunk - rest;
+    const auto skip = [](Chunk chunk, std::size_t bytes) {
+        chunk.skipped = bytes;
         return chunk;
-    }
-    if (length < kBlock) return {{LoadPart(text, length), All8(0), All8(0), All8(0)}};
+    };
+    if (length >= kChunk) return skip(LoadChunk(text + length - kChunk), kChunk - rest);
+    if (length < kBlock) return skip({{LoadPart(text, length), All8(0), All8(0), All8(0)}}, length - rest);
     const std::size_t last = length - kBlock, second = last < kBlock ? last : kBlock, third = last - second;
-    return {{Load(text), Load(text + second), Load(text + third), Load(text + last)}, {0, second, third, last}};
+    return skip({{Load(text), Load(text + second), Load(text + third), Load(text + last)}, {0, second, third, last}},
+                length - rest);
 }
 
 // One bit per byte of a chunk: the highest bit of what `test` makes of each block.
@@ -104,7 +105,7 @@ TAVO_NOINLINE bool MeasureChunk(const unsigned char* text, std::size_t length, E
     return true;
 }
 
-// --- Converting UTF-8: runs of sequences of one length ---------------------------------------------------------------
+// --- Converting UTF-8: windows of eight bytes, which may begin and end anywhere in a sequence ------------------------
 
 // For every set of continuation bytes among nine, of which the first eight are a window: each sequence that ends in the
 // window as a 16-bit lane, its last byte low and, unless it is the only one, the one before high. Places count from the
@@ -219,16 +220,18 @@ TAVO_SHUFFLES TAVO_INLINE void ConvertWindow(Window window, const unsigned char*
     const Block units = Decode3(Shuffle(window.before, lanes), Shuffle(window.earlier, lanes));
     // Stores may reach into units that come later, not behind the last.
     const auto room = static_cast<std::size_t>(outEnd - out);
-    const std::size_t count = kSequences.count[set] < room ? kSequences.count[set] : room;
-    if (room >= 8)
-        Store(out, units);
-    else
-        StorePart(out, units, count * sizeof(Unit));
-    out += count;
+    const std::size_t count = kSequences.count[set];
     text += 8;
+    if (TAVO_LIKELY(room >= 8)) {
+        Store(out, units);
+        out += count;
+    } else {
+        StorePart(out, units, (count < room ? count : room) * sizeof(Unit));
+        out += count < room ? count : room;
+    }
 }
 
-// Decodes a measured text without values above 10FFFF, window by window; windows begin anywhere in a sequence.
+// Decodes a measured text without values above 10FFFF.
 template <class Unit>
 TAVO_SHUFFLES Unit* ConvertWindows(const unsigned char* text, const unsigned char* end, Unit* out, const Unit* outEnd) {
     const unsigned char* const begin = text;
@@ -253,7 +256,7 @@ TAVO_SHUFFLES Unit* ConvertWindows(const unsigned char* text, const unsigned cha
 }
 
 // ASCII.
-template <class Unit> TAVO_INLINE void Widen(const unsigned char* text, std::size_t count, Unit* out) {
+template <class Unit> TAVO_INLINE void Copy(const unsigned char* text, std::size_t count, Unit* out) {
     const auto block = [=](std::size_t at) {
         const Block x = Load(text + at);
         Store(out + at, WidenLow(x));
@@ -274,7 +277,7 @@ template <class Unit> TAVO_INLINE void Widen(const unsigned char* text, std::siz
 template <class Unit> bool ConvertBytes(const unsigned char* text, const Extent& extent, Unit*& out) {
     const unsigned char* const end = text + extent.source;
     if (extent.target == extent.source) {
-        Widen(text, extent.source, out);
+        Copy(text, extent.source, out);
         out += extent.target;
         return true;
     }
@@ -300,8 +303,6 @@ constexpr std::size_t kUnits = kBlock / sizeof(wchar_t);
 TAVO_INLINE Block Below80(Block x) { return Equal16(And(x, All16(0xFF80)), All16(0)); }
 TAVO_INLINE Block Below800(Block x) { return Equal16(And(x, All16(0xF800)), All16(0)); }
 TAVO_INLINE Block Surrogates(Block x) { return Equal16(And(x, All16(0xF800)), All16(0xD800)); }
-// The lanes before the first that fails the test.
-TAVO_INLINE std::size_t RunOf(Block test) { return static_cast<std::size_t>(std::countr_zero(~Mask(test))) / 2; }
 
 // Adds blocks up to the first that holds a surrogate.
 template <class Unit> void MeasurePlain(const Unit* text, std::size_t length, Extent& extent) {
@@ -352,20 +353,18 @@ template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) 
     return extent;
 }
 
-// The UTF-8 of eight units from 80 to 7FF.
-TAVO_INLINE Block Encode2(Block x) {
-    return Or(Or(ShiftRight16<6>(x), ShiftLeft16<8>(And(x, All16(0x3F)))), All16(0x80C0));
+// The UTF-8 of eight units below 800.
+TAVO_INLINE Block Encode2(Block x, Block below80) {
+    const Block two = Or(Or(ShiftRight16<6>(x), ShiftLeft16<8>(And(x, All16(0x3F)))), All16(0x80C0));
+    return Or(And(below80, x), AndNot(below80, two));
 }
-// The UTF-8 of four units from 800 up in 32-bit lanes: six bytes in each half.
-TAVO_INLINE Block Encode3(Block x) {
-    x = Or(Or(ShiftRight32<12>(x), And(ShiftLeft32<2>(x), All32(0x3F00))),
-           Or(ShiftLeft32<16>(And(x, All32(0x3F))), All32(0x8080E0)));
-    const Block second = And(x, Lanes32(0, ~0u, 0, ~0u));
-    return Or(And(x, Lanes32(~0u, 0, ~0u, 0)), ShiftRight64<8>(second));
+// The UTF-8 of eight units that are no surrogates: the last bytes, and those before them, which shorter forms lack.
+TAVO_INLINE Block LastBytes(Block x, Block below80) {
+    return Or(And(below80, x), AndNot(below80, Or(And(x, All16(0x3F)), All16(0x80))));
 }
-TAVO_INLINE void Store3(unsigned char* out, Block halves) {
-    StoreHalf(out, halves);
-    StoreHalf(out + 6, HighHalf(halves));
+TAVO_INLINE Block FirstBytes(Block x, Block below800) {
+    const Block heads = Or(And(below800, All16(0xC000)), AndNot(below800, All16(0x80E0)));
+    return Or(Or(ShiftRight16<12>(x), And(ShiftLeft16<2>(x), All16(0x3F00))), heads);
 }
 
 // For every set of places in a window of eight: how to move what stands at the other places to the front.
@@ -374,84 +373,121 @@ struct Compaction {
     std::uint8_t kept[256];
 };
 
-// Places are units and a set bit is a unit below 80: two-byte lanes lose the second byte of those.
-constexpr Compaction kBytesOfUnits = [] {
+// A block of encoded units as a table moves it: only the bytes that each has, by a test of each byte's place and the
+// set.
+template <class Test> constexpr Compaction Compact(Test isKept) {
     Compaction table{};
     for (unsigned set = 0; set < 256; ++set) {
         unsigned kept = 0;
-        for (unsigned byte = 0; byte < 16; ++byte)
-            if (byte % 2 == 0 || (set >> byte / 2 & 1) == 0)
-                table.shuffle[set][kept++] = static_cast<std::uint8_t>(byte);
+        for (unsigned byte = 0; byte < kBlock; ++byte)
+            if (isKept(set, byte)) table.shuffle[set][kept++] = static_cast<std::uint8_t>(byte);
         table.kept[set] = static_cast<std::uint8_t>(kept);
-        while (kept < 16) table.shuffle[set][kept++] = 0x80;
+        while (kept < kBlock) table.shuffle[set][kept++] = 0x80;
     }
     return table;
-}();
+}
+// Eight units of up to two bytes; a set bit is a unit below 80.
+constexpr Compaction kBytesOf8 =
+    Compact([](unsigned set, unsigned byte) { return byte % 2 == 0 || (set >> byte / 2 & 1) == 0; });
+// Four units of up to three bytes; the set's low half are the units below 80, its high half those below 800.
+constexpr Compaction kBytesOf4 = Compact([](unsigned set, unsigned byte) {
+    const bool kept[] = {(set >> (4 + byte / 4) & 1) == 0, (set >> byte / 4 & 1) == 0, true, false};
+    return kept[byte % 4];
+});
 
-// Encodes mixtures of units below 800, without a branch on which take one byte, up to the first block with another.
+// Stores the bytes of a set. Stores may reach into bytes that come later, not behind the last.
+TAVO_SHUFFLES TAVO_INLINE unsigned char* StoreBytes(Block encoded, const Compaction& table, std::uint32_t set,
+                                                    unsigned char* out, const unsigned char* outEnd) {
+    const Block bytes = Shuffle(encoded, Load(table.shuffle[set]));
+    const auto room = static_cast<std::size_t>(outEnd - out);
+    const std::size_t count = table.kept[set];
+    if (TAVO_LIKELY(room >= kBlock)) {
+        Store(out, bytes);
+        return out + count;
+    }
+    StorePart(out, bytes, count < room ? count : room);
+    return out + (count < room ? count : room);
+}
+
+// Encodes units below 800 up to the first eight with another.
 template <class Unit>
-TAVO_SHUFFLES void ConvertMixture(const Unit*& text, const Unit* end, unsigned char*& out,
-                                  const unsigned char* outEnd) {
-    while (end - text >= 16 && outEnd - out >= 16) {
+TAVO_SHUFFLES TAVO_INLINE void ConvertMixture(const Unit*& text, const Unit* end, unsigned char*& out,
+                                              const unsigned char* outEnd) {
+    for (; end - text >= 8 && outEnd - out >= 16; text += kUnits) {
         const Block x = Load(text);
-        const Block y = Load(text + kUnits);
-        if (Mask(Below80(Or(x, y))) == 0xFFFF) {
-            Store(out, Narrow(x, y));
-            text += 16, out += 16;
-            continue;
-        }
         if (Mask(Below800(x)) != 0xFFFF) return;
-        const Block ascii = Below80(x);
-        const std::uint32_t set = Mask(PackSigned(ascii, ascii)) & 0xFF;
-        const Block lanes = Or(And(ascii, x), AndNot(ascii, Encode2(x)));
-        Store(out, Shuffle(lanes, Load(kBytesOfUnits.shuffle[set])));
-        text += kUnits, out += kBytesOfUnits.kept[set];
+        const Block below80 = Below80(x);
+        const std::uint32_t set = Mask(PackSigned(below80, below80)) & 0xFF;
+        Store(out, Shuffle(Encode2(x, below80), Load(kBytesOf8.shuffle[set])));
+        out += kBytesOf8.kept[set];
     }
 }
 
-// Encodes runs while whole blocks can be loaded and stored; stores may reach into bytes that come later.
+// Encodes a measured text, eight units at a time, without a branch on which bytes they take unless some take three.
 template <class Unit>
-void ConvertRuns(const Unit*& text, const Unit* end, unsigned char*& out, const unsigned char* outEnd) {
-    const bool mixtures = HasShuffle();
-    while (end - text >= static_cast<std::ptrdiff_t>(kUnits) && outEnd - out >= 16) {
-        if (mixtures && *text < 0x800) {
-            const Unit* const before = text;
-            ConvertMixture(text, end, out, outEnd);
-            if (text != before) continue;
+TAVO_SHUFFLES unsigned char* ConvertWindows(const Unit* text, const Unit* end, unsigned char* out,
+                                            const unsigned char* outEnd) {
+    while (text < end) {
+        ConvertMixture(text, end, out, outEnd);
+        if (text == end) break;
+        const auto left = static_cast<std::size_t>(end - text);
+        const Block x = left < kUnits ? LoadPart(text, left * sizeof(Unit)) : Load(text);
+        const std::uint32_t surrogates = Mask(Surrogates(x));
+        if (TAVO_UNLIKELY(surrogates != 0)) {
+            for (const Unit* const surrogate = text + std::countr_zero(surrogates) / 2; text <= surrogate;) {
+                ulong32 codePoint = 0;
+                StepUtf16(codePoint, text);
+                EncodeUtf8(out, codePoint);
+            }
+            continue;
         }
-        const Block x = Load(text);
-        std::size_t run;
-        if (*text < 0x80) {
-            StoreHalf(out, Narrow(x, x));
-            run = RunOf(Below80(x));
-            text += run, out += run;
-        } else if (*text < 0x800) {
-            Store(out, Encode2(x));
-            run = RunOf(AndNot(Below80(x), Below800(x)));
-            text += run, out += 2 * run;
-        } else if ((Mask(Or(Below800(x), Surrogates(x))) & 0xFF) == 0) {
-            Store3(out, Encode3(Widen32Low(x)));
-            text += 4, out += 12;
+        const Block below80 = Below80(x), below800 = Below800(x);
+        const std::uint32_t set = Mask(PackSigned(below80, below800));
+        if (set >> 8 == 0xFF) {
+            out = StoreBytes(Encode2(x, below80), kBytesOf8, set & 0xFF, out, outEnd);
         } else {
-            ulong32 codePoint = 0;
-            StepUtf16(codePoint, text);
-            EncodeUtf8(out, codePoint);
+            const Block first = FirstBytes(x, below800), last = LastBytes(x, below80);
+            const std::uint32_t low = (set & 0xF) | (set >> 4 & 0xF0), high = (set >> 4 & 0xF) | (set >> 8 & 0xF0);
+            out = StoreBytes(Interleave<2, false>(first, last), kBytesOf4, low, out, outEnd);
+            out = StoreBytes(Interleave<2, true>(first, last), kBytesOf4, high, out, outEnd);
         }
+        text += left < kUnits ? left : kUnits;
     }
+    return out;
+}
+
+// ASCII.
+template <class Unit> TAVO_INLINE void Copy(const Unit* text, std::size_t count, unsigned char* out) {
+    if (count < kBlock) {
+        if (count == 0) return;
+        const Block low = LoadPart(text, (count < kUnits ? count : kUnits) * sizeof(Unit));
+        const Block high = count > kUnits ? LoadPart(text + kUnits, (count - kUnits) * sizeof(Unit)) : All8(0);
+        StorePart(out, Narrow(low, high), count);
+        return;
+    }
+    const auto block = [=](std::size_t at) { Store(out + at, Narrow(Load(text + at), Load(text + at + kUnits))); };
+    for (std::size_t at = 0; at + kBlock <= count; at += kBlock) block(at);
+    block(count - kBlock); // overlaps
 }
 
 template <class Unit> void ConvertUnits(const Unit* text, const Extent& extent, unsigned char*& out) {
     const Unit* const end = text + extent.source;
+    if (extent.target == extent.source && extent.characters == extent.source) {
+        Copy(text, extent.source, out);
+        out += extent.target;
+        return;
+    }
     if constexpr (kLines) {
         if (HasLines()) {
             out = Lines::ConvertUtf16(text, end, out);
             return;
         }
     }
-    auto* at = out;
-    ConvertRuns(text, end, at, out + extent.target);
-    for (ulong32 codePoint; text < end && StepUtf16(codePoint, text);) EncodeUtf8(at, codePoint);
-    out = at;
+    if (HasShuffle()) {
+        out = ConvertWindows(text, end, out, out + extent.target);
+        return;
+    }
+    for (ulong32 codePoint; text < end && StepUtf16(codePoint, text);) EncodeUtf8(out, codePoint);
 }
 
 } // namespace

@@ -84,7 +84,7 @@ template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char* text, con
     while (text < end) {
         const auto left = static_cast<std::size_t>(end - text);
         const std::size_t size = Least(left, kLanes);
-        const Line x = LoadLine8(text - 2, readable & First64(Least(left, kLanes + 1) + 2));
+        const Line x = LoadLine8Before(text, 2, readable & First64(Least(left, kLanes + 1) + 2));
         readable = ~0ull;
         const std::uint64_t continuations = IsBelow8(x, 0xC0);
         const auto leads4 = static_cast<std::uint32_t>(IsAtLeast8(x, 0xF0) >> 2);
