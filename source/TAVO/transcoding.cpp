@@ -51,10 +51,6 @@ TAVO_INLINE std::uint64_t AtLeastMask(const Chunk& chunk, int byte) {
     return ChunkMask(chunk, [byte](Block x) { return AtLeast8(x, All8(byte)); });
 }
 
-TAVO_INLINE Chunk LoadNext(const unsigned char* text, std::size_t length, std::size_t at) {
-    const std::size_t rest = length - at;
-    return rest < kChunk ? LoadRest(text, length, rest) : LoadChunk(text + at);
-}
 TAVO_INLINE ChunkBits BitsOf(const Chunk& chunk) {
     ChunkBits bits;
     bits.high = HighMask(chunk);
@@ -79,14 +75,11 @@ void MeasurePlainChunks(const unsigned char* text, std::size_t length, Extent& e
 
 // Adds the whole characters of a chunk that begins with one; false: it holds something invalid, or the end of the text
 // cuts a character.
-TAVO_NOINLINE bool MeasureChunk(const unsigned char* text, std::size_t length, Extent& extent) {
-    const Chunk chunk = LoadNext(text, length, extent.source);
-    const ChunkBits bits = BitsOf(chunk);
+TAVO_INLINE bool AddChunk(const Chunk& chunk, const ChunkBits& bits, std::size_t bytes, Extent& extent) {
     const std::uint64_t leads = bits.high & ~bits.continuations;
     if ((leads << 1 | bits.leads3 << 2 | bits.leads4 << 3) != bits.continuations) return false;
 
     // The last character may reach behind the chunk; it is left to the next one.
-    std::size_t bytes = length - extent.source < kChunk ? length - extent.source : kChunk;
     std::uint64_t whole = ~0ull;
     if ((leads >> 63 | bits.leads3 >> 62 | bits.leads4 >> 61) != 0) {
         bytes = 63 - static_cast<std::size_t>(std::countl_zero(leads));
@@ -102,6 +95,18 @@ TAVO_NOINLINE bool MeasureChunk(const unsigned char* text, std::size_t length, E
     extent.source += bytes;
     extent.characters += characters;
     extent.target += characters + CountBits(bits.leads4 & whole & ~overlong);
+    return true;
+}
+
+// Adds chunks of any sequences up to one without sequences of four bytes. False: there is something wrong.
+bool MeasureAnyChunks(const unsigned char* text, std::size_t length, Extent& extent) {
+    while (extent.source < length) {
+        const std::size_t rest = length - extent.source;
+        const Chunk chunk = rest < kChunk ? LoadRest(text, length, rest) : LoadChunk(text + extent.source);
+        const ChunkBits bits = BitsOf(chunk);
+        if (!AddChunk(chunk, bits, rest < kChunk ? rest : kChunk, extent)) return false;
+        if (bits.leads4 == 0) break;
+    }
     return true;
 }
 
@@ -281,14 +286,12 @@ template <class Unit> bool ConvertBytes(const unsigned char* text, const Extent&
         out += extent.target;
         return true;
     }
-    if constexpr (kLines) {
-        if (!extent.beyond && HasLines()) {
-            out = Lines::ConvertUtf8(text, end, out);
-            return true;
-        }
-    }
+    const Unit* const outEnd = out + extent.target;
+    if constexpr (kLines)
+        if (HasLines()) out = Lines::ConvertUtf8(text, end, out);
+    if (text == end) return true;
     if (!extent.beyond && HasShuffle()) {
-        out = ConvertWindows(text, end, out, out + extent.target);
+        out = ConvertWindows(text, end, out, outEnd);
         return true;
     }
     for (ulong32 codePoint; text < end && StepUtf8(codePoint, text);)
@@ -330,14 +333,11 @@ template <class Unit> void MeasurePlain(const Unit* text, std::size_t length, Ex
     }
 }
 
-template <class Unit> void MeasureBlocks(const Unit* text, std::size_t length, Extent& extent) {
-    if constexpr (kLines)
-        if (HasLines()) return Lines::MeasureUtf16(text, length, extent);
-    MeasurePlain(text, length, extent);
-}
 template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) {
     Extent extent;
-    MeasureBlocks(text, length, extent);
+    if constexpr (kLines)
+        if (HasLines()) Lines::MeasureUtf16(text, length, extent);
+    MeasurePlain(text, length, extent);
     while (extent.source < length) {
         const Unit* at = text + extent.source;
         const std::size_t units = Utf16Sequence(at, length - extent.source);
@@ -348,7 +348,7 @@ template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) 
         extent.source += units;
         ++extent.characters;
         extent.target += units == 2 || *at < 0x80 ? 1 : *at < 0x800 ? 2 : 3;
-        if (units == 2) MeasureBlocks(text, length, extent);
+        if (units == 2) MeasurePlain(text, length, extent);
     }
     return extent;
 }
@@ -477,14 +477,12 @@ template <class Unit> void ConvertUnits(const Unit* text, const Extent& extent, 
         out += extent.target;
         return;
     }
-    if constexpr (kLines) {
-        if (HasLines()) {
-            out = Lines::ConvertUtf16(text, end, out);
-            return;
-        }
-    }
+    const unsigned char* const outEnd = out + extent.target;
+    if constexpr (kLines)
+        if (HasLines()) out = Lines::ConvertUtf16(text, end, out);
+    if (text == end) return;
     if (HasShuffle()) {
-        out = ConvertWindows(text, end, out, out + extent.target);
+        out = ConvertWindows(text, end, out, outEnd);
         return;
     }
     for (ulong32 codePoint; text < end && StepUtf16(codePoint, text);) EncodeUtf8(out, codePoint);
@@ -495,7 +493,7 @@ template <class Unit> void ConvertUnits(const Unit* text, const Extent& extent, 
 Extent MeasureUtf8(const unsigned char* text, std::size_t length) {
     Extent extent;
     do MeasurePlainChunks(text, length, extent);
-    while (extent.source < length && MeasureChunk(text, length, extent));
+    while (extent.source < length && MeasureAnyChunks(text, length, extent));
     // The steps find what is wrong, and where.
     while (extent.source < length) {
         const unsigned char* at = text + extent.source;

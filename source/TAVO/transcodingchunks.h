@@ -44,9 +44,10 @@ namespace Lines {
 TAVO_LINE void MeasureUtf8(const unsigned char* text, std::size_t length, Extent& extent);
 template <class Unit> TAVO_LINE void MeasureUtf16(const Unit* text, std::size_t length, Extent& extent);
 
-// Convert a measured text, without values above 10FFFF; they return the end of what was written.
-template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char* text, const unsigned char* end, Unit* out);
-template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit* text, const Unit* end, unsigned char* out);
+// Convert a measured text up to the first sequence of four bytes or surrogate, where `text` ends; they return the end
+// of what was written.
+template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char*& text, const unsigned char* end, Unit* out);
+template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit*& text, const Unit* end, unsigned char* out);
 
 } // namespace Lines
 } // namespace TAVO::String::detail

@@ -61,26 +61,11 @@ alignas(64) constexpr Neighbours kNeighbours = [] {
     return table;
 }();
 
-// Where a conversion stands.
-template <class Unit> struct Progress {
-    const unsigned char* text;
-    Unit* out;
-};
-
-// Converts sequences of four bytes. A call keeps the loop below from waiting for the place of one.
-template <class Unit> TAVO_NOINLINE Progress<Unit> ConvertFours(Progress<Unit> at, const unsigned char* end) {
-    while (at.text < end && *at.text >= 0xF0) {
-        ulong32 codePoint = 0;
-        StepUtf8(codePoint, at.text);
-        EncodeUtf16(at.out, codePoint);
-    }
-    return at;
-}
-
 // Each byte is a lane. Those that end a sequence collect its bits from the two before them.
-template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char* text, const unsigned char* end, Unit* out) {
+template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char*& begin, const unsigned char* end, Unit* out) {
     const Line kPair = LoadLine(kNeighbours.pair), kEarlier = LoadLine(kNeighbours.earlier);
     std::uint64_t readable = ~3ull; // nothing stands before the text
+    const unsigned char* text = begin;
     while (text < end) {
         const auto left = static_cast<std::size_t>(end - text);
         const std::size_t size = Least(left, kLanes);
@@ -88,8 +73,8 @@ template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char* text, con
         readable = ~0ull;
         const std::uint64_t continuations = IsBelow8(x, 0xC0);
         const auto leads4 = static_cast<std::uint32_t>(IsAtLeast8(x, 0xF0) >> 2);
-        const std::size_t upTo = leads4 != 0 ? static_cast<std::size_t>(std::countr_zero(leads4)) : size;
-        const auto ends = First32(upTo) & ~static_cast<std::uint32_t>(continuations >> 3);
+        const std::size_t good = leads4 != 0 ? static_cast<std::size_t>(std::countr_zero(leads4)) : size;
+        const auto ends = First32(good) & ~static_cast<std::uint32_t>(continuations >> 3);
         const auto continued = static_cast<std::uint32_t>(continuations >> 2);
         const auto twice = static_cast<std::uint32_t>(continuations >> 2 & continuations >> 1);
         const Line pair = Gather8(x, kPair);
@@ -99,12 +84,12 @@ template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char* text, con
         StoreLanes16(out, ends, Or(Or(low, middle), high));
         out += Count(ends);
         if (TAVO_UNLIKELY(leads4 != 0)) {
-            const Progress<Unit> behind = ConvertFours(Progress<Unit>{text + upTo, out}, end);
-            text = behind.text, out = behind.out;
-        } else {
-            text += size;
+            text += good;
+            break;
         }
+        text += size;
     }
+    begin = text;
     return out;
 }
 
@@ -129,12 +114,14 @@ template <class Unit> TAVO_LINE void MeasureUtf16(const Unit* text, std::size_t 
     extent.target += target;
 }
 
-template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit* text, const Unit* end, unsigned char* out) {
-    while (text < end) {
+template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit*& begin, const Unit* end, unsigned char* out) {
+    const Unit* text = begin;
+    for (bool plain = true; plain && text < end;) {
         std::size_t size = Least(static_cast<std::size_t>(end - text), kLanes);
         Line x = LoadLine16(text, First32(size));
         const std::uint32_t surrogates = IsEqual16(And(x, Line16(0xF800)), 0xD800);
         if (TAVO_UNLIKELY(surrogates != 0)) {
+            plain = false;
             size = static_cast<std::size_t>(std::countr_zero(surrogates));
             x = Keep16(First32(size), x);
         }
@@ -149,21 +136,17 @@ template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit* text, co
             if (size > kLanes / 2) out = StoreBytes(out, Encode3(Widen32(HighHalf(x))));
         }
         text += size;
-        if (TAVO_UNLIKELY(surrogates != 0)) {
-            ulong32 codePoint = 0;
-            StepUtf16(codePoint, text);
-            EncodeUtf8(out, codePoint);
-        }
     }
+    begin = text;
     return out;
 }
 
 template void MeasureUtf16(const wchar_t*, std::size_t, Extent&);
 template void MeasureUtf16(const unsigned short*, std::size_t, Extent&);
-template wchar_t* ConvertUtf8(const unsigned char*, const unsigned char*, wchar_t*);
-template unsigned short* ConvertUtf8(const unsigned char*, const unsigned char*, unsigned short*);
-template unsigned char* ConvertUtf16(const wchar_t*, const wchar_t*, unsigned char*);
-template unsigned char* ConvertUtf16(const unsigned short*, const unsigned short*, unsigned char*);
+template wchar_t* ConvertUtf8(const unsigned char*&, const unsigned char*, wchar_t*);
+template unsigned short* ConvertUtf8(const unsigned char*&, const unsigned char*, unsigned short*);
+template unsigned char* ConvertUtf16(const wchar_t*&, const wchar_t*, unsigned char*);
+template unsigned char* ConvertUtf16(const unsigned short*&, const unsigned short*, unsigned char*);
 
 } // namespace TAVO::String::detail::Lines
 
