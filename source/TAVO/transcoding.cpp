@@ -337,6 +337,7 @@ template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) 
     Extent extent;
     if constexpr (kLines)
         if (HasLines()) Lines::MeasureUtf16(text, length, extent);
+    if (extent.source == length) return extent;
     MeasurePlain(text, length, extent);
     while (extent.source < length) {
         const Unit* at = text + extent.source;
