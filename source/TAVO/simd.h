@@ -11,6 +11,10 @@
 #include <tmmintrin.h>
 #include <wmmintrin.h>
 #define TAVO_SSE2 1
+#if !defined(_MSC_VER) && !defined(TAVO_NO_LINES)
+#include <immintrin.h>
+#define TAVO_LINES 1
+#endif
 #endif
 
 namespace TAVO::Simd {
@@ -52,8 +56,9 @@ TAVO_INLINE Block WidenLow(Block a) { return _mm_unpacklo_epi8(a, _mm_setzero_si
 TAVO_INLINE Block WidenHigh(Block a) { return _mm_unpackhi_epi8(a, _mm_setzero_si128()); }
 // The low or high halves of both, lanes of so many bytes in turns.
 template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Block b) {
-    static_assert(lane == 1 || lane == 4 || lane == 8);
+    static_assert(lane == 1 || lane == 2 || lane == 4 || lane == 8);
     if constexpr (lane == 1) return high ? _mm_unpackhi_epi8(a, b) : _mm_unpacklo_epi8(a, b);
+    if constexpr (lane == 2) return high ? _mm_unpackhi_epi16(a, b) : _mm_unpacklo_epi16(a, b);
     if constexpr (lane == 4) return high ? _mm_unpackhi_epi32(a, b) : _mm_unpacklo_epi32(a, b);
     return high ? _mm_unpackhi_epi64(a, b) : _mm_unpacklo_epi64(a, b);
 }
@@ -61,28 +66,14 @@ template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Blo
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
 TAVO_INLINE Block Add16(Block a, Block b) { return _mm_add_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
-// 32-bit lanes.
-TAVO_INLINE Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
-    return _mm_set_epi32(static_cast<int>(d), static_cast<int>(c), static_cast<int>(b), static_cast<int>(a));
-}
-TAVO_INLINE Block All32(std::uint32_t value) { return _mm_set1_epi32(static_cast<int>(value)); }
-template <int bits> TAVO_INLINE Block ShiftLeft32(Block a) { return _mm_slli_epi32(a, bits); }
-template <int bits> TAVO_INLINE Block ShiftRight32(Block a) { return _mm_srli_epi32(a, bits); }
 template <int bits> TAVO_INLINE Block ShiftLeft64(Block a) { return _mm_slli_epi64(a, bits); }
 template <int bits> TAVO_INLINE Block ShiftRight64(Block a) { return _mm_srli_epi64(a, bits); }
-// The low 16 bits of the four 32-bit lanes, in the low half.
-TAVO_INLINE Block Low16Of32(Block a) {
-    a = _mm_shufflehi_epi16(_mm_shufflelo_epi16(a, _MM_SHUFFLE(3, 3, 2, 0)), _MM_SHUFFLE(3, 3, 2, 0));
-    return _mm_shuffle_epi32(a, _MM_SHUFFLE(3, 3, 2, 0));
-}
-// The 16-bit units as 32-bit lanes, low and high half.
-TAVO_INLINE Block Widen32Low(Block a) { return _mm_unpacklo_epi16(a, _mm_setzero_si128()); }
-TAVO_INLINE Block Widen32High(Block a) { return _mm_unpackhi_epi16(a, _mm_setzero_si128()); }
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
+// The bytes moved to higher or lower places, zeros behind them.
+template <int places> TAVO_INLINE Block MoveUp(Block a) { return _mm_slli_si128(a, places); }
+template <int places> TAVO_INLINE Block MoveDown(Block a) { return _mm_srli_si128(a, places); }
 // Lanes of 16-bit numbers from -128 to 127 as bytes.
 TAVO_INLINE Block PackSigned(Block a, Block b) { return _mm_packs_epi16(a, b); }
-// The lower eight bytes as a number.
-TAVO_INLINE std::uint64_t LowHalf(Block a) { return static_cast<std::uint64_t>(_mm_cvtsi128_si64(a)); }
 // The sum of all unsigned bytes.
 TAVO_INLINE std::size_t Sum8(Block a) {
     const Block halves = _mm_sad_epu8(a, _mm_setzero_si128());
@@ -198,32 +189,11 @@ inline Block Add16(Block a, Block b) {
 inline Block Subtract16(Block a, Block b) {
     return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x - y; });
 }
-inline Block Lanes32(std::uint32_t a, std::uint32_t b, std::uint32_t c, std::uint32_t d) {
-    const std::uint32_t lanes[] = {a, b, c, d};
-    return Load(lanes);
-}
-inline Block All32(std::uint32_t value) { return Lanes32(value, value, value, value); }
-template <int bits> Block ShiftLeft32(Block a) {
-    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x << bits; });
-}
-template <int bits> Block ShiftRight32(Block a) {
-    return detail::Map<std::uint32_t>(a, a, [](std::uint32_t x, std::uint32_t) { return x >> bits; });
-}
 template <int bits> Block ShiftLeft64(Block a) {
     return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x << bits; });
 }
 template <int bits> Block ShiftRight64(Block a) {
     return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x >> bits; });
-}
-inline Block Low16Of32(Block a) {
-    Block x{};
-    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 2, a.b + i * 4, 2);
-    return x;
-}
-inline Block Widen32Low(Block a) {
-    Block x{};
-    for (int i = 0; i < 4; ++i) std::memcpy(x.b + i * 4, a.b + i * 2, 2);
-    return x;
 }
 inline Block Pair(std::uint64_t low, std::uint64_t high) {
     Block x;
@@ -237,12 +207,17 @@ inline Block Shuffle(Block a, Block index) {
     for (int i = 0; i < 16; ++i) x.b[i] = index.b[i] & 0x80 ? 0 : a.b[index.b[i] & 15];
     return x;
 }
-inline Block HighHalf(Block a) {
+template <int places> Block MoveUp(Block a) {
     Block x{};
-    std::memcpy(x.b, a.b + 8, 8);
+    std::memcpy(x.b + places, a.b, 16 - places);
     return x;
 }
-inline Block Widen32High(Block a) { return Widen32Low(HighHalf(a)); }
+template <int places> Block MoveDown(Block a) {
+    Block x{};
+    std::memcpy(x.b, a.b + places, 16 - places);
+    return x;
+}
+inline Block HighHalf(Block a) { return MoveDown<8>(a); }
 template <int bits> Block ShiftLeft16(Block a) {
     return detail::Map<std::uint16_t>(a, a, [](int x, int) { return x << bits; });
 }
@@ -283,11 +258,12 @@ inline Block PackSigned(Block a, Block b) {
     for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
     return x;
 }
-inline std::uint64_t LowHalf(Block a) {
+inline std::uint64_t LowWord(Block a) {
     std::uint64_t half;
     std::memcpy(&half, &a, sizeof half);
     return half;
 }
+inline std::uint64_t HighWord(Block a) { return LowWord(HighHalf(a)); }
 inline std::size_t Sum8(Block a) {
     std::size_t sum = 0;
     for (std::uint8_t byte : a.b) sum += byte;
@@ -306,6 +282,56 @@ TAVO_NOSANITIZE inline Block NarrowText(const wchar_t* text) {
     wchar_t copy[kBlock] = {};
     for (std::size_t i = 0; i < kBlock && text[i]; ++i) copy[i] = text[i];
     return Narrow(Load(copy), Load(copy + 8));
+}
+
+namespace detail {
+template <class Word> TAVO_INLINE std::uint64_t Read(const unsigned char* p) {
+    Word word;
+    std::memcpy(&word, p, sizeof word);
+    return word;
+}
+template <class Word> TAVO_INLINE void Write(unsigned char* p, std::uint64_t value) {
+    const Word word = static_cast<Word>(value);
+    std::memcpy(p, &word, sizeof word);
+}
+} // namespace detail
+
+// The beginning and the end of texts that fill no block: two words that may overlap, so that nothing else is touched
+// and no byte is handled by itself. The lower byte comes first, as on every processor with blocks.
+
+// `count` bytes, 1 to 16; those behind are 0.
+TAVO_INLINE Block LoadPart(const void* from, std::size_t count) {
+    const auto* const p = static_cast<const unsigned char*>(from);
+    if (count >= 8) {
+        const std::size_t half = 4 * (16 - count); // a shift by 64 in one step would be undefined
+        return Pair(detail::Read<std::uint64_t>(p), detail::Read<std::uint64_t>(p + count - 8) >> half >> half);
+    }
+    if (count >= 4)
+        return Pair(detail::Read<std::uint32_t>(p) | detail::Read<std::uint32_t>(p + count - 4) << 8 * (count - 4), 0);
+    return Pair(p[0] | static_cast<std::uint64_t>(p[count / 2]) << count / 2 * 8 |
+                    static_cast<std::uint64_t>(p[count - 1]) << 8 * (count - 1),
+                0);
+}
+
+// The first `count` bytes of a block, 0 to 16.
+TAVO_INLINE void StorePart(void* to, Block x, std::size_t count) {
+    auto* const p = static_cast<unsigned char*>(to);
+    const std::uint64_t low = LowWord(x);
+    if (count > 8) {
+        const std::size_t half = 4 * (count - 8);
+        detail::Write<std::uint64_t>(p, low);
+        detail::Write<std::uint64_t>(p + count - 8, HighWord(x) << 8 * (16 - count) | low >> half >> half);
+    } else if (count == 8) {
+        detail::Write<std::uint64_t>(p, low);
+    } else if (count >= 4) {
+        detail::Write<std::uint32_t>(p, low);
+        detail::Write<std::uint32_t>(p + count - 4, low >> 8 * (count - 4));
+    } else if (count >= 2) {
+        detail::Write<std::uint16_t>(p, low);
+        detail::Write<std::uint16_t>(p + count - 2, low >> 8 * (count - 2));
+    } else if (count == 1) {
+        detail::Write<std::uint8_t>(p, low);
+    }
 }
 
 // Set bits, without the processor's instruction, which the baseline lacks.
@@ -376,6 +402,91 @@ template <class Unit> std::size_t ZeroUnit(const Unit* text, std::size_t n, bool
     if (ascii) *ascii = false;
     return i;
 }
+#endif
+
+// --- Lines of 64 bytes -----------------------------------------------------------------------------------------------
+//
+// Processors with AVX-512 and VBMI2 load and store any part of 64 bytes, touching nothing else, and move chosen lanes
+// to the front. Functions marked TAVO_LINE may be called when HasLines() is true; TAVO_NO_LINES builds what other
+// processors run. Masks have one bit per lane.
+
+#if defined(TAVO_LINES)
+
+#define TAVO_LINE __attribute__((target("avx512f,avx512bw,avx512vl,avx512vbmi,avx512vbmi2,bmi,bmi2,lzcnt,popcnt")))
+#define TAVO_LINE_INLINE TAVO_LINE TAVO_INLINE
+
+constexpr bool kLines = true;
+inline bool g_hideLines = false; // set by tests, which also run what other processors do
+inline bool HasLines() {
+    return !g_hideLines && __builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vl") &&
+           __builtin_cpu_supports("avx512vbmi") && __builtin_cpu_supports("avx512vbmi2") &&
+           __builtin_cpu_supports("bmi2") && __builtin_cpu_supports("popcnt");
+}
+
+using HalfLine = __m256i;
+using Line = __m512i;
+
+// A mask of the first `count` lanes.
+TAVO_LINE_INLINE std::uint32_t First32(std::size_t count) { return _bzhi_u32(~0u, static_cast<unsigned>(count)); }
+TAVO_LINE_INLINE std::uint64_t First64(std::size_t count) { return _bzhi_u64(~0ull, static_cast<unsigned>(count)); }
+TAVO_LINE_INLINE std::size_t Count(std::uint64_t mask) { return static_cast<std::size_t>(__builtin_popcountll(mask)); }
+
+// The lanes of the mask; the others are 0 and not touched.
+TAVO_LINE_INLINE Line LoadLine8(const void* p, std::uint64_t mask) { return _mm512_maskz_loadu_epi8(mask, p); }
+// The same from `back` bytes before p, which need not be anywhere.
+TAVO_LINE_INLINE Line LoadLine8Before(const void* p, std::size_t back, std::uint64_t mask) {
+    return LoadLine8(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(p) - back), mask);
+}
+TAVO_LINE_INLINE Line LoadLine16(const void* p, std::uint32_t mask) { return _mm512_maskz_loadu_epi16(mask, p); }
+// The lanes of the mask one after the other.
+TAVO_LINE_INLINE void StoreLanes8(void* p, std::uint64_t mask, Line x) {
+    _mm512_mask_storeu_epi8(p, First64(Count(mask)), _mm512_maskz_compress_epi8(mask, x));
+}
+TAVO_LINE_INLINE void StoreLanes16(void* p, std::uint32_t mask, Line x) {
+    _mm512_mask_storeu_epi16(p, First32(Count(mask)), _mm512_maskz_compress_epi16(mask, x));
+}
+TAVO_LINE_INLINE void StoreHalf8(void* p, std::uint32_t mask, HalfLine x) { _mm256_mask_storeu_epi8(p, mask, x); }
+
+TAVO_LINE_INLINE Line Line16(int value) { return _mm512_set1_epi16(static_cast<short>(value)); }
+TAVO_LINE_INLINE Line Line32(int value) { return _mm512_set1_epi32(value); }
+TAVO_LINE_INLINE Line And(Line a, Line b) { return _mm512_and_si512(a, b); }
+TAVO_LINE_INLINE Line Or(Line a, Line b) { return _mm512_or_si512(a, b); }
+template <int bits> TAVO_LINE_INLINE Line ShiftLeft16(Line a) { return _mm512_slli_epi16(a, bits); }
+template <int bits> TAVO_LINE_INLINE Line ShiftRight16(Line a) { return _mm512_srli_epi16(a, bits); }
+template <int bits> TAVO_LINE_INLINE Line ShiftLeft32(Line a) { return _mm512_slli_epi32(a, bits); }
+template <int bits> TAVO_LINE_INLINE Line ShiftRight32(Line a) { return _mm512_srli_epi32(a, bits); }
+// b where the mask has a bit, elsewhere a.
+TAVO_LINE_INLINE Line Select16(std::uint32_t mask, Line a, Line b) { return _mm512_mask_mov_epi16(a, mask, b); }
+TAVO_LINE_INLINE Line Select32(std::uint16_t mask, Line a, Line b) { return _mm512_mask_mov_epi32(a, mask, b); }
+// a where the mask has a bit, elsewhere 0.
+TAVO_LINE_INLINE Line Keep16(std::uint32_t mask, Line a) { return _mm512_maskz_mov_epi16(mask, a); }
+// Byte i of the result is byte index[i].
+TAVO_LINE_INLINE Line Gather8(Line a, Line index) { return _mm512_permutexvar_epi8(index, a); }
+TAVO_LINE_INLINE Line LoadLine(const void* p) { return _mm512_loadu_si512(p); }
+TAVO_LINE_INLINE Line Widen32(HalfLine units) { return _mm512_cvtepu16_epi32(units); }
+TAVO_LINE_INLINE HalfLine Narrow(Line units) { return _mm512_cvtepi16_epi8(units); }
+TAVO_LINE_INLINE HalfLine LowHalf(Line a) { return _mm512_castsi512_si256(a); }
+TAVO_LINE_INLINE HalfLine HighHalf(Line a) { return _mm512_extracti64x4_epi64(a, 1); }
+
+TAVO_LINE_INLINE std::uint64_t High8(Line a) { return _mm512_movepi8_mask(a); }
+TAVO_LINE_INLINE std::uint64_t NonZero8(Line a) { return _mm512_test_epi8_mask(a, a); }
+// Signed a < b, and unsigned comparisons.
+TAVO_LINE_INLINE std::uint64_t IsBelow8(Line a, int b) {
+    return _mm512_cmplt_epi8_mask(a, _mm512_set1_epi8(static_cast<char>(b)));
+}
+TAVO_LINE_INLINE std::uint64_t IsAtLeast8(Line a, int b) {
+    return _mm512_cmpge_epu8_mask(a, _mm512_set1_epi8(static_cast<char>(b)));
+}
+TAVO_LINE_INLINE std::uint32_t IsBelow16(Line a, int b) { return _mm512_cmplt_epu16_mask(a, Line16(b)); }
+TAVO_LINE_INLINE std::uint32_t IsEqual16(Line a, int b) { return _mm512_cmpeq_epi16_mask(a, Line16(b)); }
+TAVO_LINE_INLINE std::uint16_t IsBelow32(Line a, int b) { return _mm512_cmplt_epu32_mask(a, Line32(b)); }
+
+#else
+
+#define TAVO_LINE
+constexpr bool kLines = false;
+inline bool g_hideLines = false;
+inline bool HasLines() { return false; }
 #endif
 
 // Asks for the cache line at `address`, which need not be readable: to be read, or to be written soon.

@@ -1,6 +1,7 @@
 // Transcoding: single characters, counts and whole texts, each one body for UTF-16 and wide text.
 
 #include "transcoding.h"
+#include "transcodingchunks.h"
 
 #include "platform/platform.h"
 #include <TAVO/string.h>
@@ -13,193 +14,286 @@ using namespace Simd;
 
 // --- Measuring UTF-8: 64 bytes at a time, one mask bit per byte ------------------------------------------------------
 
-constexpr std::size_t kChunk = 64;
+// Up to 64 bytes in four blocks, which overlap if there are fewer. Its masks have zeros behind its end.
+struct Chunk {
+    Block parts[4];
+    std::size_t at[4] = {0, 16, 32, 48}; // where each begins
+    std::size_t skipped = 0;             // bytes of the blocks that stand before the chunk
+};
+
+TAVO_INLINE Chunk LoadChunk(const unsigned char* text) {
+    return {{Load(text), Load(text + 16), Load(text + 32), Load(text + 48)}};
+}
+
+// The last bytes of a text, fewer than a chunk.
+TAVO_INLINE Chunk LoadRest(const unsigned char* text, std::size_t length, std::size_t rest) {
+    const auto skip = [](Chunk chunk, std::size_t bytes) {
+        chunk.skipped = bytes;
+        return chunk;
+    };
+    if (length >= kChunk) return skip(LoadChunk(text + length - kChunk), kChunk - rest);
+    if (length < kBlock) return skip({{LoadPart(text, length), All8(0), All8(0), All8(0)}}, length - rest);
+    const std::size_t last = length - kBlock, second = last < kBlock ? last : kBlock, third = last - second;
+    return skip({{Load(text), Load(text + second), Load(text + third), Load(text + last)}, {0, second, third, last}},
+                length - rest);
+}
 
 // One bit per byte of a chunk: the highest bit of what `test` makes of each block.
-template <class Test> TAVO_INLINE std::uint64_t ChunkMask(const unsigned char* chunk, Test test) {
+template <class Test> TAVO_INLINE std::uint64_t ChunkMask(const Chunk& chunk, Test test) {
     std::uint64_t mask = 0;
-    for (unsigned i = 0; i < kChunk; i += kBlock) mask |= static_cast<std::uint64_t>(Mask(test(Load(chunk + i)))) << i;
-    return mask;
+    for (unsigned i = 0; i < 4; ++i) mask |= static_cast<std::uint64_t>(Mask(test(chunk.parts[i]))) << chunk.at[i];
+    return mask >> chunk.skipped;
 }
-TAVO_INLINE std::uint64_t AtLeastMask(const unsigned char* chunk, int byte) {
+TAVO_INLINE std::uint64_t HighMask(const Chunk& chunk) {
+    return ChunkMask(chunk, [](Block x) { return x; });
+}
+TAVO_INLINE std::uint64_t AtLeastMask(const Chunk& chunk, int byte) {
     return ChunkMask(chunk, [byte](Block x) { return AtLeast8(x, All8(byte)); });
 }
 
-// Adds the whole characters of a chunk that begins with one; false: the chunk holds something invalid.
-TAVO_INLINE bool MeasureChunk(const unsigned char* chunk, std::uint64_t high, Extent& extent) {
-    const std::uint64_t continuations = ChunkMask(chunk, [](Block x) { return Below8(x, All8(0xC0)); });
-    const std::uint64_t leads = high & ~continuations;
-    const std::uint64_t leads3 = AtLeastMask(chunk, 0xE0); // and longer
-    const std::uint64_t leads4 = AtLeastMask(chunk, 0xF0);
-    if ((leads << 1 | leads3 << 2 | leads4 << 3) != continuations) return false;
+TAVO_INLINE ChunkBits BitsOf(const Chunk& chunk) {
+    ChunkBits bits;
+    bits.high = HighMask(chunk);
+    if (bits.high == 0) return bits;
+    bits.continuations = ChunkMask(chunk, [](Block x) { return Below8(x, All8(0xC0)); });
+    bits.leads3 = AtLeastMask(chunk, 0xE0);
+    if (bits.leads3 != 0) bits.leads4 = AtLeastMask(chunk, 0xF0);
+    return bits;
+}
+
+// Adds chunks of sequences of up to three bytes.
+void MeasurePlainChunks(const unsigned char* text, std::size_t length, Extent& extent) {
+    if constexpr (kLines)
+        if (HasLines()) return Lines::MeasureUtf8(text, length, extent);
+    std::uint64_t expected = 0;
+    while (length - extent.source >= kChunk)
+        if (!AddPlain(BitsOf(LoadChunk(text + extent.source)), kChunk, expected, extent)) break;
+    const std::size_t rest = length - extent.source;
+    if (rest != 0 && rest < kChunk) AddPlain(BitsOf(LoadRest(text, length, rest)), rest, expected, extent);
+    if (expected != 0) TakeBack(text, extent);
+}
+
+// Adds the whole characters of a chunk that begins with one; false: it holds something invalid, or the end of the text
+// cuts a character.
+TAVO_INLINE bool AddChunk(const Chunk& chunk, const ChunkBits& bits, std::size_t bytes, Extent& extent) {
+    const std::uint64_t leads = bits.high & ~bits.continuations;
+    if ((leads << 1 | bits.leads3 << 2 | bits.leads4 << 3) != bits.continuations) return false;
 
     // The last character may reach behind the chunk; it is left to the next one.
-    std::size_t bytes = kChunk;
-    if ((leads >> 63 | leads3 >> 62 | leads4 >> 61) != 0)
+    std::uint64_t whole = ~0ull;
+    if ((leads >> 63 | bits.leads3 >> 62 | bits.leads4 >> 61) != 0) {
         bytes = 63 - static_cast<std::size_t>(std::countl_zero(leads));
-    const std::uint64_t whole = bytes == kChunk ? ~0ull : (1ull << bytes) - 1;
-    std::size_t characters = bytes - CountBits(continuations & whole);
-
-    std::size_t pairs = 0;
-    if (TAVO_UNLIKELY((leads4 & whole) != 0)) {
-        if (AtLeastMask(chunk, 0xF5) != 0) return false;
-        const std::uint64_t below90 = ChunkMask(chunk, [](Block x) { return Below8(x, All8(0x90)); });
-        const std::uint64_t leadsF0 = ChunkMask(chunk, [](Block x) { return Equal8(x, All8(0xF0)); });
-        const std::uint64_t leadsF4 = ChunkMask(chunk, [](Block x) { return Equal8(x, All8(0xF4)); });
-        const std::uint64_t overlong = leadsF0 & (below90 >> 1);
-        pairs = CountBits(leads4 & whole & ~overlong);
-        if ((leadsF4 & whole & ~(below90 >> 1)) != 0) extent.beyond = true;
+        whole = (1ull << bytes) - 1;
     }
+    const std::size_t characters = bytes - CountBits(bits.continuations & whole);
+    if (AtLeastMask(chunk, 0xF5) != 0) return false;
+    const std::uint64_t below90 = ChunkMask(chunk, [](Block x) { return Below8(x, All8(0x90)); });
+    const std::uint64_t leadsF0 = ChunkMask(chunk, [](Block x) { return Equal8(x, All8(0xF0)); });
+    const std::uint64_t leadsF4 = ChunkMask(chunk, [](Block x) { return Equal8(x, All8(0xF4)); });
+    const std::uint64_t overlong = leadsF0 & (below90 >> 1);
+    if ((leadsF4 & whole & ~(below90 >> 1)) != 0) extent.beyond = true;
     extent.source += bytes;
     extent.characters += characters;
-    extent.target += characters + pairs;
+    extent.target += characters + CountBits(bits.leads4 & whole & ~overlong);
     return true;
 }
 
-// Adds the last characters of a text, fewer bytes than a chunk, unless something is wrong with them.
-TAVO_NOINLINE void MeasureRest(const unsigned char* text, std::size_t length, Extent& extent) {
-    const std::size_t rest = length - extent.source;
-    if (rest < kBlock || rest >= kChunk) return;
-    unsigned char chunk[kChunk] = {}; // filled up with zeros, each a character
-    std::memcpy(chunk, text + extent.source, rest);
-    if (!MeasureChunk(chunk, ChunkMask(chunk, [](Block x) { return x; }), extent)) return;
-    extent.source -= kChunk - rest;
-    extent.characters -= kChunk - rest;
-    extent.target -= kChunk - rest;
+// Adds chunks of any sequences up to one without sequences of four bytes. False: there is something wrong.
+bool MeasureAnyChunks(const unsigned char* text, std::size_t length, Extent& extent) {
+    while (extent.source < length) {
+        const std::size_t rest = length - extent.source;
+        const Chunk chunk = rest < kChunk ? LoadRest(text, length, rest) : LoadChunk(text + extent.source);
+        const ChunkBits bits = BitsOf(chunk);
+        if (!AddChunk(chunk, bits, rest < kChunk ? rest : kChunk, extent)) return false;
+        if (bits.leads4 == 0) break;
+    }
+    return true;
 }
 
-// --- Converting UTF-8: runs of sequences of one length ---------------------------------------------------------------
+// --- Converting UTF-8: windows of eight bytes, which may begin and end anywhere in a sequence ------------------------
 
-// The UTF-16 units of eight two-byte sequences.
-TAVO_INLINE Block Decode2(Block x) {
-    return Or(ShiftLeft16<6>(And(x, All16(0x001F))), ShiftRight16<8>(And(x, All16(0x3F00))));
-}
-TAVO_INLINE std::uint32_t Read32(const unsigned char* text) {
-    std::uint32_t value;
-    std::memcpy(&value, text, 4);
-    return value;
-}
-// The UTF-16 units of four three-byte sequences, in the low half.
-TAVO_INLINE Block Decode3(const unsigned char* text) {
-    const Block x = Lanes32(Read32(text), Read32(text + 3), Read32(text + 6), Read32(text + 9));
-    return Low16Of32(Or(Or(ShiftLeft32<12>(And(x, All32(0x0F))), ShiftRight32<2>(And(x, All32(0x3F00)))),
-                        ShiftRight32<16>(And(x, All32(0x3F0000)))));
-}
-
-// For every set of places in a window of eight: how to move what stands at the other places to the front.
-struct Compaction {
-    std::uint8_t shuffle[256][kBlock];
-    std::uint8_t kept[256];
+// For every set of continuation bytes among nine, of which the first eight are a window: each sequence that ends in the
+// window as a 16-bit lane, its last byte low and, unless it is the only one, the one before high. Places count from the
+// byte before the window.
+struct Sequences {
+    std::uint8_t shuffle[512][kBlock];
+    std::uint8_t count[512];
 };
-
-// Places are bytes and a set bit is a continuation byte: each sequence's first two bytes become one 16-bit lane.
-constexpr Compaction kSequences = [] {
-    Compaction table{};
-    for (unsigned set = 0; set < 256; ++set) {
-        unsigned lane = 0;
+constexpr Sequences kSequences = [] {
+    Sequences table{};
+    for (unsigned set = 0; set < 512; ++set) {
+        std::uint8_t* lane = table.shuffle[set];
+        for (unsigned byte = 0; byte < kBlock; ++byte) lane[byte] = 0x80;
         for (unsigned place = 0; place < 8; ++place) {
-            if (set >> place & 1) continue;
-            table.shuffle[set][lane * 2] = static_cast<std::uint8_t>(place);
-            table.shuffle[set][lane * 2 + 1] = static_cast<std::uint8_t>(place + 1);
-            ++lane;
+            const bool continued = (set >> place & 1) != 0, ends = (set >> (place + 1) & 1) == 0;
+            if (!ends) continue;
+            lane[0] = static_cast<std::uint8_t>(place + 1);
+            if (continued) lane[1] = static_cast<std::uint8_t>(place);
+            lane += 2;
+            ++table.count[set];
         }
-        table.kept[set] = static_cast<std::uint8_t>(lane);
-        for (; lane < 8; ++lane) table.shuffle[set][lane * 2] = table.shuffle[set][lane * 2 + 1] = 0x80;
     }
     return table;
 }();
 
-// Decodes the sequences of one and two bytes that begin in the eight bytes at `text`; returns their number.
-template <class Unit>
-TAVO_SHUFFLES inline std::size_t DecodeWindow(const unsigned char* text, std::uint32_t set, Unit* out) {
-    const Block lanes = Shuffle(Load(text), Load(kSequences.shuffle[set]));
-    const Block two = Equal16(And(lanes, All16(0x80)), All16(0x80));
-    Store(out, Or(And(two, Decode2(lanes)), AndNot(two, And(lanes, All16(0x7F)))));
-    return kSequences.kept[set];
+// The units of sequences of one and two bytes.
+TAVO_INLINE Block Decode2(Block lanes) {
+    return Or(And(lanes, All16(0x7F)), ShiftRight16<2>(And(lanes, All16(0x3F00))));
+}
+// The same of up to three bytes; `leads` are lanes of the bytes one before those of `lanes`.
+TAVO_INLINE Block Decode3(Block lanes, Block leads) {
+    const Block three = Equal16(And(lanes, All16(0xC000)), All16(0x8000));
+    return Or(Decode2(lanes), And(three, ShiftLeft16<4>(And(leads, All16(0x0F00)))));
 }
 
 // Decodes mixtures of one and two bytes, without a branch on which is which, up to the first block with something
-// longer.
+// longer. Two bytes before `text` are read: a longer sequence may end in the first block.
 template <class Unit>
-TAVO_SHUFFLES void ConvertMixture(const unsigned char*& text, const unsigned char* end, Unit*& out,
-                                  const Unit* outEnd) {
-    while (end - text >= 48 && outEnd - out >= 32) {
+TAVO_SHUFFLES TAVO_INLINE void ConvertMixture(const unsigned char*& text, const unsigned char* end, Unit*& out,
+                                              const Unit* outEnd) {
+    if (text[-2] >= 0xE0 || text[-1] >= 0xE0) return;
+    for (; end - text >= 40 && outEnd - out >= 32; text += 32) {
         const Block x = Load(text);
         const Block y = Load(text + 16);
-        if (Mask(Or(x, y)) == 0) {
-            Store(out, WidenLow(x));
-            Store(out + 8, WidenHigh(x));
-            Store(out + 16, WidenLow(y));
-            Store(out + 24, WidenHigh(y));
-            text += 32, out += 32;
-            continue;
-        }
-        if (Mask(Or(AtLeast8(x, All8(0xE0)), AtLeast8(y, All8(0xE0)))) != 0) break;
-        // A window may begin with the end of a sequence of the window before. Each finds that out by itself, so that
-        // they do not wait for one another.
-        const std::uint32_t continuations = Mask(Below8(x, All8(0xC0))) | Mask(Below8(y, All8(0xC0))) << 16;
+        if (Mask(Or(AtLeast8(x, All8(0xE0)), AtLeast8(y, All8(0xE0)))) != 0) return;
+        const std::uint64_t continuations = Mask(Below8(x, All8(0xC0))) |
+                                            static_cast<std::uint64_t>(Mask(Below8(y, All8(0xC0)))) << 16 |
+                                            static_cast<std::uint64_t>(IsContinuation(text[32])) << 32;
         for (unsigned window = 0; window < 32; window += 8) {
-            const std::uint32_t set = continuations >> window & 0xFF;
-            const std::uint32_t skip = set & 1;
-            out += DecodeWindow(text + window + skip, set >> skip | skip << 7, out);
+            const auto set = static_cast<std::uint32_t>(continuations >> window & 0x1FF);
+            Store(out, Decode2(Shuffle(Load(text + window - 1), Load(kSequences.shuffle[set]))));
+            out += kSequences.count[set];
         }
-        text += 32;
-        text += IsContinuation(*text);
-    }
-    while (end - text >= static_cast<std::ptrdiff_t>(kBlock) && outEnd - out >= 8) {
-        const Block x = Load(text);
-        if ((Mask(AtLeast8(x, All8(0xE0))) & 0xFF) != 0) return;
-        out += DecodeWindow(text, Mask(Below8(x, All8(0xC0))) & 0xFF, out);
-        text += 8;
-        text += IsContinuation(*text);
     }
 }
 
-// Decodes runs while whole blocks can be loaded and stored; stores may reach into units that come later.
-// False: a value above 10FFFF.
-template <class Unit> bool ConvertRuns(const unsigned char*& text, const unsigned char* end, Unit*& out, Unit* outEnd) {
-    constexpr std::uint32_t kEveryThird = 0x249; // bytes 0, 3, 6, 9
-    const bool mixtures = HasShuffle();
-    while (end - text >= static_cast<std::ptrdiff_t>(kBlock) && outEnd - out >= 8) {
-        if (mixtures && *text < 0xE0) {
-            const unsigned char* const before = text;
-            ConvertMixture(text, end, out, outEnd);
-            if (text != before) continue;
-        }
+// Decodes five sequences of three bytes.
+constexpr std::uint32_t kLeadsOf5 = 0x1249; // bytes 0, 3, 6, 9, 12
+TAVO_SHUFFLES TAVO_INLINE Block Decode5(Block x) {
+    alignas(kBlock) static constexpr std::uint8_t kLast[] = {2,  1,  5,    4,    8,    7,    11,   10,
+                                                             14, 13, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80};
+    alignas(kBlock) static constexpr std::uint8_t kLeads[] = {0x80, 0,  0x80, 3,    0x80, 6,    0x80, 9,
+                                                              0x80, 12, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80};
+    return Or(Decode2(Shuffle(x, LoadAligned(kLast))), ShiftLeft16<4>(Shuffle(x, LoadAligned(kLeads))));
+}
+
+// Decodes runs of sequences of three bytes.
+template <class Unit>
+TAVO_SHUFFLES TAVO_INLINE void ConvertThrees(const unsigned char*& text, const unsigned char* end, Unit*& out,
+                                             const Unit* outEnd) {
+    while (end - text >= 16 && outEnd - out >= 8) {
         const Block x = Load(text);
-        const std::uint32_t high = Mask(x);
-        std::size_t run;
-        if (high == 0) {
-            Store(out, WidenLow(x));
-            Store(out + 8, WidenHigh(x));
-            text += 16, out += 16;
-        } else if ((high & 1) == 0) {
-            Store(out, WidenLow(x));
-            run = static_cast<std::size_t>(std::countr_zero(high | 0x100));
-            text += run, out += run;
-        } else if (*text < 0xE0) {
-            const Block good = Equal16(And(x, All16(0xC0E0)), All16(0x80C0));
-            Store(out, Decode2(x));
-            run = static_cast<std::size_t>(std::countr_zero(~Mask(good))) / 2;
-            text += 2 * run, out += run;
-        } else if ((Mask(Equal8(And(x, All8(0xF0)), All8(0xE0))) & kEveryThird) == kEveryThird) {
-            StoreHalf(out, Decode3(text));
-            text += 12, out += 4;
-        } else if (*text < 0xF0) {
-            *out++ = static_cast<Unit>((text[0] & 0x0F) << 12 | (text[1] & 0x3F) << 6 | (text[2] & 0x3F));
-            text += 3;
-        } else {
+        if ((Mask(Equal8(And(x, All8(0xF0)), All8(0xE0))) & kLeadsOf5) != kLeadsOf5) return;
+        Store(out, Decode5(x));
+        text += 15, out += 5;
+    }
+}
+
+// The text around a window: the byte before it and those that follow, and the same from one byte earlier. Zeros stand
+// for what is not the text's.
+struct Window {
+    Block before, earlier;
+};
+TAVO_INLINE Window FirstWindow(Block text) { return {MoveUp<1>(text), MoveUp<2>(text)}; }
+TAVO_INLINE Window WindowAt(const unsigned char* text) { return {Load(text - 1), Load(text - 2)}; }
+// Of the last `left` bytes, at most 14, of a text of a block or more.
+TAVO_SHUFFLES TAVO_INLINE Window LastWindow(const unsigned char* end, std::size_t left) {
+    alignas(kBlock) static constexpr std::uint8_t kSlide[] = {
+        0,    1,    2,    3,    4,    5,    6,    7,    8,    9,    10,   11,   12,   13,   14,   15,
+        0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80, 0x80};
+    const Block last = Load(end - kBlock);
+    return {Shuffle(last, Load(kSlide + 15 - left)), Shuffle(last, Load(kSlide + 14 - left))};
+}
+
+// Decodes the sequences of up to three bytes that end in a window. If one of four begins there, decodes up to its end
+// instead, step by step.
+template <class Unit>
+TAVO_SHUFFLES TAVO_INLINE void ConvertWindow(Window window, const unsigned char*& text, const unsigned char* end,
+                                             Unit*& out, const Unit* outEnd) {
+    if (TAVO_UNLIKELY((Mask(AtLeast8(window.before, All8(0xF0))) & 0x1FE) != 0)) {
+        while (IsContinuation(*text)) --text;
+        for (bool four = false; text < end && (!four || *text >= 0xF0);) {
+            four = *text >= 0xF0;
             ulong32 codePoint = 0;
             StepUtf8(codePoint, text);
-            if (!EncodeUtf16(out, codePoint)) return false;
+            EncodeUtf16(out, codePoint);
         }
+        return;
     }
-    return true;
+    const std::uint32_t set = Mask(Below8(window.before, All8(0xC0))) >> 1 & 0x1FF;
+    const Block lanes = Load(kSequences.shuffle[set]);
+    const Block units = Decode3(Shuffle(window.before, lanes), Shuffle(window.earlier, lanes));
+    // Stores may reach into units that come later, not behind the last.
+    const auto room = static_cast<std::size_t>(outEnd - out);
+    const std::size_t count = kSequences.count[set];
+    text += 8;
+    if (TAVO_LIKELY(room >= 8)) {
+        Store(out, units);
+        out += count;
+    } else {
+        StorePart(out, units, (count < room ? count : room) * sizeof(Unit));
+        out += count < room ? count : room;
+    }
+}
+
+// Decodes a measured text without values above 10FFFF.
+template <class Unit>
+TAVO_SHUFFLES Unit* ConvertWindows(const unsigned char* text, const unsigned char* end, Unit* out, const Unit* outEnd) {
+    const unsigned char* const begin = text;
+    const auto length = static_cast<std::size_t>(end - text);
+    if (length < kBlock) {
+        const Block all = LoadPart(text, length);
+        ConvertWindow(FirstWindow(all), text, end, out, outEnd);
+        if (text == begin + 8 && text < end)
+            ConvertWindow({MoveDown<7>(all), MoveDown<6>(all)}, text, end, out, outEnd);
+        for (ulong32 codePoint; text < end && StepUtf8(codePoint, text);) EncodeUtf16(out, codePoint);
+        return out;
+    }
+    ConvertThrees(text, end, out, outEnd);
+    if (text == begin) ConvertWindow(FirstWindow(Load(text)), text, end, out, outEnd);
+    while (end - text >= 15) {
+        ConvertMixture(text, end, out, outEnd);
+        for (int i = 0; i < 4 && end - text >= 15; ++i) ConvertWindow(WindowAt(text), text, end, out, outEnd);
+        if (end - text >= 16 && *text >= 0xC0) ConvertThrees(text, end, out, outEnd);
+    }
+    while (text < end) ConvertWindow(LastWindow(end, static_cast<std::size_t>(end - text)), text, end, out, outEnd);
+    return out;
+}
+
+// ASCII.
+template <class Unit> TAVO_INLINE void Copy(const unsigned char* text, std::size_t count, Unit* out) {
+    const auto block = [=](std::size_t at) {
+        const Block x = Load(text + at);
+        Store(out + at, WidenLow(x));
+        Store(out + at + 8, WidenHigh(x));
+    };
+    if (count < kBlock) {
+        if (count == 0) return;
+        const Block x = LoadPart(text, count);
+        const std::size_t low = count < 8 ? count : 8;
+        StorePart(out, WidenLow(x), low * sizeof(Unit));
+        StorePart(out + low, WidenHigh(x), (count - low) * sizeof(Unit));
+        return;
+    }
+    for (std::size_t at = 0; at + kBlock <= count; at += kBlock) block(at);
+    block(count - kBlock); // overlaps
 }
 
 template <class Unit> bool ConvertBytes(const unsigned char* text, const Extent& extent, Unit*& out) {
     const unsigned char* const end = text + extent.source;
-    if (!extent.beyond && !ConvertRuns(text, end, out, out + extent.target)) return false;
+    if (extent.target == extent.source) {
+        Copy(text, extent.source, out);
+        out += extent.target;
+        return true;
+    }
+    const Unit* const outEnd = out + extent.target;
+    if constexpr (kLines)
+        if (HasLines()) out = Lines::ConvertUtf8(text, end, out);
+    if (text == end) return true;
+    if (!extent.beyond && HasShuffle()) {
+        out = ConvertWindows(text, end, out, outEnd);
+        return true;
+    }
     for (ulong32 codePoint; text < end && StepUtf8(codePoint, text);)
         if (!EncodeUtf16(out, codePoint)) return false;
     return true;
@@ -212,11 +306,9 @@ constexpr std::size_t kUnits = kBlock / sizeof(wchar_t);
 TAVO_INLINE Block Below80(Block x) { return Equal16(And(x, All16(0xFF80)), All16(0)); }
 TAVO_INLINE Block Below800(Block x) { return Equal16(And(x, All16(0xF800)), All16(0)); }
 TAVO_INLINE Block Surrogates(Block x) { return Equal16(And(x, All16(0xF800)), All16(0xD800)); }
-// The lanes before the first that fails the test.
-TAVO_INLINE std::size_t RunOf(Block test) { return static_cast<std::size_t>(std::countr_zero(~Mask(test))) / 2; }
 
 // Adds blocks up to the first that holds a surrogate.
-template <class Unit> void MeasureBlocks(const Unit* text, std::size_t length, Extent& extent) {
+template <class Unit> void MeasurePlain(const Unit* text, std::size_t length, Extent& extent) {
     constexpr std::size_t kBatch = 64; // blocks whose sums fit into bytes
     for (bool plain = true; plain && length - extent.source >= kUnits;) {
         Block saved = All8(0); // bytes that units below 800 and below 80 take less than 3
@@ -243,7 +335,10 @@ template <class Unit> void MeasureBlocks(const Unit* text, std::size_t length, E
 
 template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) {
     Extent extent;
-    MeasureBlocks(text, length, extent);
+    if constexpr (kLines)
+        if (HasLines()) Lines::MeasureUtf16(text, length, extent);
+    if (extent.source == length) return extent;
+    MeasurePlain(text, length, extent);
     while (extent.source < length) {
         const Unit* at = text + extent.source;
         const std::size_t units = Utf16Sequence(at, length - extent.source);
@@ -254,96 +349,143 @@ template <class Unit> Extent MeasureUnits(const Unit* text, std::size_t length) 
         extent.source += units;
         ++extent.characters;
         extent.target += units == 2 || *at < 0x80 ? 1 : *at < 0x800 ? 2 : 3;
-        if (units == 2) MeasureBlocks(text, length, extent);
+        if (units == 2) MeasurePlain(text, length, extent);
     }
     return extent;
 }
 
-// The UTF-8 of eight units from 80 to 7FF.
-TAVO_INLINE Block Encode2(Block x) {
-    return Or(Or(ShiftRight16<6>(x), ShiftLeft16<8>(And(x, All16(0x3F)))), All16(0x80C0));
+// The UTF-8 of eight units below 800.
+TAVO_INLINE Block Encode2(Block x, Block below80) {
+    const Block two = Or(Or(ShiftRight16<6>(x), ShiftLeft16<8>(And(x, All16(0x3F)))), All16(0x80C0));
+    return Or(And(below80, x), AndNot(below80, two));
 }
-// The UTF-8 of four units from 800 up in 32-bit lanes: six bytes in each half.
-TAVO_INLINE Block Encode3(Block x) {
-    x = Or(Or(ShiftRight32<12>(x), And(ShiftLeft32<2>(x), All32(0x3F00))),
-           Or(ShiftLeft32<16>(And(x, All32(0x3F))), All32(0x8080E0)));
-    const Block second = And(x, Lanes32(0, ~0u, 0, ~0u));
-    return Or(And(x, Lanes32(~0u, 0, ~0u, 0)), ShiftRight64<8>(second));
+// The UTF-8 of eight units that are no surrogates: the last bytes, and those before them, which shorter forms lack.
+TAVO_INLINE Block LastBytes(Block x, Block below80) {
+    return Or(And(below80, x), AndNot(below80, Or(And(x, All16(0x3F)), All16(0x80))));
 }
-TAVO_INLINE void Store3(unsigned char* out, Block halves) {
-    StoreHalf(out, halves);
-    StoreHalf(out + 6, HighHalf(halves));
+TAVO_INLINE Block FirstBytes(Block x, Block below800) {
+    const Block heads = Or(And(below800, All16(0xC000)), AndNot(below800, All16(0x80E0)));
+    return Or(Or(ShiftRight16<12>(x), And(ShiftLeft16<2>(x), All16(0x3F00))), heads);
 }
 
-// Places are units and a set bit is a unit below 80: two-byte lanes lose the second byte of those.
-constexpr Compaction kBytesOfUnits = [] {
+// For every set of places in a window of eight: how to move what stands at the other places to the front.
+struct Compaction {
+    std::uint8_t shuffle[256][kBlock];
+    std::uint8_t kept[256];
+};
+
+// A block of encoded units as a table moves it: only the bytes that each has, by a test of each byte's place and the
+// set.
+template <class Test> constexpr Compaction Compact(Test isKept) {
     Compaction table{};
     for (unsigned set = 0; set < 256; ++set) {
         unsigned kept = 0;
-        for (unsigned byte = 0; byte < 16; ++byte)
-            if (byte % 2 == 0 || (set >> byte / 2 & 1) == 0)
-                table.shuffle[set][kept++] = static_cast<std::uint8_t>(byte);
+        for (unsigned byte = 0; byte < kBlock; ++byte)
+            if (isKept(set, byte)) table.shuffle[set][kept++] = static_cast<std::uint8_t>(byte);
         table.kept[set] = static_cast<std::uint8_t>(kept);
-        while (kept < 16) table.shuffle[set][kept++] = 0x80;
+        while (kept < kBlock) table.shuffle[set][kept++] = 0x80;
     }
     return table;
-}();
+}
+// Eight units of up to two bytes; a set bit is a unit below 80.
+constexpr Compaction kBytesOf8 =
+    Compact([](unsigned set, unsigned byte) { return byte % 2 == 0 || (set >> byte / 2 & 1) == 0; });
+// Four units of up to three bytes; the set's low half are the units below 80, its high half those below 800.
+constexpr Compaction kBytesOf4 = Compact([](unsigned set, unsigned byte) {
+    const bool kept[] = {(set >> (4 + byte / 4) & 1) == 0, (set >> byte / 4 & 1) == 0, true, false};
+    return kept[byte % 4];
+});
 
-// Encodes mixtures of units below 800, without a branch on which take one byte, up to the first block with another.
+// Stores the bytes of a set. Stores may reach into bytes that come later, not behind the last.
+TAVO_SHUFFLES TAVO_INLINE unsigned char* StoreBytes(Block encoded, const Compaction& table, std::uint32_t set,
+                                                    unsigned char* out, const unsigned char* outEnd) {
+    const Block bytes = Shuffle(encoded, Load(table.shuffle[set]));
+    const auto room = static_cast<std::size_t>(outEnd - out);
+    const std::size_t count = table.kept[set];
+    if (TAVO_LIKELY(room >= kBlock)) {
+        Store(out, bytes);
+        return out + count;
+    }
+    StorePart(out, bytes, count < room ? count : room);
+    return out + (count < room ? count : room);
+}
+
+// Encodes units below 800 up to the first eight with another.
 template <class Unit>
-TAVO_SHUFFLES void ConvertMixture(const Unit*& text, const Unit* end, unsigned char*& out,
-                                  const unsigned char* outEnd) {
-    while (end - text >= 16 && outEnd - out >= 16) {
+TAVO_SHUFFLES TAVO_INLINE void ConvertMixture(const Unit*& text, const Unit* end, unsigned char*& out,
+                                              const unsigned char* outEnd) {
+    for (; end - text >= 8 && outEnd - out >= 16; text += kUnits) {
         const Block x = Load(text);
-        const Block y = Load(text + kUnits);
-        if (Mask(Below80(Or(x, y))) == 0xFFFF) {
-            Store(out, Narrow(x, y));
-            text += 16, out += 16;
-            continue;
-        }
         if (Mask(Below800(x)) != 0xFFFF) return;
-        const Block ascii = Below80(x);
-        const std::uint32_t set = Mask(PackSigned(ascii, ascii)) & 0xFF;
-        const Block lanes = Or(And(ascii, x), AndNot(ascii, Encode2(x)));
-        Store(out, Shuffle(lanes, Load(kBytesOfUnits.shuffle[set])));
-        text += kUnits, out += kBytesOfUnits.kept[set];
+        const Block below80 = Below80(x);
+        const std::uint32_t set = Mask(PackSigned(below80, below80)) & 0xFF;
+        Store(out, Shuffle(Encode2(x, below80), Load(kBytesOf8.shuffle[set])));
+        out += kBytesOf8.kept[set];
     }
 }
 
-// Encodes runs while whole blocks can be loaded and stored; stores may reach into bytes that come later.
+// Encodes a measured text, eight units at a time, without a branch on which bytes they take unless some take three.
 template <class Unit>
-void ConvertRuns(const Unit*& text, const Unit* end, unsigned char*& out, const unsigned char* outEnd) {
-    const bool mixtures = HasShuffle();
-    while (end - text >= static_cast<std::ptrdiff_t>(kUnits) && outEnd - out >= 16) {
-        if (mixtures && *text < 0x800) {
-            const Unit* const before = text;
-            ConvertMixture(text, end, out, outEnd);
-            if (text != before) continue;
+TAVO_SHUFFLES unsigned char* ConvertWindows(const Unit* text, const Unit* end, unsigned char* out,
+                                            const unsigned char* outEnd) {
+    while (text < end) {
+        ConvertMixture(text, end, out, outEnd);
+        if (text == end) break;
+        const auto left = static_cast<std::size_t>(end - text);
+        const Block x = left < kUnits ? LoadPart(text, left * sizeof(Unit)) : Load(text);
+        const std::uint32_t surrogates = Mask(Surrogates(x));
+        if (TAVO_UNLIKELY(surrogates != 0)) {
+            for (const Unit* const surrogate = text + std::countr_zero(surrogates) / 2; text <= surrogate;) {
+                ulong32 codePoint = 0;
+                StepUtf16(codePoint, text);
+                EncodeUtf8(out, codePoint);
+            }
+            continue;
         }
-        const Block x = Load(text);
-        std::size_t run;
-        if (*text < 0x80) {
-            StoreHalf(out, Narrow(x, x));
-            run = RunOf(Below80(x));
-            text += run, out += run;
-        } else if (*text < 0x800) {
-            Store(out, Encode2(x));
-            run = RunOf(AndNot(Below80(x), Below800(x)));
-            text += run, out += 2 * run;
-        } else if ((Mask(Or(Below800(x), Surrogates(x))) & 0xFF) == 0) {
-            Store3(out, Encode3(Widen32Low(x)));
-            text += 4, out += 12;
+        const Block below80 = Below80(x), below800 = Below800(x);
+        const std::uint32_t set = Mask(PackSigned(below80, below800));
+        if (set >> 8 == 0xFF) {
+            out = StoreBytes(Encode2(x, below80), kBytesOf8, set & 0xFF, out, outEnd);
         } else {
-            ulong32 codePoint = 0;
-            StepUtf16(codePoint, text);
-            EncodeUtf8(out, codePoint);
+            const Block first = FirstBytes(x, below800), last = LastBytes(x, below80);
+            const std::uint32_t low = (set & 0xF) | (set >> 4 & 0xF0), high = (set >> 4 & 0xF) | (set >> 8 & 0xF0);
+            out = StoreBytes(Interleave<2, false>(first, last), kBytesOf4, low, out, outEnd);
+            out = StoreBytes(Interleave<2, true>(first, last), kBytesOf4, high, out, outEnd);
         }
+        text += left < kUnits ? left : kUnits;
     }
+    return out;
+}
+
+// ASCII.
+template <class Unit> TAVO_INLINE void Copy(const Unit* text, std::size_t count, unsigned char* out) {
+    if (count < kBlock) {
+        if (count == 0) return;
+        const Block low = LoadPart(text, (count < kUnits ? count : kUnits) * sizeof(Unit));
+        const Block high = count > kUnits ? LoadPart(text + kUnits, (count - kUnits) * sizeof(Unit)) : All8(0);
+        StorePart(out, Narrow(low, high), count);
+        return;
+    }
+    const auto block = [=](std::size_t at) { Store(out + at, Narrow(Load(text + at), Load(text + at + kUnits))); };
+    for (std::size_t at = 0; at + kBlock <= count; at += kBlock) block(at);
+    block(count - kBlock); // overlaps
 }
 
 template <class Unit> void ConvertUnits(const Unit* text, const Extent& extent, unsigned char*& out) {
     const Unit* const end = text + extent.source;
-    ConvertRuns(text, end, out, out + extent.target);
+    if (extent.target == extent.source && extent.characters == extent.source) {
+        Copy(text, extent.source, out);
+        out += extent.target;
+        return;
+    }
+    const unsigned char* const outEnd = out + extent.target;
+    if constexpr (kLines)
+        if (HasLines()) out = Lines::ConvertUtf16(text, end, out);
+    if (text == end) return;
+    if (HasShuffle()) {
+        out = ConvertWindows(text, end, out, outEnd);
+        return;
+    }
     for (ulong32 codePoint; text < end && StepUtf16(codePoint, text);) EncodeUtf8(out, codePoint);
 }
 
@@ -351,18 +493,9 @@ template <class Unit> void ConvertUnits(const Unit* text, const Extent& extent, 
 
 Extent MeasureUtf8(const unsigned char* text, std::size_t length) {
     Extent extent;
-    while (length - extent.source >= kChunk) {
-        const unsigned char* const chunk = text + extent.source;
-        const std::uint64_t high = ChunkMask(chunk, [](Block x) { return x; });
-        if (high != 0) {
-            if (!MeasureChunk(chunk, high, extent)) break; // the steps below find where
-            continue;
-        }
-        extent.source += kChunk;
-        extent.characters += kChunk;
-        extent.target += kChunk;
-    }
-    MeasureRest(text, length, extent);
+    do MeasurePlainChunks(text, length, extent);
+    while (extent.source < length && MeasureAnyChunks(text, length, extent));
+    // The steps find what is wrong, and where.
     while (extent.source < length) {
         const unsigned char* at = text + extent.source;
         const std::size_t bytes = Utf8Sequence(at, length - extent.source);

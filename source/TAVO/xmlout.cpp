@@ -55,7 +55,7 @@ template <bool escapes> TAVO_INLINE bool NarrowWhole(unsigned char* out, const w
     if (count >= kHalf) {
         const Simd::Block units = Simd::LoadHalves(text, text + count - kHalf);
         if (!IsPlain<escapes>(units)) return false;
-        const std::uint64_t bytes = Simd::LowHalf(Simd::Narrow(units, units));
+        const std::uint64_t bytes = Simd::LowWord(Simd::Narrow(units, units));
         std::memcpy(out, &bytes, kHalf);
         const std::uint64_t last = bytes >> 32;
         std::memcpy(out + count - kHalf, &last, kHalf);

@@ -145,7 +145,7 @@ inline std::uint64_t JoinDigits(Simd::Block digits) {
     using namespace Simd;
     // Each unit of 16 bits holds a high digit in its low byte.
     const Block joined = And(Or(ShiftLeft16<4>(digits), ShiftRight16<8>(digits)), All16(0xFF));
-    return Reverse(LowHalf(Narrow(joined, joined)));
+    return Reverse(LowWord(Narrow(joined, joined)));
 }
 
 // Reads base 16 as ScanNumber does.
@@ -189,7 +189,7 @@ inline unsigned DecimalDigit(wchar_t unit) { return static_cast<unsigned>(unit) 
 inline bool ReadEight(const wchar_t* text, std::uint64_t& number) {
     using namespace Simd;
     const Block units = Load(text);
-    std::uint64_t digits = LowHalf(Narrow(units, units)); // the first one lowest
+    std::uint64_t digits = LowWord(Narrow(units, units)); // the first one lowest
     const std::uint64_t beyondNine = digits + 0x0606060606060606;
     if (((digits & 0xF0F0F0F0F0F0F0F0) | (beyondNine & 0xF0F0F0F0F0F0F0F0) >> 4) != 0x3333333333333333) return false;
     digits -= 0x3030303030303030;
