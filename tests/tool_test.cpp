@@ -3,6 +3,7 @@
 #include "support/process.h"
 #include "support/scratch.h"
 
+#include <algorithm>
 #include <sstream>
 
 using support::Finished;
@@ -162,6 +163,43 @@ TEST(ToolGet, FindsTextsAndAttributes) {
                 {"bins/bin/clip/media", kFine, "\n"},
                 {"", kUsage, "", "no path"},
                 {".|--attribute|1", kUsage, "", "no attribute"}});
+}
+
+TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
+    const char* const values[][3] = {
+        {"int", " -7 of 9", "-7"},
+        {"uint", "-1", "4294967295"},
+        {"hex", "FF", "0xff"},
+        {"int64", "-9223372036854775808", "-9223372036854775808"},
+        {"double", "-1.50e1", "-15"},
+        {"edouble", "3ff8000000000000(1.5)", "1.5"},
+        {"rational", "50 / 2", "25/1"},
+        {"bool", "TRUE", "true"},
+        {"timecode", "10:00:00:00 {25/1}Hz", "10:00:00:00 {25/1}Hz"},
+        {"id", "00000000-0000-0000-0000-000000000000", "00000000-0000-0000-0000-000000000000"},
+        {"binary", "21BA", "12ab"}};
+    for (const auto& [type, text, value] : values)
+        ExpectRun(Call(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>"), kFine,
+                  std::string(value) + '\n', "");
+    const char* const faults[][3] = {{"int", "+x7", "character 2 is \"x\", where a digit belongs"},
+                                     {"hex", "0xg", "character 3 is \"g\", where a hexadecimal digit"},
+                                     {"double", "-.", "it ends where character 3, a digit, belongs"},
+                                     {"edouble", "(1.5)", "character 1 is \"(\""},
+                                     {"rational", "50:2", "character 3 is \":\", where \"/\" belongs"},
+                                     {"rational", "5/\xC3\xA9", "character 3 is \"\xC3\xA9\", where a digit"},
+                                     {"bool", "falsch", "character 5 is \"c\", where \"true\" or \"false\""},
+                                     {"timecode", "10:00:00:25 {25/1}Hz", "the frames are 25"},
+                                     {"timecode", "10:00:00:00", "does not tell the rate"},
+                                     {"id", "{15603cd4-ab81-4d6f-b05f-c6bea760a789}", "without braces"},
+                                     {"binary", "21B", "it ends where character 4, the second digit"},
+                                     {"binary", "", "it ends where character 1, a hexadecimal digit"}};
+    for (const auto& [type, text, fault] : faults)
+        ExpectRows(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>",
+                   {{"", kBadInput, "", fault}});
+    ExpectRows("xml|get|" + kTimeline + "|bins/bin/clip|--attribute|", "",
+               {{"rate|--as|rational", kFine, "50/1\n"},
+                {"rate|--as|number", kUsage, "", "not in"},
+                {"name|--as|int", kBadInput, "", "clip name: \"Harbour 01\""}});
 }
 
 TEST(ToolSet, ChangesTextsAndAttributes) {
@@ -464,6 +502,76 @@ TEST(ToolId, ParsesFormatsAndMakes) {
               "");
     ExpectRun(RunTool({"id", "format", "x"}), kBadInput, "", "no identifier");
     EXPECT_EQ(RunTool({"id", "parse", Call("id|new|--count|3").output.substr(74, 36)}).code, kFine);
+}
+
+TEST(ToolCodec, CodesFilesAndPipes) {
+    const Folder folder;
+    std::string all;
+    for (int byte = 0; byte < 256; ++byte) all += static_cast<char>(byte);
+    const std::string source = folder.Put("bytes", all), text = folder / "text";
+    for (const std::string code : {"3fff", "hex"}) {
+        ExpectRun(Call("codec|encode|" + code + "|" + source + "|-o|" + text), kFine, "", "");
+        ExpectRun(Call("codec|decode|" + code + "|" + text), kFine, all, "");
+        ExpectRun(Call("codec|decode|" + code, "\xEF\xBB\xBF" + Get(text) + "\r\n"), kFine, all, "");
+    }
+    ExpectRun(Call("codec|decode|hex|-|--nibbles|low-first", "f1\n 1 0"), kFine, "\x1F\x01", "");
+    ExpectRun(Call("codec|decode|hex", "\xFE\xFF" + Utf16("4F4b", true)), kFine, "OK", "");
+    ExpectRun(Call("codec|encode|3f", std::string("\0\x0E", 2)), kFine, "\xC4\x81!\x01!!\n",
+              "1 of 2 bytes would come back changed, the first at offset 1");
+    ExpectRun(Call("codec|encode|3f|--strict|-o|" + text + "3f", "abc"), kBadInput, "", "3 bytes are a multiple of 3");
+    EXPECT_EQ(Get(text + "3f"), "(no file)");
+}
+
+TEST(ToolCodec, TellsThePlaceOfFaults) {
+    const std::string header = "\xCC\x86", unit = "\xE4\x80\x80", utf16 = "\xFF\xFE\x06\x03";
+    const struct {
+        const char* code;
+        std::string text, complaint;
+    } rows[] = {
+        {"3fff", "\xEF\xBB\xBFx", "1, at offset 3: U+0078 is no header: that is U+0301 to U+0307"},
+        {"3fff", header + unit + "a" + unit + unit, "3, at offset 5: U+0061 does not belong there"},
+        {"3fff", header + unit + unit + unit + '\n', "5, at offset 11: the text ends within a group of four units"},
+        {"3fff", header, "2, at offset 2: the text ends where a padded group belongs"},
+        {"3fff", header + unit + "\xE4\x80", "3, at offset 5: E4 80 is truncated"},
+        {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+1F600 belongs to no code"},
+        {"3fff", utf16 + "@", "2, at offset 4: the text ends within a unit"},
+        {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
+        {"3f", "\xC4\x82!%!!", "3, at offset 3: U+0025 does not belong there"},
+        {"hex", "4F 4", "5, at offset 4: the text ends within a byte"},
+    };
+    for (const auto& row : rows)
+        ExpectRun(Call("codec|decode|" + std::string(row.code), row.text), kBadInput, "", "unit " + row.complaint);
+}
+
+TEST(ToolCrc, GivesTheCheckValueOfEachName) {
+    const std::string digits = "123456789", json = Call("crc|--list|--json").output;
+    const auto valueOf = [&](const std::string& name) { // as the catalogues have it, not computed
+        const auto at = json.find("\"check\":", json.find("\"name\":\"" + name + '"')) + 9;
+        return json.substr(at, json.find('"', at) - at);
+    };
+    std::istringstream list(Call("crc|--list").output);
+    unsigned names = 0;
+    for (std::string name, meaning; list >> name && std::getline(list >> std::ws, meaning); ++names) {
+        const bool isAlias = meaning[0] != '-';
+        const std::string expected = valueOf(isAlias ? meaning : name) + "  -\n";
+        std::replace(meaning.begin(), meaning.end(), ' ', '|');
+        EXPECT_EQ(Call("crc|--name|" + name, digits).output, expected) << name;
+        EXPECT_EQ(Call("crc|" + (isAlias ? "--name|" + name : meaning), digits).output, expected) << name;
+    }
+    EXPECT_EQ(names, 32u);
+}
+
+TEST(ToolCrc, ReadsFilesAndNumbers) {
+    const Folder folder;
+    const std::string empty = folder.Put("empty", ""), large = folder.Put("large", std::string(3000000, 'x'));
+    ExpectRun(Call("crc|--name|crc-16|" + empty + "|no such file|" + large), kFileTrouble,
+              "0000  " + empty + "\n" + "cb0b  " + large + '\n', "no such file: does not exist");
+    ExpectRows("crc|", "",
+               {{"--name|crc-99", kUsage, "", "\"crc-99\" is no name"},
+                {"--width|8", kUsage, "", "--poly HEX"},
+                {"--name|crc-8|--refin", kUsage, "", "--name NAME alone"},
+                {"--width|8|--poly|107", kUsage, "", "\"107\" is no hexadecimal number of 8 bits"},
+                {"--width|8|--poly|0x", kUsage, "", "\"0x\" is no"}});
 }
 
 TEST(ToolUrl, EscapesAndNamesWhatIsNot) {

@@ -26,6 +26,11 @@ void Core() {
     Core::OS::_ffree(block);
     Is("null cannot be enlarged", Core::OS::_frealloc(nullptr, 8) == nullptr);
 
+    Develop::CHFLapse watch(L"watch");
+    watch.Stop();
+    Is("a stopwatch counts twice the time that it kept", watch.count_double() == 2 * watch.lapse_nano() / 1e9);
+    Instead("lapse_double tells the time", watch.lapse_double() == watch.lapse_nano() / 1e9);
+
     Develop::CMTRandom random;
     random.maxrnd(0xFFFFFFFF);
     random.seed(5489);

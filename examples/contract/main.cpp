@@ -27,10 +27,12 @@ int main() {
                  {"Memory", Memory},
                  {"Text", Text},
                  {"Pooled strings", PooledStrings},
+                 {"Bytes as text", BytesAsText},
                  {"XML", Xml},
                  {"Fractions", Fractions},
                  {"Timecode", Timecode},
                  {"Files", Files},
+                 {"URLs", Urls},
                  {"Threads", Threads},
                  {"Maintenance", Maintenance},
                  {"Components", Components}};

@@ -21,6 +21,21 @@ static CPXMLObject Named(const wchar_t* name) {
     return element;
 }
 
+static void TypedValues() {
+    CPXMLObject element = Named(L"a");
+    constexpr auto kNumber = 0x900000001ULL;
+    Is("no integer reader matches the writer", element.Set(kNumber) && element.GetDataLUInt() != kNumber);
+    Instead("decimal digits", element.Sprintf(L"%I64u", kNumber) && element.GetDataLUInt() == kNumber);
+    Is("Double reads the bits of a double's text", element.Set(1.5) && element.GetDataDouble() == 3);
+    Instead("EDouble", element.GetDataEDouble() == 1.5);
+    const unsigned char bytes[] = {0x12, 0xAB};
+    unsigned char read[2];
+    Is("bytes stand with the low half first", element.Set(bytes, 2) && element.IsData(L"21BA"));
+    Instead("GetDataBinary", element.GetDataBinary(read, 2) && read[0] == 0x12 && read[1] == 0xAB);
+    Is("beside children is no number", element.Set(L"42") && element.AddTag(L"b") && element.GetDataInt() == 0);
+    Instead("an attribute", element.AddAttribute(L"n", L"42") && element.FindAttributeInt(L"n") == 42);
+}
+
 void Xml() {
     Is("&lt; gives >, and every other name <", DataOf(L"<a>&lt;&gt;</a>") == L"><");
     Instead("CDATA, or decimal references", DataOf(L"<a><![CDATA[<]]>&#62;</a>") == L"<>");
@@ -66,6 +81,8 @@ void Xml() {
     Instead("the raw encoding", parent.Write(out, XMLEncodingUTF16Raw, false) &&
                                     again.OpenDocText(out, out.GetSize()) &&
                                     again.GetRootElement().IsData(L"\xD83D\xDE00"));
+
+    TypedValues();
 }
 
 } // namespace contract

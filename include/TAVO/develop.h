@@ -1,10 +1,11 @@
 #pragma once
-// Log lines, runtime assertions, result codes, clocks and random numbers.
+// Log lines, runtime assertions, result codes, clocks, the stopwatch and random numbers.
 // Threads: functions may be called from any thread; objects are for one thread at a time.
 
 #include <cstdarg>
 #include <TAVO/config.h>
 #include <TAVO/core.h>
+#include <TAVO/string.h> // the stopwatch keeps its name
 #include <type_traits>
 
 namespace TAVO {
@@ -67,6 +68,50 @@ TAVO_API unsigned long long _now_micro();
 TAVO_API unsigned long long _now_milli();
 /// Seconds since the process started, to the millisecond.
 TAVO_API double _getTicks();
+
+/// Stopwatch on the nanosecond clock that reports to the log: lines of level INFO whose category is the name, a dash
+/// and the time, as in "import - 12.34ms", without source and line. Nothing is formatted when nobody listens. A stopped
+/// watch keeps its time until the next Start, whatever else is called. One object is for one thread at a time.
+class TAVO_API CHFLapse {
+public:
+    /// A named watch runs from now; one whose name is null or empty stands at 0 and reports as "CHFLapse".
+    CHFLapse(const String::CPPoolString& name) noexcept;
+    CHFLapse(const CHFLapse&) = delete; // a copy would report the total twice
+    CHFLapse& operator=(const CHFLapse&) = delete;
+    /// A named watch that runs reports with the label "Total".
+    ~CHFLapse();
+
+    /// Runs from now on, from 0.
+    void Start() noexcept;
+    /// Stops and keeps the time since the start.
+    void Stop() noexcept;
+    /// Stops and reports. The label is a format with arguments as for _logWrite; null is empty. Of a name with more
+    /// than 490 units the line shows the beginning and may lack the time.
+    void Stop(const wchar_t* label, ...);
+    /// Reports the time since the start and runs on from that same start. A stopped watch reports and stays stopped.
+    void Lapse(const wchar_t* label, ...);
+
+    /// The time since the start, of a stopped watch the time kept: in seconds.
+    double lapse_double() const noexcept;
+    unsigned long long lapse_nano() const noexcept;
+    /// Rounded half up.
+    unsigned long long lapse_micro() const noexcept;
+    unsigned long long lapse_milli() const noexcept;
+
+    /// The watch's own word as a number of nanoseconds, and that is TWICE the time kept; of a running watch it says
+    /// nothing of use. Take lapse_double and its like. In seconds.
+    double count_double() const noexcept;
+    /// Rounded half up.
+    unsigned long long count_micro() const noexcept;
+    unsigned long long count_milli() const noexcept;
+
+private:
+    void Report(const wchar_t* label, std::va_list arguments) noexcept;
+
+    unsigned long long m_state = 0; // bit 0: runs; above it the start, or the time kept, in nanoseconds
+    String::CPPoolString m_name;
+};
+static_assert(sizeof(CHFLapse) == 16, "a stopwatch is its word and its name");
 
 /// True on a machine that stores the most significant byte first.
 TAVO_API bool _isBigEndian();

@@ -1,6 +1,6 @@
 #pragma once
 // Text: transcoding between UTF-8, UTF-16, UTF-32 and the ANSI code page, owned strings of one character set each,
-// utilities over wide text, and the pool of interned strings with its handles and arrays.
+// utilities over wide text, the pool of interned strings with its handles and arrays, and bytes as text.
 //
 // Wide characters have 16 bits and hold UTF-16, so every acfW function behaves as its UTF16 namesake.
 // Threads: the functions keep no state and may be called from any thread; an object is for one thread at a time.
@@ -640,6 +640,89 @@ public:
 private:
     const wchar_t* m_start;
     std::size_t m_count;
+};
+
+// --- Bytes as text -------------------------------------------------------------------------------------------------
+//
+// Two ways to carry bytes in a pooled string. Take 3FFF: it brings every block back, and needs fewer units.
+//
+//          bytes -> units of a group   header unit                units of the groups
+//   3F     3 -> 4, 6 bits in each      0100 + 3 - size % 3        0001 to 00FF
+//   3FFF   7 -> 4, 14 bits in each     0300 + 7 - size % 7        4000 to 7FFF
+//
+// A text is its header and its groups; size 0 is a header alone. The header tells how many bytes pad the last group,
+// where 3 (3F) and 7 (3FFF) stand for none. It is no encryption: there is no key.
+//
+// An encoder writes its text straight into the pool entry and keeps the bytes' address, so they must stay while it is
+// given to the pool again. It holds the null string when the bytes are null with a size above 0, or memory is out. A
+// decoder reads nothing behind the text's end and gives empty memory when it refuses the text or memory is out.
+// Encoded texts are pooled like all others: two whose lengths, first ten units and hashes agree are one entry, and 3FFF
+// has the same hash twice. Chance does not produce that, but the author of the bytes can.
+
+/// Bytes as 3F text, for hosts that have such texts; new ones take C3FFFEncoder.
+/// 3F does not bring every block back, and stays so, since stored texts depend on it: the decoder refuses every block
+/// whose size is a multiple of 3, and reads some bytes back changed (7,680 of the 65,536 blocks of two bytes, and most
+/// long ones). Units 1 to 4 and 11 to 14 (hexadecimal), which it uses, are not allowed in XML documents. It takes about
+/// 1.5 bytes of UTF-8 for each byte, 3FFF 1.7; of UTF-16 2.7, 3FFF 1.1.
+class TAVO_API C3FEncoder final : public IStringSubmitter {
+public:
+    C3FEncoder(const void* data, std::size_t size) noexcept;
+    C3FEncoder(const Buffers::CPPlainMemory& bytes) noexcept;
+    /// The encoded text.
+    operator CPPoolString() const noexcept { return m_text; }
+
+private:
+    std::size_t GetStringLen() override;
+    bool GetString(wchar_t* out) override;
+
+    CPPoolString m_text;
+    const void* m_data;
+    std::size_t m_size;
+};
+
+/// 3F text as bytes. Null, another header than 0100 to 0102, and a length that is not a multiple of 4 behind the header
+/// are refused with a log line; any units are taken. See C3FEncoder for what does not come back.
+class TAVO_API C3FDecoder final {
+public:
+    C3FDecoder(const wchar_t* text) noexcept;
+    C3FDecoder(const CPPoolString& text) noexcept;
+    /// The decoded bytes.
+    operator Buffers::CPPlainMemory() const noexcept { return m_bytes; }
+
+private:
+    Buffers::CPPlainMemory m_bytes;
+};
+
+/// Bytes as 3FFF text: 4 units for 7 bytes, every block comes back. Its header is a combining character and its units
+/// are assigned characters, so the text passes through XML documents and every encoding of Unicode.
+class TAVO_API C3FFFEncoder final : public IStringSubmitter {
+public:
+    C3FFFEncoder(const void* data, std::size_t size) noexcept;
+    C3FFFEncoder(const Buffers::CPPlainMemory& bytes) noexcept;
+    /// The encoded text.
+    operator CPPoolString() const noexcept { return m_text; }
+
+private:
+    std::size_t GetStringLen() override;
+    bool GetString(wchar_t* out) override;
+
+    CPPoolString m_text;
+    const void* m_data;
+    std::size_t m_size;
+};
+
+/// 3FFF text as bytes. Refused, without a log line, are null, another header than 0301 to 0307, padding without a
+/// group, a length that is not a multiple of 4 behind the header, and units outside 4000 to 7FFF. Padding bytes may
+/// hold anything.
+class TAVO_API C3FFFDecoder final {
+public:
+    C3FFFDecoder(const wchar_t* text) noexcept;
+    C3FFFDecoder(const CPPoolString& text) noexcept;
+    /// The decoded bytes.
+    operator Buffers::CPPlainMemory() const noexcept { return m_bytes; }
+
+private:
+    Buffers::CPPlainMemory m_bytes;
 };
 
 } // namespace String

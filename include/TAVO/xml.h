@@ -11,7 +11,11 @@
 // Threads: nodes carry no lock. Different handles of one node may be copied and released at once; a tree that several
 // threads use is for reading only.
 
+#include <TAVO/acfbase.h>
+#include <TAVO/math.h>
 #include <TAVO/string.h>
+#include <TAVO/timecode.h>
+#include <type_traits>
 
 namespace TAVO {
 namespace XML {
@@ -38,6 +42,43 @@ enum eXMLEncoding : std::uint32_t {
     XMLEncodingUTF16 = 2,     ///< host order; reading also takes swapped files with a mark
     XMLEncodingUTF16Raw = 3   ///< reading: a mark is required; writing: units are copied and never looked at
 };
+
+/// A name for one bit of a set of flags, or for several that belong together. A list of them is read and written in its
+/// order. Names without text and entries without bits name nothing.
+struct tagXMLFLAGMAP {
+    ulong32 flags;
+    const wchar_t* name; ///< without the separator that stands between names
+};
+
+namespace detail {
+
+// The kind of value that a type is, for the typed writers: only types that lose nothing on the way, and neither
+// pointers nor enumerations.
+template <class T, class = void> struct KindOfValue {};
+template <> struct KindOfValue<bool> { using Type = bool; };
+template <> struct KindOfValue<float> { using Type = double; };
+template <> struct KindOfValue<double> { using Type = double; };
+template <> struct KindOfValue<Math::CRational> { using Type = Math::CRational; };
+template <> struct KindOfValue<TimeCode::timecode> { using Type = TimeCode::timecode; };
+template <class T>
+struct KindOfValue<T, std::enable_if_t<std::is_integral<T>::value && std::is_unsigned<T>::value && sizeof(T) == 8>> {
+    using Type = unsigned long long;
+};
+template <class T> struct KindOfValue<T, std::enable_if_t<std::is_convertible<const T&, const _acfUID&>::value>> {
+    using Type = _acfUID; // also what wraps one
+};
+template <class T> using ValueKind = typename KindOfValue<T>::Type;
+
+// Numbers that no kind of value takes.
+template <class T, class = void> struct IsOtherNumber {
+    static constexpr bool value = std::is_arithmetic<T>::value || std::is_enum<T>::value;
+};
+template <class T> struct IsOtherNumber<T, std::enable_if_t<sizeof(ValueKind<T>) != 0>> {
+    static constexpr bool value = false;
+};
+template <class T> using OtherNumber = std::enable_if_t<IsOtherNumber<T>::value, int>;
+
+} // namespace detail
 
 /// Handle of an element.
 ///
@@ -208,6 +249,193 @@ public:
     /// The data of the first child with that name; empty when there is none.
     CPPoolString FindElementData(const CPPoolString& name) const noexcept;
 
+    // --- Typed values: writing ---
+    //
+    // Every writer makes a text of the value and then does what the writer of that text does. There is one for
+    // - unsigned 64-bit numbers: lower-case hexadecimal without prefix, 255 is "ff" (Hex reads the low 32 bits back);
+    // - float, double: the 64 bits of the double as such a number, then for people: "3ff8000000000000(1.5)";
+    // - bool: "true" or "false";
+    // - Math::CRational: numerator and denominator, "30000/1001"; "1/0" is the undefined value;
+    // - TimeCode::timecode: its exchange form, "10:00:00:00 {25/1}Hz";
+    // - _acfUID, ACF::cacfuid: upper case in groups, "15603CD4-AB81-4D6F-B05F-C6BEA760A789";
+    // - bytes and their number: two upper-case digits a byte, the low half FIRST, 12 AB is "21BA";
+    // - flags and a map: the names of the bits between separators, "0x%08x" for bits without a name.
+    // No locale takes part. What cannot be made a text (a null pointer to bytes; memory is out) fails and changes
+    // nothing.
+    //
+    // Other numbers do not compile: an int could mean "10" or "a", and an unsigned long would mean either by the
+    // system. Cast to unsigned long long for the form above, or pass CPPoolString(10) for decimal digits.
+
+    /// Sets the data.
+    template <class T, class Kind = detail::ValueKind<T>> bool Add(const T& value) noexcept {
+        return AddText(TextOf(static_cast<const Kind&>(value)));
+    }
+    /// Replaces the content by the data.
+    template <class T, class Kind = detail::ValueKind<T>> bool Set(const T& value) noexcept {
+        return SetText(TextOf(static_cast<const Kind&>(value)));
+    }
+    template <class T, class Kind = detail::ValueKind<T>>
+    bool AddAttribute(const CPPoolString& name, const T& value) noexcept {
+        return AddAttributeText(name, TextOf(static_cast<const Kind&>(value)));
+    }
+    template <class T, class Kind = detail::ValueKind<T>>
+    bool SetAttribute(const CPPoolString& name, const T& value) noexcept {
+        return SetAttributeText(name, TextOf(static_cast<const Kind&>(value)));
+    }
+    /// Appends a new child with that data.
+    template <class T, class Kind = detail::ValueKind<T>>
+    xmlret AddTag(const CPPoolString& name, const T& value) noexcept {
+        return AddTagText(name, TextOf(static_cast<const Kind&>(value)));
+    }
+    /// Replaces the content by one new child with that data.
+    template <class T, class Kind = detail::ValueKind<T>>
+    xmlret SetTag(const CPPoolString& name, const T& value) noexcept {
+        return SetTagText(name, TextOf(static_cast<const Kind&>(value)));
+    }
+
+    template <class T, detail::OtherNumber<T> = 0> bool Add(T) = delete;
+    template <class T, detail::OtherNumber<T> = 0> bool Set(T) = delete;
+    template <class T, detail::OtherNumber<T> = 0> bool AddAttribute(const CPPoolString&, T) = delete;
+    template <class T, detail::OtherNumber<T> = 0> bool SetAttribute(const CPPoolString&, T) = delete;
+    template <class T, detail::OtherNumber<T> = 0> xmlret AddTag(const CPPoolString&, T) = delete;
+    template <class T, detail::OtherNumber<T> = 0> xmlret SetTag(const CPPoolString&, T) = delete;
+
+    /// Bytes. No bytes are no text, so Add and Set are true and AddAttribute and SetAttribute false for them.
+    bool Add(const unsigned char* bytes, unsigned long long size) noexcept { return AddText(TextOf(bytes, size)); }
+    bool Set(const unsigned char* bytes, unsigned long long size) noexcept { return SetText(TextOf(bytes, size)); }
+    bool AddAttribute(const CPPoolString& name, const unsigned char* bytes, unsigned long long size) noexcept {
+        return AddAttributeText(name, TextOf(bytes, size));
+    }
+    bool SetAttribute(const CPPoolString& name, const unsigned char* bytes, unsigned long long size) noexcept {
+        return SetAttributeText(name, TextOf(bytes, size));
+    }
+    xmlret AddTag(const CPPoolString& name, const unsigned char* bytes, unsigned long long size) noexcept {
+        return AddTagText(name, TextOf(bytes, size));
+    }
+    xmlret SetTag(const CPPoolString& name, const unsigned char* bytes, unsigned long long size) noexcept {
+        return SetTagText(name, TextOf(bytes, size));
+    }
+
+    /// Flags: the names of all entries of the map whose bits are set and not yet named, then the other bits as a
+    /// number, also when no bit is set: "read;0x00000100". The separator must not be a hexadecimal digit or 'x'.
+    bool Add(ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator) noexcept {
+        return AddText(TextOf(flags, map, count, separator));
+    }
+    bool Set(ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator) noexcept {
+        return SetText(TextOf(flags, map, count, separator));
+    }
+    bool AddAttribute(const CPPoolString& name, ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count,
+                      wchar_t separator) noexcept {
+        return AddAttributeText(name, TextOf(flags, map, count, separator));
+    }
+    bool SetAttribute(const CPPoolString& name, ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count,
+                      wchar_t separator) noexcept {
+        return SetAttributeText(name, TextOf(flags, map, count, separator));
+    }
+    xmlret AddTag(const CPPoolString& name, ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count,
+                  wchar_t separator) noexcept {
+        return AddTagText(name, TextOf(flags, map, count, separator));
+    }
+    xmlret SetTag(const CPPoolString& name, ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count,
+                  wchar_t separator) noexcept {
+        return SetTagText(name, TextOf(flags, map, count, separator));
+    }
+
+    // --- Typed values: reading ---
+    //
+    // GetData reads the element's own data, FindElement the data of the first child of that name, FindAttribute the
+    // value of an attribute. The default is the answer when there is no such text and when it does not begin with a
+    // value of that type. What stands behind a value is not looked at, but where said.
+    //
+    // Numbers are read as C does it: blanks and one sign may lead, for Hex "0x" too; of too many digits the low bits of
+    // the result remain, and "-1" read as an unsigned number is the largest one. No locale takes part, but for the
+    // decimal point of Double.
+    //
+    // Int, UInt, LInt, LUInt, Hex, EDouble and Double give the default for an element that counts as one with children
+    // too, the others read its data.
+
+    /// Decimal, 32 bits signed and unsigned, 64 bits signed and unsigned; hexadecimal, 32 bits.
+    long32 GetDataInt(long32 fallback = 0) const noexcept;
+    ulong32 GetDataUInt(ulong32 fallback = 0) const noexcept;
+    long long GetDataLInt(long long fallback = 0) const noexcept;
+    unsigned long long GetDataLUInt(unsigned long long fallback = 0) const noexcept;
+    ulong32 GetDataHex(ulong32 fallback = 0) const noexcept;
+    /// Decimal, 64 bits unsigned: a count of 100 ns since 1601. (The writer of such numbers is hexadecimal; store a
+    /// file time with printf(L"%I64u").)
+    unsigned long long GetDataFileTime(unsigned long long fallback = 0) const noexcept;
+    /// Two decimal numbers around '/', blanks before each and before the '/', in lowest terms. "5/0" is the undefined
+    /// value 1/0 and not the default.
+    Math::CRational GetDataRational(const Math::CRational& fallback = Math::CRational()) const noexcept;
+    /// "true" or "false" in any case, and nothing else.
+    bool GetDataBool(bool fallback = false) const noexcept;
+    /// The double whose bits the writer stored; the readable part is not looked at.
+    double GetDataEDouble(double fallback = 0.0) const noexcept;
+    /// A decimal number of another writer: "-1.5e3", but neither "inf" nor "nan". Behind leading digits the decimal
+    /// point of the process's locale counts as '.', too (not behind blanks or a sign). Too large a number is infinity.
+    /// Of this library's own doubles it reads the digits of their bits as a decimal number: use EDouble.
+    double GetDataDouble(double fallback = 0.0) const noexcept;
+    /// An identifier by the rules of cacfuid::Set: text without exactly four '-' is the null identifier.
+    _acfUID GetDataGUID(const _acfUID& fallback = _acfUID()) const noexcept;
+    /// A timecode in its exchange form; flagged values read back as unassigned, and their default is for other texts.
+    TimeCode::timecode GetDataTimecode(const TimeCode::timecode& fallback = TimeCode::timecode()) const noexcept;
+    /// The position of the whole data among the tokens of the list, the first one being 0.
+    std::size_t GetDataIndex(const wchar_t* list, wchar_t separator,
+                             std::size_t fallback = Buffers::NotFound) const noexcept;
+    /// Flags as their writer wrote them: names and "0x" numbers of up to eight digits, blanks not skipped. The default
+    /// for any other token.
+    ulong32 GetDataFlags(const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator,
+                         ulong32 fallback = 0) const noexcept;
+    /// The number of bytes that the data stands for: 0 unless it is an even number of hexadecimal digits of either
+    /// case, all read.
+    unsigned long long GetDataBinarySize() const noexcept;
+    /// The bytes, the low half of each first. False, and the buffer untouched, when there are none or more than
+    /// @p capacity.
+    bool GetDataBinary(unsigned char* buffer, unsigned long long capacity) const noexcept;
+
+    long32 FindElementInt(const CPPoolString& name, long32 fallback = 0) const noexcept;
+    ulong32 FindElementUInt(const CPPoolString& name, ulong32 fallback = 0) const noexcept;
+    long long FindElementLInt(const CPPoolString& name, long long fallback = 0) const noexcept;
+    unsigned long long FindElementLUInt(const CPPoolString& name, unsigned long long fallback = 0) const noexcept;
+    ulong32 FindElementHex(const CPPoolString& name, ulong32 fallback = 0) const noexcept;
+    unsigned long long FindElementFileTime(const CPPoolString& name, unsigned long long fallback = 0) const noexcept;
+    Math::CRational FindElementRational(const CPPoolString& name,
+                                        const Math::CRational& fallback = Math::CRational()) const noexcept;
+    bool FindElementBool(const CPPoolString& name, bool fallback = false) const noexcept;
+    double FindElementEDouble(const CPPoolString& name, double fallback = 0.0) const noexcept;
+    double FindElementDouble(const CPPoolString& name, double fallback = 0.0) const noexcept;
+    _acfUID FindElementGUID(const CPPoolString& name, const _acfUID& fallback = _acfUID()) const noexcept;
+    TimeCode::timecode FindElementTimecode(const CPPoolString& name,
+                                           const TimeCode::timecode& fallback = TimeCode::timecode()) const noexcept;
+    std::size_t FindElementIndex(const CPPoolString& name, const wchar_t* list, wchar_t separator,
+                                 std::size_t fallback = Buffers::NotFound) const noexcept;
+    ulong32 FindElementFlags(const CPPoolString& name, const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator,
+                             ulong32 fallback = 0) const noexcept;
+    /// The data itself.
+    CPPoolString FindElementString(const CPPoolString& name,
+                                   const CPPoolString& fallback = CPPoolString::pempty) const noexcept;
+
+    long32 FindAttributeInt(const CPPoolString& name, long32 fallback = 0) const noexcept;
+    ulong32 FindAttributeUInt(const CPPoolString& name, ulong32 fallback = 0) const noexcept;
+    long long FindAttributeLInt(const CPPoolString& name, long long fallback = 0) const noexcept;
+    unsigned long long FindAttributeLUInt(const CPPoolString& name, unsigned long long fallback = 0) const noexcept;
+    ulong32 FindAttributeHex(const CPPoolString& name, ulong32 fallback = 0) const noexcept;
+    unsigned long long FindAttributeFileTime(const CPPoolString& name, unsigned long long fallback = 0) const noexcept;
+    Math::CRational FindAttributeRational(const CPPoolString& name,
+                                          const Math::CRational& fallback = Math::CRational()) const noexcept;
+    bool FindAttributeBool(const CPPoolString& name, bool fallback = false) const noexcept;
+    double FindAttributeEDouble(const CPPoolString& name, double fallback = 0.0) const noexcept;
+    double FindAttributeDouble(const CPPoolString& name, double fallback = 0.0) const noexcept;
+    _acfUID FindAttributeGUID(const CPPoolString& name, const _acfUID& fallback = _acfUID()) const noexcept;
+    TimeCode::timecode FindAttributeTimecode(const CPPoolString& name,
+                                             const TimeCode::timecode& fallback = TimeCode::timecode()) const noexcept;
+    std::size_t FindAttributeIndex(const CPPoolString& name, const wchar_t* list, wchar_t separator,
+                                   std::size_t fallback = Buffers::NotFound) const noexcept;
+    ulong32 FindAttributeFlags(const CPPoolString& name, const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator,
+                               ulong32 fallback = 0) const noexcept;
+    /// The value itself.
+    CPPoolString FindAttributeString(const CPPoolString& name,
+                                     const CPPoolString& fallback = CPPoolString::pempty) const noexcept;
+
     // --- Searching ---
     //
     // Searches give a slot among the children of an element, or null; it is valid until those children change.
@@ -281,6 +509,24 @@ private:
     bool addAttribute(const CPPoolString& name, const CPPoolString& value) noexcept;
     bool deleteAttribute(const CPPoolString& name) noexcept;
     static std::size_t getIndex(const CPPoolString& name, const wchar_t* list, wchar_t separator) noexcept;
+    static std::size_t IndexOf(const CPPoolString* text, const wchar_t* list, wchar_t separator,
+                               std::size_t fallback) noexcept;
+
+    // The texts of values; the null string where there is none, which the operations below refuse.
+    static CPPoolString TextOf(unsigned long long value) noexcept;
+    static CPPoolString TextOf(double value) noexcept;
+    static CPPoolString TextOf(bool value) noexcept;
+    static CPPoolString TextOf(const Math::CRational& value) noexcept;
+    static CPPoolString TextOf(const TimeCode::timecode& value) noexcept;
+    static CPPoolString TextOf(const _acfUID& value) noexcept;
+    static CPPoolString TextOf(const unsigned char* bytes, unsigned long long size) noexcept;
+    static CPPoolString TextOf(ulong32 flags, const tagXMLFLAGMAP* map, std::size_t count, wchar_t separator) noexcept;
+    bool AddText(const CPPoolString& text) noexcept;
+    bool SetText(const CPPoolString& text) noexcept;
+    bool AddAttributeText(const CPPoolString& name, const CPPoolString& text) noexcept;
+    bool SetAttributeText(const CPPoolString& name, const CPPoolString& text) noexcept;
+    xmlret AddTagText(const CPPoolString& name, const CPPoolString& text) noexcept;
+    xmlret SetTagText(const CPPoolString& name, const CPPoolString& text) noexcept;
 
     bool ReplaceAt(const CPXMLObject& child, std::size_t index) noexcept;
     bool DeleteAt(std::size_t index) noexcept;

@@ -77,16 +77,22 @@ void FormatPrefix(wchar_t* out, double seconds, const wchar_t* label, const wcha
         FormatWide(out, kPrefixUnits, L"%8.3f [%ls] [%ls] [] ", seconds, label, category);
 }
 
-void _logWrite(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line, const wchar_t* format,
-               ...) {
+bool IsLogHeard() noexcept { return g_logger.load().call || Platform::IsDebuggerAttached(); }
+
+void WriteLog(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line, const wchar_t* format,
+              std::va_list arguments) {
     const Logger logger = g_logger;
-    if (!logger.call && !Platform::IsDebuggerAttached()) return;
-    std::va_list arguments;
-    va_start(arguments, format);
     if (logger.call)
         CallLogger(logger, level, category, source, line, format, arguments);
-    else
+    else if (Platform::IsDebuggerAttached())
         WriteLine(level, category, source, line, format, arguments);
+}
+
+void _logWrite(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line, const wchar_t* format,
+               ...) {
+    std::va_list arguments;
+    va_start(arguments, format);
+    WriteLog(level, category, source, line, format, arguments);
     va_end(arguments);
 }
 

@@ -17,6 +17,12 @@ const wchar_t* FindLevelLabel(_acfDebugLevel level) noexcept;
 void FormatPrefix(wchar_t* out, double seconds, const wchar_t* label, const wchar_t* category, const char* source,
                   long32 line) noexcept;
 
+// Whether a line would arrive anywhere.
+bool IsLogHeard() noexcept;
+// _logWrite with its arguments in a list.
+void WriteLog(_acfDebugLevel level, const wchar_t* category, const char* source, long32 line, const wchar_t* format,
+              std::va_list arguments);
+
 // Lets one thread show boxes at a time; that thread may show a nested one, since a box runs the host's message
 // handlers.
 using AssertionLock = RecursiveLock;

@@ -62,9 +62,12 @@ template <std::size_t lane, bool high> TAVO_INLINE Block Interleave(Block a, Blo
     if constexpr (lane == 4) return high ? _mm_unpackhi_epi32(a, b) : _mm_unpacklo_epi32(a, b);
     return high ? _mm_unpackhi_epi64(a, b) : _mm_unpacklo_epi64(a, b);
 }
-// Bytes of two blocks of 16-bit units below 100, in order.
+// Bytes of two blocks of 16-bit units, in order; of units from 100 up 255, from 8000 up 0 or 255.
 TAVO_INLINE Block Narrow(Block a, Block b) { return _mm_packus_epi16(a, b); }
+TAVO_INLINE Block Add16(Block a, Block b) { return _mm_add_epi16(a, b); }
 TAVO_INLINE Block Subtract16(Block a, Block b) { return _mm_sub_epi16(a, b); }
+template <int bits> TAVO_INLINE Block ShiftLeft64(Block a) { return _mm_slli_epi64(a, bits); }
+template <int bits> TAVO_INLINE Block ShiftRight64(Block a) { return _mm_srli_epi64(a, bits); }
 TAVO_INLINE Block HighHalf(Block a) { return _mm_srli_si128(a, 8); }
 // The bytes moved to higher or lower places, zeros behind them.
 template <int places> TAVO_INLINE Block MoveUp(Block a) { return _mm_slli_si128(a, places); }
@@ -182,8 +185,17 @@ inline Block Below8(Block a, Block b) {
 inline Block Subtract8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x - y; });
 }
+inline Block Add16(Block a, Block b) {
+    return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x + y; });
+}
 inline Block Subtract16(Block a, Block b) {
     return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x - y; });
+}
+template <int bits> Block ShiftLeft64(Block a) {
+    return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x << bits; });
+}
+template <int bits> Block ShiftRight64(Block a) {
+    return detail::Map<std::uint64_t>(a, a, [](std::uint64_t x, std::uint64_t) { return x >> bits; });
 }
 inline Block Pair(std::uint64_t low, std::uint64_t high) {
     Block x;
@@ -239,10 +251,15 @@ template <std::size_t lane, bool high> Block Interleave(Block a, Block b) {
 }
 inline Block Narrow(Block a, Block b) {
     Block x;
+    const auto byte = [](const std::uint8_t* unit) -> std::uint8_t { return unit[1] ? 0xFF : unit[0]; };
+    for (int i = 0; i < 8; ++i) x.b[i] = byte(a.b + i * 2), x.b[i + 8] = byte(b.b + i * 2);
+    return x;
+}
+inline Block PackSigned(Block a, Block b) {
+    Block x;
     for (int i = 0; i < 8; ++i) x.b[i] = a.b[i * 2], x.b[i + 8] = b.b[i * 2];
     return x;
 }
-inline Block PackSigned(Block a, Block b) { return Narrow(a, b); }
 inline std::uint64_t LowHalf(Block a) {
     std::uint64_t half;
     std::memcpy(&half, &a, sizeof half);
@@ -306,6 +323,18 @@ TAVO_INLINE void StorePart(void* to, Block x, std::size_t count) {
     } else if (count == 1) {
         detail::Write<std::uint8_t>(p, low);
     }
+}
+
+// The bytes (by Narrow) of the first 16 units of a zero-terminated text; those behind the terminator may be anything.
+// What lies there is read, but for a page of which the text has nothing; sanitizers, which count bytes and not pages,
+// are kept out.
+TAVO_NOSANITIZE inline Block NarrowText(const wchar_t* text) {
+    constexpr std::uintptr_t kPage = 4096, kBytes = 2 * kBlock;
+    if (TAVO_LIKELY((reinterpret_cast<std::uintptr_t>(text) & (kPage - 1)) <= kPage - kBytes))
+        return Narrow(Load(text), Load(text + 8));
+    wchar_t copy[kBlock] = {};
+    for (std::size_t i = 0; i < kBlock && text[i]; ++i) copy[i] = text[i];
+    return Narrow(Load(copy), Load(copy + 8));
 }
 
 // Set bits, without the processor's instruction, which the baseline lacks.

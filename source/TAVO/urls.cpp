@@ -1,5 +1,6 @@
 // URLs: escaping, and the URLs of local paths.
 
+#include "numberscan.h"
 #include "scratch.h"
 #include "transcoding.h"
 
@@ -46,17 +47,6 @@ ByteSet Kept(Bytes extra) {
     return set;
 }
 
-constexpr std::uint8_t kNoDigit = 0xFF;
-
-// The values of hexadecimal digits in any case.
-constexpr std::array<std::uint8_t, 256> kDigitValues = [] {
-    std::array<std::uint8_t, 256> table{};
-    table.fill(kNoDigit);
-    for (unsigned i = 0; i < 10; ++i) table['0' + i] = static_cast<std::uint8_t>(i);
-    for (unsigned i = 0; i < 6; ++i) table['A' + i] = table['a' + i] = static_cast<std::uint8_t>(10 + i);
-    return table;
-}();
-
 // Both digits of every byte.
 constexpr std::array<std::array<char, 2>, 256> kDigits = [] {
     constexpr const char* kHex = "0123456789ABCDEF";
@@ -69,10 +59,10 @@ constexpr std::array<std::array<char, 2>, 256> kDigits = [] {
 // nothing behind a terminator is.
 TAVO_INLINE int Escaped(Bytes text) {
     if (*text != '%') return -1;
-    const unsigned high = kDigitValues[text[1]];
-    if (high == kNoDigit) return -1;
-    const unsigned low = kDigitValues[text[2]];
-    return low == kNoDigit ? -1 : static_cast<int>(high << 4 | low);
+    const unsigned high = numberscan::DigitOf(text[1]);
+    if (high == numberscan::kNoDigit) return -1;
+    const unsigned low = numberscan::DigitOf(text[2]);
+    return low == numberscan::kNoDigit ? -1 : static_cast<int>(high << 4 | low);
 }
 
 // --- Sixteen bytes at a time -----------------------------------------------------------------------------------------

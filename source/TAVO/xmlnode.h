@@ -59,6 +59,14 @@ inline Node& NodeOf(tagCPOMEMHEADER* block) { return *reinterpret_cast<Node*>(bl
 // Requires: a live handle.
 inline Node& NodeOf(const CPXMLObject& element) { return *Buffers::Block::PayloadOf<Node>(element); }
 inline bool IsLive(const CPXMLObject& element) { return Buffers::Block::Of(element) != nullptr; }
+// The node of a live handle, or of one that is live and named; else null.
+inline Node* LiveNode(const CPXMLObject& element) { return IsLive(element) ? &NodeOf(element) : nullptr; }
+inline Node* NamedNode(const CPXMLObject& element) {
+    Node* node = LiveNode(element);
+    return node && node->name.isdef() ? node : nullptr;
+}
+// Null for a null node and when there is none of that name.
+const Attribute* FindAttributeOf(const Node* node, const CPPoolString& name) noexcept;
 
 // The types of the two kinds of arrays.
 extern const Buffers::tagCPOVTABL g_attributesTable;

@@ -111,13 +111,6 @@ CPPoolString Formatted(const wchar_t* format, std::va_list arguments) {
 
 // --- Nodes ---
 
-Node* LiveNode(const CPXMLObject& element) { return IsLive(element) ? &NodeOf(element) : nullptr; }
-
-Node* NamedNode(const CPXMLObject& element) {
-    Node* node = LiveNode(element);
-    return node && node->name.isdef() ? node : nullptr;
-}
-
 bool HasContent(const Node& node) { return node.attributes.key() || node.elements.key() || node.data.isdef(); }
 
 CPXMLObject NewElement(const CPPoolString& name, const CPPoolString& data) {
@@ -132,18 +125,12 @@ CPXMLObject NewElement(const CPPoolString& name, const CPPoolString& data) {
     return NodeAccess::Adopt(block);
 }
 
-std::size_t FindAttributeIndex(const Node& node, const CPPoolString& name) {
+std::size_t IndexOfAttribute(const Node& node, const CPPoolString& name) {
     const Attribute* attributes = Attributes::First(node.attributes);
     const std::size_t count = Attributes::Count(node.attributes);
     for (std::size_t i = 0; i < count; ++i)
         if (attributes[i].name == name) return i;
     return NotFound;
-}
-
-const Attribute* FindAttributeOf(const Node* node, const CPPoolString& name) {
-    if (!node) return nullptr;
-    const std::size_t index = FindAttributeIndex(*node, name);
-    return index == NotFound ? nullptr : Attributes::First(node->attributes) + index;
 }
 
 // --- Children ---
@@ -255,6 +242,12 @@ constinit const tagCPOVTABL g_attributesTable = {CreateAll<Attribute>, CloneAll<
                                                  NoInterface};
 constinit const tagCPOVTABL g_elementsTable = {CreateAll<CPXMLObject>, CloneAll<CPXMLObject>, FinalizeAll<CPXMLObject>,
                                                NoInterface};
+
+const Attribute* FindAttributeOf(const Node* node, const CPPoolString& name) noexcept {
+    if (!node) return nullptr;
+    const std::size_t index = IndexOfAttribute(*node, name);
+    return index == NotFound ? nullptr : Attributes::First(node->attributes) + index;
+}
 
 tagCPOMEMHEADER* NewNode() noexcept {
     tagCPOMEMHEADER* block = Block::NewBlock(sizeof(Node), sizeof(Node), &CPXMLObject::_vtbl);
@@ -405,14 +398,14 @@ bool CPXMLObject::AddAttribute(const CPPoolString& name, const wchar_t* value) n
 
 bool CPXMLObject::deleteAttribute(const CPPoolString& name) noexcept {
     Node* node = NamedNode(*this);
-    const std::size_t index = node ? FindAttributeIndex(*node, name) : NotFound;
+    const std::size_t index = node ? IndexOfAttribute(*node, name) : NotFound;
     if (index != NotFound) Attributes::Remove(node->attributes, index);
     return true;
 }
 
 bool CPXMLObject::SetAttribute(const CPPoolString& name, const CPPoolString& value) noexcept {
     Node* node = NamedNode(*this);
-    const std::size_t index = node ? FindAttributeIndex(*node, name) : NotFound;
+    const std::size_t index = node ? IndexOfAttribute(*node, name) : NotFound;
     if (index == NotFound || !value.isdef()) return deleteAttribute(name) && AddAttribute(name, value);
     // The same without an allocation: the pair moves to the end.
     Attribute* attributes = Attributes::First(node->attributes);
@@ -424,8 +417,7 @@ bool CPXMLObject::SetAttribute(const CPPoolString& name, const CPPoolString& val
 }
 
 bool CPXMLObject::SetAttribute(const CPPoolString& name, const wchar_t* value) noexcept {
-    const CPPoolString text = Interned(value);
-    return !text.isnull() && SetAttribute(name, text);
+    return SetAttributeText(name, Interned(value));
 }
 
 bool CPXMLObject::DeleteAttribute(const CPPoolString& name) noexcept {
@@ -469,7 +461,7 @@ bool CPXMLObject::MergeAttributes(const CPXMLObject& other, bool overwrite) noex
     if (!node) return false;
     for (std::size_t i = 0; i < count; ++i) {
         const Attribute& theirs = Attributes::First(NodeOf(other).attributes)[i];
-        const std::size_t index = FindAttributeIndex(*node, theirs.name);
+        const std::size_t index = IndexOfAttribute(*node, theirs.name);
         if (index == NotFound) {
             if (!Attributes::Append(node->attributes, Attribute(theirs))) return false;
         } else if (overwrite) {
@@ -514,8 +506,7 @@ xmlret CPXMLObject::AddTag(const CPPoolString& name, const CPPoolString& value) 
 }
 
 xmlret CPXMLObject::AddTag(const CPPoolString& name, const wchar_t* value) noexcept {
-    const CPPoolString text = Interned(value);
-    return text.isnull() ? Failed() : AddTag(name, text);
+    return AddTagText(name, Interned(value));
 }
 
 xmlret CPXMLObject::SetTag(const CPPoolString& name, const CPPoolString& value) noexcept {
@@ -526,8 +517,7 @@ xmlret CPXMLObject::SetTag(const CPPoolString& name, const CPPoolString& value) 
 }
 
 xmlret CPXMLObject::SetTag(const CPPoolString& name, const wchar_t* value) noexcept {
-    const CPPoolString text = Interned(value);
-    return text.isnull() ? Failed() : SetTag(name, text);
+    return SetTagText(name, Interned(value));
 }
 
 xmlret CPXMLObject::Insert(const CPXMLObject& child, std::size_t index) noexcept {
@@ -646,10 +636,7 @@ bool CPXMLObject::Add(const CPPoolString& text) noexcept {
     return true;
 }
 
-bool CPXMLObject::Add(const wchar_t* text) noexcept {
-    const CPPoolString interned = Interned(text);
-    return !interned.isnull() && Add(interned);
-}
+bool CPXMLObject::Add(const wchar_t* text) noexcept { return AddText(Interned(text)); }
 
 bool CPXMLObject::Set(const CPXMLObject& child) noexcept {
     const CPXMLObject kept(child); // it may be one of the children
@@ -658,10 +645,7 @@ bool CPXMLObject::Set(const CPXMLObject& child) noexcept {
 
 bool CPXMLObject::Set(const CPPoolString& text) noexcept { return DeleteContent() && Add(text); }
 
-bool CPXMLObject::Set(const wchar_t* text) noexcept {
-    const CPPoolString interned = Interned(text);
-    return !interned.isnull() && Set(interned);
-}
+bool CPXMLObject::Set(const wchar_t* text) noexcept { return SetText(Interned(text)); }
 
 // Intended (xml-content-empty): empty always. A textbook would give the element's inner text; callers that want the
 // data ask GetData.
@@ -672,6 +656,28 @@ CPXMLObject::CPPoolString CPXMLObject::FindElementData(const CPPoolString& name)
     return found ? NodeOf(*found).data : CPPoolString::pempty;
 }
 
+// --- Text that was made for an operation: the null string means that it could not be, and changes nothing -----------
+
+bool CPXMLObject::AddText(const CPPoolString& text) noexcept { return !text.isnull() && Add(text); }
+
+bool CPXMLObject::SetText(const CPPoolString& text) noexcept { return !text.isnull() && Set(text); }
+
+bool CPXMLObject::AddAttributeText(const CPPoolString& name, const CPPoolString& text) noexcept {
+    return AddAttribute(name, text); // no value is refused there
+}
+
+bool CPXMLObject::SetAttributeText(const CPPoolString& name, const CPPoolString& text) noexcept {
+    return !text.isnull() && SetAttribute(name, text);
+}
+
+xmlret CPXMLObject::AddTagText(const CPPoolString& name, const CPPoolString& text) noexcept {
+    return text.isnull() ? Failed() : AddTag(name, text);
+}
+
+xmlret CPXMLObject::SetTagText(const CPPoolString& name, const CPPoolString& text) noexcept {
+    return text.isnull() ? Failed() : SetTag(name, text);
+}
+
 // --- Formatted text ------------------------------------------------------------------------------------------------
 
 bool CPXMLObject::printf(const wchar_t* format, ...) noexcept {
@@ -679,7 +685,7 @@ bool CPXMLObject::printf(const wchar_t* format, ...) noexcept {
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return !text.isnull() && Add(text);
+    return AddText(text);
 }
 
 bool CPXMLObject::Sprintf(const wchar_t* format, ...) noexcept {
@@ -687,7 +693,7 @@ bool CPXMLObject::Sprintf(const wchar_t* format, ...) noexcept {
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return !text.isnull() && Set(text);
+    return SetText(text);
 }
 
 bool CPXMLObject::printfAttribute(const CPPoolString& name, const wchar_t* format, ...) noexcept {
@@ -695,7 +701,7 @@ bool CPXMLObject::printfAttribute(const CPPoolString& name, const wchar_t* forma
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return AddAttribute(name, text);
+    return AddAttributeText(name, text);
 }
 
 bool CPXMLObject::SprintfAttribute(const CPPoolString& name, const wchar_t* format, ...) noexcept {
@@ -703,7 +709,7 @@ bool CPXMLObject::SprintfAttribute(const CPPoolString& name, const wchar_t* form
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return !text.isnull() && SetAttribute(name, text);
+    return SetAttributeText(name, text);
 }
 
 xmlret CPXMLObject::printfTag(const CPPoolString& name, const wchar_t* format, ...) noexcept {
@@ -711,7 +717,7 @@ xmlret CPXMLObject::printfTag(const CPPoolString& name, const wchar_t* format, .
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return text.isnull() ? Failed() : AddTag(name, text);
+    return AddTagText(name, text);
 }
 
 xmlret CPXMLObject::SprintfTag(const CPPoolString& name, const wchar_t* format, ...) noexcept {
@@ -719,7 +725,7 @@ xmlret CPXMLObject::SprintfTag(const CPPoolString& name, const wchar_t* format, 
     va_start(arguments, format);
     const CPPoolString text = Formatted(format, arguments);
     va_end(arguments);
-    return text.isnull() ? Failed() : SetTag(name, text);
+    return SetTagText(name, text);
 }
 
 // --- Searching -----------------------------------------------------------------------------------------------------

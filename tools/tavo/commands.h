@@ -20,6 +20,7 @@ int Tree(const TreeOptions& options);
 
 struct GetOptions {
     std::string file, path, attribute;
+    std::string type; // one of ValueTypeNames; empty for the text as it is
 };
 int Get(const GetOptions& options);
 
@@ -115,6 +116,28 @@ struct IdTextOptions {
 };
 int IdParse(const IdTextOptions& options);
 int IdFormat(const IdTextOptions& options);
+
+struct CodecOptions {
+    std::string code; // one of CodecNames
+    std::string file = "-", output = "-";
+    std::string nibbles = "high-first"; // one of NibbleOrders, for hex
+    bool strict = false;                // encoding what would not come back writes nothing
+};
+int CodecEncode(const CodecOptions& options);
+int CodecDecode(const CodecOptions& options);
+
+std::vector<std::string> CodecNames();
+std::vector<std::string> NibbleOrders();
+
+// A name, or width and polynomial; the numbers are hexadecimal.
+struct CrcOptions {
+    std::vector<std::string> files; // none: standard input
+    std::string name, polynomial, initial, xorOut;
+    unsigned width = 0;
+    bool reflectIn = false, reflectOut = false;
+    bool list = false, json = false;
+};
+int Crc(const CrcOptions& options);
 
 struct UrlTextOptions {
     std::vector<std::string> texts;

@@ -2,6 +2,7 @@
 
 #include "commands.h"
 #include "facts.h"
+#include "faults.h"
 #include "position.h"
 #include "streams.h"
 #include "text.h"
@@ -36,14 +37,6 @@ struct Identifier {
     cacfuid value;
     std::string reason; // names the character; empty for an identifier
 };
-
-std::string Misplaced(const std::string& text, std::size_t at, const std::string& wanted) {
-    const std::string place = "character " + std::to_string(at + 1);
-    if (at >= text.size()) return "it ends where " + place + ", " + wanted + ", belongs";
-    std::size_t end = at + 1;
-    while (end < text.size() && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) ++end;
-    return place + " is " + Named(text.substr(at, end - at)) + ", where " + wanted + " belongs";
-}
 
 // The text form in any case, also in braces, or its digits alone. Stricter than the library, which takes much else.
 Identifier ReadIdentifier(const std::string& text) {
@@ -110,6 +103,16 @@ Facts Spellings(const cacfuid& id) {
 }
 
 } // namespace
+
+std::string Misplaced(const std::string& text, std::size_t at, const std::string& wanted) {
+    const std::string place = "character " + std::to_string(at + 1);
+    if (at >= text.size()) return "it ends where " + place + ", " + wanted + ", belongs";
+    std::size_t end = at + 1;
+    while (end < text.size() && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) ++end;
+    return place + " is " + Named(text.substr(at, end - at)) + ", where " + wanted + " belongs";
+}
+
+std::string IdentifierFault(const std::string& text) { return ReadIdentifier(text).reason; }
 
 int IdNew(const IdNewOptions& options) {
     std::vector<std::string> rows;

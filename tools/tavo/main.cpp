@@ -5,6 +5,7 @@
 #include "encodings.h"
 #include "reference.h"
 #include "streams.h"
+#include "value.h"
 
 #include <CLI/CLI.hpp>
 #include <functional>
@@ -62,6 +63,9 @@ void AddXmlCommands(CLI::App& xml, Action& action) {
     command->add_option("PATH", get.path, kPathHelp)->required()->type_name("");
     command->add_option("--attribute", get.attribute, "the attribute of this name instead of the text")
         ->type_name("NAME");
+    command->add_option("--as", get.type, "the value that the library's readers of this type find in the text")
+        ->check(CLI::IsMember(ValueTypeNames()))
+        ->type_name("TYPE");
 
     command = xml.add_subcommand("set", "Changes the text of an element, or an attribute, and writes the document");
     auto& set = Add<SetOptions>(*command, action, Set);
@@ -179,6 +183,52 @@ void AddIdCommands(CLI::App& id, Action& action) {
     addTexts("format", "Shows the ways to write an identifier", IdFormat);
 }
 
+void AddCodecCommands(CLI::App& codec, Action& action) {
+    codec.require_subcommand(1);
+    const auto add = [&](const char* name, const char* does, const char* fileHelp, int (*run)(const CodecOptions&)) {
+        auto* command = codec.add_subcommand(name, does);
+        auto& options = Add<CodecOptions>(*command, action, run);
+        command->add_option("CODE", options.code, "3f, 3fff or hex")
+            ->required()
+            ->check(CLI::IsMember(CodecNames()).description(""))
+            ->type_name("");
+        command->add_option("FILE", options.file, fileHelp)->type_name("");
+        command->add_option("-o,--output", options.output, "where to write; - is standard output, the default")
+            ->type_name("FILE");
+        command
+            ->add_option("--nibbles", options.nibbles,
+                         "which digit of a byte comes first in hex: high-first (the default), or low-first as the "
+                         "library writes bytes into XML")
+            ->check(CLI::IsMember(NibbleOrders()).description(""))
+            ->type_name("ORDER");
+        return std::pair(command, &options);
+    };
+    const auto [encode, options] =
+        add("encode", "Writes bytes as text", "any file; - is standard input, the default", CodecEncode);
+    encode->add_flag("--strict", options->strict, "write nothing when the bytes would not come back from 3f");
+    add("decode", "Writes the bytes of a text",
+        "UTF-8, or UTF-16 or UTF-32 with a mark; - is standard input, the default", CodecDecode);
+}
+
+void AddCrc(CLI::App& command, Action& action) {
+    auto& crc = Add<CrcOptions>(command, action, Crc);
+    command.add_option("FILE", crc.files, "any files; - is standard input, the default")->type_name("");
+    const auto addHex = [&](const char* option, std::string& text, const char* help) {
+        command.add_option(option, text, help)->type_name("HEX");
+    };
+    command.add_option("--name", crc.name, "a checksum by its name, such as crc-32")->type_name("NAME");
+    command.add_option("--width", crc.width, "or by its numbers: its bits, 1 to 64")
+        ->check(CLI::Range(1, 64).description(""))
+        ->type_name("BITS");
+    addHex("--poly", crc.polynomial, "its polynomial without the top bit, the highest power first");
+    addHex("--init", crc.initial, "the value it begins with; 0 without");
+    addHex("--xorout", crc.xorOut, "what is combined with the result; 0 without");
+    command.add_flag("--refin", crc.reflectIn, "take the lowest bit of each byte first");
+    command.add_flag("--refout", crc.reflectOut, "turn the result round, before --xorout");
+    command.add_flag("--list", crc.list, "list the names, with the options that they stand for");
+    AddJson(command, crc.json);
+}
+
 void AddUrlCommands(CLI::App& url, Action& action) {
     url.require_subcommand(1);
     const auto add = [&](const char* name, const char* does, const char* what, const char* help,
@@ -265,6 +315,8 @@ void AddCommands(CLI::App& app, Action& action) {
     AddTimecodeCommands(*app.add_subcommand("tc", "Timecode: systems and positions"), action);
     AddRationalCommands(*app.add_subcommand("rational", "Fractions"), action);
     AddIdCommands(*app.add_subcommand("id", "Component identifiers"), action);
+    AddCodecCommands(*app.add_subcommand("codec", "Bytes as text"), action);
+    AddCrc(*app.add_subcommand("crc", "Tells the checksums of files"), action);
     AddUrlCommands(*app.add_subcommand("url", "URLs: escaping, and those of paths"), action);
     AddTextCommands(*app.add_subcommand("text", "Encodings of texts"), action);
     app.add_subcommand("about", "Tells version, process and configuration")->callback([&] { action = About; });
@@ -272,8 +324,9 @@ void AddCommands(CLI::App& app, Action& action) {
 }
 
 int Run(std::vector<std::string> arguments) {
-    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode, makes\n"
-                 "identifiers, escapes URLs and recodes texts, with the library TAVO.\n"
+    CLI::App app("Reads, shows, changes, checks and measures XML, computes timecode and checksums,\n"
+                 "makes identifiers, escapes URLs, recodes texts and writes bytes as text, with the\n"
+                 "library TAVO.\n"
                  "Exit codes: 0 fine, 1 bad input, 2 wrong usage, 3 trouble with a file.",
                  "tavo");
     Action action;

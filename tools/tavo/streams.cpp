@@ -22,26 +22,22 @@ bool Fail(std::string& trouble, const char* reason) {
 
 // Reads to the end, whatever size the file claims to have: a pipe has none. `read` gives the bytes it got, 0 at the
 // end, all-ones for failure.
-template <class Read> bool ReadToEnd(std::string& bytes, std::string& trouble, Read read) {
-    constexpr std::size_t kFailed = ~std::size_t{0};
-    bytes.clear();
-    for (;;) {
-        const std::size_t filled = bytes.size();
-        bytes.resize(filled + kChunk);
-        const std::size_t got = read(bytes.data() + filled);
-        bytes.resize(filled + (got == kFailed ? 0 : got));
+constexpr std::size_t kFailed = ~std::size_t{0};
+template <class Read>
+bool ReadToEnd(std::string& trouble, const std::function<void(std::string_view)>& take, Read read) {
+    std::string piece(kChunk, 0);
+    while (const std::size_t got = read(piece.data())) {
         if (got == kFailed) return Fail(trouble, "cannot be read");
-        if (got == 0) return true;
-        if (bytes.size() > kLargest) return Fail(trouble, "is too large: a document has at most 4,294,967,295 bytes");
+        take(std::string_view(piece).substr(0, got));
     }
+    return true;
 }
 
 } // namespace
 
-bool ReadAll(const std::string& name, std::string& bytes, std::string& trouble) {
-    constexpr std::size_t kFailed = ~std::size_t{0};
+bool ReadPieces(const std::string& name, std::string& trouble, const std::function<void(std::string_view)>& take) {
     if (name == "-")
-        return ReadToEnd(bytes, trouble, [](char* target) {
+        return ReadToEnd(trouble, take, [](char* target) {
             const std::size_t got = std::fread(target, 1, kChunk, stdin);
             return got == 0 && std::ferror(stdin) ? kFailed : got;
         });
@@ -54,10 +50,21 @@ bool ReadAll(const std::string& name, std::string& bytes, std::string& trouble) 
     CFile file;
     if (!file.Open(path, FileAccessRead | FileAccessShareRead | FileAccessShareWrite, OpenFileExisting))
         return Fail(trouble, "cannot be opened");
-    return ReadToEnd(bytes, trouble, [&](char* target) {
+    return ReadToEnd(trouble, take, [&](char* target) {
         TAVO::ulong32 done = 0;
         return file.Read(target, kChunk, &done) ? std::size_t{done} : kFailed;
     });
+}
+
+bool ReadAll(const std::string& name, std::string& bytes, std::string& trouble) {
+    bytes.clear();
+    bool tooLarge = false;
+    const bool read = ReadPieces(name, trouble, [&](std::string_view piece) {
+        tooLarge = tooLarge || bytes.size() + piece.size() > kLargest;
+        if (!tooLarge) bytes += piece;
+    });
+    if (read && tooLarge) return Fail(trouble, "is too large: it may have 4,294,967,295 bytes");
+    return read;
 }
 
 bool WriteAll(const std::string& name, std::string_view bytes, std::string& trouble) {

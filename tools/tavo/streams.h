@@ -2,6 +2,7 @@
 // Whole files, and the standard streams under the name "-".
 
 #include <cstdio>
+#include <functional>
 #include <string>
 #include <string_view>
 
@@ -12,6 +13,9 @@ enum Exit : int { kFine = 0, kBadInput = 1, kUsage = 2, kFileTrouble = 3 };
 
 // Reads all of a file, or of standard input. False with the reason in `trouble`.
 bool ReadAll(const std::string& name, std::string& bytes, std::string& trouble);
+
+// The same piece by piece, for files of any size.
+bool ReadPieces(const std::string& name, std::string& trouble, const std::function<void(std::string_view)>& take);
 
 // Writes a file, in the place of one that exists, or to standard output. False with the reason in `trouble`.
 bool WriteAll(const std::string& name, std::string_view bytes, std::string& trouble);

@@ -10,6 +10,7 @@
 #include <cstring>
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <langinfo.h>
 #include <link.h>
 #include <pthread.h>
 #include <sched.h>
@@ -507,6 +508,12 @@ int WideToAnsi(const wchar_t* source, int length, char* target, int capacity) no
     Sink<char> sink(target, capacity);
     while (at != end) PutUtf8(sink, TakeUtf16(at, end));
     return sink.Result();
+}
+
+// Not localeconv, which fills a record that threads would share.
+wchar_t GetDecimalPoint() noexcept {
+    wchar_t point[2];
+    return AnsiToWide(nl_langinfo(RADIXCHAR), -1, point, 2) == 2 ? point[0] : L'.';
 }
 
 // --- memory ----------------------------------------------------------------------------------------------------------

@@ -5,6 +5,7 @@
 #include "platform.h"
 
 #include <atomic>
+#include <clocale>
 #include <cstdlib>
 #include <cstring>
 #include <windows.h>
@@ -161,6 +162,11 @@ int AnsiToWide(const char* source, int length, wchar_t* target, int capacity) no
 int WideToAnsi(const wchar_t* source, int length, char* target, int capacity) noexcept {
     if (!source || length == 0 || capacity < 0) return 0;
     return WideCharToMultiByte(CP_ACP, 0, source, length < 0 ? -1 : length, target, capacity, nullptr, nullptr);
+}
+
+wchar_t GetDecimalPoint() noexcept {
+    wchar_t point[2];
+    return AnsiToWide(localeconv()->decimal_point, -1, point, 2) == 2 ? point[0] : L'.';
 }
 
 // --- memory ----------------------------------------------------------------------------------------------------------

@@ -74,6 +74,9 @@ bool FillRandom(void* target, std::size_t size) noexcept;
 int AnsiToWide(const char* source, int length, wchar_t* target, int capacity) noexcept;
 int WideToAnsi(const wchar_t* source, int length, char* target, int capacity) noexcept;
 
+// The decimal point of the process's locale; '.' where it is not one character of 16 bits.
+wchar_t GetDecimalPoint() noexcept;
+
 // --- memory ----------------------------------------------------------------------------------------------------------
 
 // Whether the byte at `address` can be read now. For the one scan that must survive a bad pointer; costs a system call.
