@@ -4,7 +4,6 @@
 #include "numberscan.h"
 #include "simd.h"
 
-#include <algorithm>
 #include <bit>
 #include <charconv>
 #include <iterator>

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <TAVO/string.h>
+#include <utility>
 
 namespace tool {
 
@@ -155,6 +156,21 @@ int Refuse(const Source& source, const Spot& spot, const std::string& fault) {
     return kBadInput;
 }
 
+// Looks at one text after the other, and prints the JSON rows that `look(source, text, rows)` collected. The highest
+// code counts.
+template <class Look> int ForEachText(const TextOptions& options, Look look) {
+    int worst = kFine;
+    std::vector<std::string> rows;
+    for (const std::string& file : options.files) {
+        Source source;
+        int code = source.Read(file, options.from);
+        if (code == kFine) code = look(source, EncodedText(source.Bytes(), source.Format()), rows);
+        worst = std::max(worst, code);
+    }
+    if (options.json) Print(JsonArray(rows));
+    return worst;
+}
+
 } // namespace
 
 int TextRecode(const TextRecodeOptions& options) {
@@ -188,20 +204,13 @@ int TextRecode(const TextRecodeOptions& options) {
 }
 
 int TextCount(const TextOptions& options) {
-    int worst = kFine;
-    std::vector<std::string> rows;
-    for (const std::string& file : options.files) {
-        Source source;
-        if (const int code = source.Read(file, options.from); code != kFine) {
-            worst = std::max(worst, code);
-            continue;
-        }
-        const EncodedText text(source.Bytes(), source.Format());
+    bool isFirst = true;
+    return ForEachText(options, [&](const Source& source, const EncodedText& text, std::vector<std::string>& rows) {
         Changes changes;
         const Scan standard = ScanStandard(text), library = ScanLibrary(text, changes);
-        if (!standard.fault.empty())
-            worst = std::max(worst, Refuse(source, {text, standard.place, standard.at},
-                                           standard.fault + "; the standard's counts end there"));
+        const bool valid = standard.fault.empty();
+        if (!valid)
+            Refuse(source, {text, standard.place, standard.at}, standard.fault + "; the standard's counts end there");
         Facts facts;
         facts.AddText("file", Cleaned(source.Name()));
         facts.AddText("encoding", source.Format().name);
@@ -216,29 +225,19 @@ int TextCount(const TextOptions& options) {
         add("lib utf16 units", library.utf16);
         if (options.json) {
             rows.push_back(facts.Json());
-            continue;
+        } else {
+            if (!std::exchange(isFirst, false)) Print("\n");
+            Print(facts.Lines());
         }
-        if (&file != options.files.data()) Print("\n");
-        Print(facts.Lines());
-    }
-    if (options.json) Print(JsonArray(rows));
-    return worst;
+        return valid ? kFine : kBadInput;
+    });
 }
 
 int TextValidate(const TextOptions& options) {
-    int worst = kFine;
-    std::vector<std::string> rows;
-    for (const std::string& file : options.files) {
-        Source source;
-        if (const int code = source.Read(file, options.from); code != kFine) {
-            worst = std::max(worst, code);
-            continue;
-        }
-        const EncodedText text(source.Bytes(), source.Format());
+    return ForEachText(options, [&](const Source& source, const EncodedText& text, std::vector<std::string>& rows) {
         const Scan scan = ScanStandard(text);
         const bool valid = scan.fault.empty();
         const std::string library = LibraryVerdict(text), encoding = source.Format().name;
-        if (!valid) worst = std::max<int>(worst, kBadInput);
         if (options.json) {
             Facts facts;
             facts.AddText("file", Cleaned(source.Name()));
@@ -254,18 +253,16 @@ int TextValidate(const TextOptions& options) {
             }
             facts.AddText("library", library);
             rows.push_back(facts.Json());
-            continue;
-        }
-        if (valid)
+        } else if (valid) {
             Print(source.Name() + ": valid " + encoding + ", " + Grouped(scan.characters) +
                   (scan.characters == 1 ? " character" : " characters") + "; the library " + library + '\n');
-        else
+        } else {
             Print(source.Name() + ':' + scan.place.Shown() + ": invalid " + encoding +
                   (text.HasOffsets() ? " at byte offset " + std::to_string(text.Offset(scan.at)) : "") + ": " +
                   scan.fault + "; the library " + library + '\n');
-    }
-    if (options.json) Print(JsonArray(rows));
-    return worst;
+        }
+        return valid ? kFine : kBadInput;
+    });
 }
 
 } // namespace tool
