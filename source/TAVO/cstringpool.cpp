@@ -85,16 +85,25 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
     return block;
 }
 
-template <class Text> CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
+template <class Text>
+TAVO_NOINLINE CPPoolString InternWithLock(const Text& text, Missing missing, Match match, bool searched) noexcept {
     Pool& pool = ThePool();
-    const PoolFront::Shared shared = match == Match::Exact ? pool.entries.Share(text) : PoolFront::Shared{};
-    if (TAVO_LIKELY(shared.entry != nullptr)) return PoolAccess::Adopt(shared.entry);
     pool.lock.Enter();
-    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match, shared.searched);
+    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match, searched);
     const char* complaint = std::exchange(pool.groups.complaint, nullptr);
     pool.lock.Leave();
     if (TAVO_UNLIKELY(complaint != nullptr)) RaiseComplaint(complaint);
     return entry ? PoolAccess::Adopt(entry) : CPPoolString();
+}
+
+template <class Text> TAVO_INLINE CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
+    bool searched = false;
+    if (match == Match::Exact) {
+        const PoolFront::Shared shared = ThePool().entries.Share(text);
+        if (TAVO_LIKELY(shared.entry != nullptr)) return PoolAccess::Adopt(shared.entry);
+        searched = shared.searched;
+    }
+    return InternWithLock(text, missing, match, searched);
 }
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {

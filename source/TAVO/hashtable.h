@@ -49,7 +49,9 @@ public:
         const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
         if (!bucket) return place;
         const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
-        Simd::Prefetch(entries + Guess(hash, typicalCount));
+        // Where it probably stands, and what an insertion moves.
+        const auto* guessed = reinterpret_cast<const char*>(entries + Guess(hash, typicalCount));
+        for (std::size_t line = 0; line < 5; ++line) Simd::Prefetch(guessed + 64 * line - 64);
         const std::size_t count = bucket->sUsed / sizeof(Entry);
         place.index = LowerBound(entries, count, hash);
         if (place.index < count) {

@@ -121,7 +121,7 @@ bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size
     // A textbook would copy first; holders pass lists on that way, and clone() where they must not.
     const std::size_t count = GetNItems();
     if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(capacityWhenFull)) return false;
-    SetSize((count + 1) * sizeof(T));
+    m_pMH->sUsed = (count + 1) * sizeof(T);
     if (position > count) position = count;
     T* slot = Elements() + position;
     std::memmove(static_cast<void*>(slot + 1), static_cast<const void*>(slot), (count - position) * sizeof(T));

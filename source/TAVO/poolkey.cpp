@@ -93,12 +93,12 @@ constexpr std::uint64_t Widen(std::uint32_t bytes) {
     return (v | v << 8) & 0x00FF00FF00FF00FF;
 }
 
-// Texts shorter than this take the tables: folding has to be reduced at the end.
+// Wide texts shorter than this take the tables: folding loads whole blocks.
 constexpr std::size_t kFewUnits = 8;
 
 #if defined(TAVO_CRC_FOLDS)
 
-// Both checksums of a text of eight units or more, eight or sixteen at a step. The first step takes what is left over.
+// Both checksums of a text, eight units or more at a step. The first step takes what is left over.
 class Folder {
 public:
     // One block or two, and the same in lower case; `capitals` tells whether the two differ.
@@ -136,41 +136,73 @@ TAVO_MULTIPLIES inline Simd::Block Reverse(Simd::Block block, std::size_t bytes)
     return Simd::Shuffle(block, Simd::Load(kOrder + (16 - bytes)));
 }
 
+// FF in every byte that is A to Z.
+TAVO_MULTIPLIES inline Simd::Block CapitalsIn(Simd::Block bytes) {
+    using namespace Simd;
+    return And(Below8(All8('A' - 1), bytes), Below8(bytes, All8('Z' + 1)));
+}
+TAVO_MULTIPLIES inline Simd::Block Lowered(Simd::Block bytes, Simd::Block capitals) {
+    return Simd::Or(bytes, Simd::And(capitals, Simd::All8(0x20)));
+}
+
+// The checksum of bytes as units; the last one lowest, none behind the first.
+TAVO_MULTIPLIES inline std::uint64_t ChecksumOfReversed(Simd::Block reversed) {
+    crc64::Fold fold;
+    fold.Start(Simd::Interleave<1, true>(Simd::All8(0), reversed));
+    fold.Add(Simd::Interleave<1, false>(Simd::All8(0), reversed));
+    return fold.Checksum();
+}
+
+// The same for `count` ASCII bytes at the low end of one block, the most usual text: no branch but for capitals.
+TAVO_MULTIPLIES inline void FoldBlock(Simd::Block bytes, std::size_t count, Key& key) {
+    const Simd::Block reversed = Reverse(bytes, count), capitals = CapitalsIn(reversed);
+    key.length = key.utf8Size = count;
+    key.hash = key.hashi = ChecksumOfReversed(reversed);
+    if (Simd::Mask(capitals)) key.hashi = ChecksumOfReversed(Lowered(reversed, capitals));
+}
+
+// A text that ends, by a terminator or the limit, within a block's bytes and is ASCII; else false, and nothing is done.
+TAVO_MULTIPLIES bool FoldShort(const unsigned char* text, std::size_t limit, Key& key) {
+    using namespace Simd;
+    const Block bytes = LoadText(text, limit);
+    const std::uint32_t ends = Mask(Equal8(bytes, All8(0))) | 1u << kBlock;
+    const std::size_t end = static_cast<std::size_t>(std::countr_zero(ends)), count = end < limit ? end : limit;
+    if (count == kBlock || (Mask(bytes) & ((1u << count) - 1))) return false;
+    FoldBlock(bytes, count, key);
+    return true;
+}
+
 TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key& key) {
     using namespace Simd;
+    if (count <= kBlock) return FoldBlock(LoadPart(text, count), count, key);
     // Byte i becomes unit i: its place from the top, a zero byte behind it. Two halves of a block.
     const Block low = Pair(0x0480058006800780, 0x0080018002800380);
     const Block high = Pair(0x0C800D800E800F80, 0x088009800A800B80);
-    const auto letters = [](Block bytes) TAVO_MULTIPLIES {
-        return And(Below8(All8('A' - 1), bytes), Below8(bytes, All8('Z' + 1)));
-    };
-    const auto lowered = [](Block bytes, Block capitals)
-                             TAVO_MULTIPLIES { return Or(bytes, And(capitals, All8(0x20))); };
     Folder folder;
 
     std::size_t i = count % 8 ? count % 8 : 8;
     std::uint64_t first;
     std::memcpy(&first, text, 8);
-    const Block head = Pair(first << 8 * (8 - i), 0), headCapitals = letters(head);
-    folder.Start(Mask(headCapitals) != 0, Shuffle(head, low), Shuffle(lowered(head, headCapitals), low));
+    const Block head = Pair(first << 8 * (8 - i), 0), headCapitals = CapitalsIn(head);
+    folder.Start(Mask(headCapitals) != 0, Shuffle(head, low), Shuffle(Lowered(head, headCapitals), low));
     if ((count - i) % kBlock) {
         std::memcpy(&first, text + i, 8);
-        const Block next = Pair(first, 0), capitals = letters(next);
+        const Block next = Pair(first, 0), capitals = CapitalsIn(next);
         folder.Add(Mask(capitals) != 0, Shuffle(next, low));
-        folder.AddLower(Shuffle(lowered(next, capitals), low));
+        folder.AddLower(Shuffle(Lowered(next, capitals), low));
         i += 8;
     }
     for (; count - i >= 2 * kBlock; i += 2 * kBlock) {
         const Block a = Load(text + i), b = Load(text + i + kBlock);
-        const Block capitalsA = letters(a), capitalsB = letters(b);
-        const Block lowerA = lowered(a, capitalsA), lowerB = lowered(b, capitalsB);
+        const Block capitalsA = CapitalsIn(a), capitalsB = CapitalsIn(b);
+        const Block lowerA = Lowered(a, capitalsA), lowerB = Lowered(b, capitalsB);
         folder.Add(Mask(Or(capitalsA, capitalsB)) != 0, Shuffle(a, low), Shuffle(a, high), Shuffle(b, low),
                    Shuffle(b, high));
         folder.AddLower(Shuffle(lowerA, low), Shuffle(lowerA, high), Shuffle(lowerB, low), Shuffle(lowerB, high));
     }
     if (i < count) {
-        const Block bytes = Load(text + i), capitals = letters(bytes);
-        const Block lower = lowered(bytes, capitals);
+        const Block bytes = Load(text + i), capitals = CapitalsIn(bytes);
+        const Block lower = Lowered(bytes, capitals);
         folder.Add(Mask(capitals) != 0, Shuffle(bytes, low), Shuffle(bytes, high));
         folder.AddLower(Shuffle(lower, low), Shuffle(lower, high));
     }
@@ -263,6 +295,12 @@ bool KeyOfUnits(const wchar_t* text, std::size_t count, Key& key) {
 }
 
 bool KeyOfUtf8(const unsigned char* text, std::size_t limit, Key& key, std::size_t& bytes) {
+#if defined(TAVO_CRC_FOLDS)
+    if (Simd::HasMultiply() && FoldShort(text, limit, key)) {
+        bytes = key.length;
+        return true;
+    }
+#endif
     const std::size_t count = Simd::ZeroUnit(text, limit);
     if (IsAscii(text, count)) {
         KeyOfAscii(text, bytes = count, key);
@@ -322,7 +360,7 @@ Key KeyOfStoredUtf8(const wchar_t* text, std::size_t units, bool joined) {
 
 void KeyOfAscii(const unsigned char* text, std::size_t count, Key& key) {
 #if defined(TAVO_CRC_FOLDS)
-    if (count >= kFewUnits && Simd::HasMultiply()) return FoldAscii(text, count, key);
+    if (Simd::HasMultiply()) return FoldAscii(text, count, key);
 #endif
     Hasher hasher;
     std::size_t i = 0;

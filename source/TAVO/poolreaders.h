@@ -19,22 +19,28 @@ namespace TAVO::String::pool {
 
 class Readers {
 public:
-    // Whether the table may be read now, until Leave.
-    bool Enter() noexcept {
+    struct alignas(64) Mark {
+        std::atomic<std::uint32_t> owner{0}; // thread id; 0: free
+        std::atomic<bool> reading{false};    // the owner's; others only read it
+        std::uint64_t thread = 0;            // the system's name of the owner
+    };
+
+    // The calling thread's mark, set: the table may be read until Leave. Null when it may not.
+    Mark* Enter() noexcept {
         const std::uint32_t self = Platform::GetThreadId();
         Mark& mark = MarkOf(self);
-        if (TAVO_UNLIKELY(mark.owner.load(std::memory_order_relaxed) != self)) return false;
-        if (m_flushes) {
+        if (TAVO_UNLIKELY(mark.owner.load(std::memory_order_relaxed) != self)) return nullptr;
+        if (TAVO_LIKELY(m_flushes)) {
             mark.reading.store(true, std::memory_order_relaxed);
             std::atomic_signal_fence(std::memory_order_seq_cst); // the compiler keeps the order
         } else {
             mark.reading.exchange(true);
         }
-        if (TAVO_LIKELY(m_open.load(std::memory_order_acquire))) return true;
-        mark.reading.store(false, std::memory_order_release);
-        return false;
+        if (TAVO_LIKELY(m_open.load(std::memory_order_acquire))) return &mark;
+        Leave(mark);
+        return nullptr;
     }
-    void Leave() noexcept { MarkOf(Platform::GetThreadId()).reading.store(false, std::memory_order_release); }
+    static void Leave(Mark& mark) noexcept { mark.reading.store(false, std::memory_order_release); }
 
     // The rest is for who holds the pool's lock.
 
@@ -53,12 +59,6 @@ public:
 
 private:
     static constexpr std::size_t kMarks = 128; // threads that live at once and read without the lock
-
-    struct alignas(64) Mark {
-        std::atomic<std::uint32_t> owner{0}; // thread id; 0: free
-        std::atomic<bool> reading{false};    // the owner's; others only read it
-        std::uint64_t thread = 0;            // the system's name of the owner
-    };
 
     // One mark for each of 128 ids in a row; Windows gives every fourth number.
     Mark& MarkOf(std::uint32_t id) noexcept { return m_marks[(id ^ id >> 2) % kMarks]; }

@@ -41,6 +41,7 @@ Group& GroupOf(const CPObjectMemory& record) { return *Block::PayloadOf<Group>(r
 // so the units that are compared are asked too.
 bool IsCaseless(const StoredText& text) {
     if (text.key.hash != text.key.hashi) return false;
+    if (text.key.length >= pool::kComparedUnits) return !pool::HoldsCapitals(text.text);
     for (std::size_t i = 0; i < pool::kComparedUnits && text.text[i]; ++i)
         if (detail::FoldUnit(text.text[i]) != text.text[i]) return false;
     return true;

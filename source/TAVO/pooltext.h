@@ -17,6 +17,16 @@ namespace TAVO::String::pool {
 // cache lines.
 constexpr std::size_t kComparedUnits = 10;
 
+// Whether one of the units that are compared is A to Z; there are as many.
+inline bool HoldsCapitals(const wchar_t* text) {
+    using namespace Simd;
+    const auto capitals = [text](std::size_t from) { // of eight, in two runs that overlap
+        const Block units = Load(text + from);
+        return And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units));
+    };
+    return Mask(Or(capitals(0), capitals(kComparedUnits - 8))) != 0;
+}
+
 template <bool folded, class Unit> int CompareFirstUnits(const Unit* text, std::size_t units, const wchar_t* stored) {
     for (std::size_t i = 0; i < kComparedUnits; ++i) {
         wchar_t mine = i < units ? static_cast<wchar_t>(text[i]) : L'\0', theirs = stored[i];

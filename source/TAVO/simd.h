@@ -174,6 +174,9 @@ inline Block Equal8(Block a, Block b) {
 inline Block Equal16(Block a, Block b) {
     return detail::Map<std::uint16_t>(a, b, [](int x, int y) { return x == y ? 0xFFFF : 0; });
 }
+inline Block Above16(Block a, Block b) {
+    return detail::Map<std::int16_t>(a, b, [](int x, int y) { return x > y ? -1 : 0; });
+}
 inline Block AtLeast8(Block a, Block b) {
     return detail::Map<std::uint8_t>(a, b, [](int x, int y) { return x >= y ? 0xFF : 0; });
 }
@@ -282,6 +285,15 @@ TAVO_NOSANITIZE inline Block NarrowText(const wchar_t* text) {
     wchar_t copy[kBlock] = {};
     for (std::size_t i = 0; i < kBlock && text[i]; ++i) copy[i] = text[i];
     return Narrow(Load(copy), Load(copy + 8));
+}
+
+// The first bytes of a text of at most `limit` bytes that may be zero-terminated; those behind its end may be anything.
+// Pages and sanitizers as for NarrowText.
+TAVO_NOSANITIZE inline Block LoadText(const unsigned char* text, std::size_t limit) {
+    if (TAVO_LIKELY((reinterpret_cast<std::uintptr_t>(text) & 4095) <= 4096 - kBlock)) return Load(text);
+    unsigned char copy[kBlock] = {};
+    for (std::size_t i = 0; i < kBlock && i < limit && text[i]; ++i) copy[i] = text[i];
+    return Load(copy);
 }
 
 namespace detail {

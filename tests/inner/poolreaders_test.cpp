@@ -22,9 +22,10 @@ TEST(PoolReaders, NobodyReadsWhileItIsClosed) {
         readers.Join();
         joined = true;
         while (!stop.load(std::memory_order_relaxed)) {
-            if (!readers.Enter()) continue;
+            Readers::Mark* mark = readers.Enter();
+            if (!mark) continue;
             for (const int each : table) torn += each != table.front();
-            readers.Leave();
+            Readers::Leave(*mark);
         }
     });
     while (!joined) std::this_thread::yield();
@@ -42,11 +43,12 @@ TEST(PoolReaders, OneThatWasStoppedInsideIsTold) {
     Readers readers;
     EXPECT_FALSE(readers.Enter()) << "without a mark";
     readers.Join();
-    ASSERT_TRUE(readers.Enter());
+    Readers::Mark* mark = readers.Enter();
+    ASSERT_TRUE(mark);
     std::thread([&] { EXPECT_FALSE(readers.Close()); }).join();
-    readers.Leave();
-    EXPECT_TRUE(readers.Enter()) << "open again";
-    readers.Leave();
+    Readers::Leave(*mark);
+    EXPECT_EQ(readers.Enter(), mark) << "open again";
+    Readers::Leave(*mark);
     ASSERT_TRUE(readers.Close());
     EXPECT_FALSE(readers.Enter());
     readers.Open();
@@ -65,9 +67,10 @@ TEST(PoolReaders, MarksOfThreadsThatEndedAreFreed) {
         readers->Open();
         std::thread([&] {
             readers->Join();
-            if (!readers->Enter()) return;
+            Readers::Mark* mark = readers->Enter();
+            if (!mark) return;
             ++inside;
-            readers->Leave();
+            Readers::Leave(*mark);
         }).join();
     }
     EXPECT_EQ(inside, 300);
