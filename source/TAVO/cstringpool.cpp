@@ -65,16 +65,24 @@ void RaiseComplaint(const char* complaint) noexcept {
 enum class Missing { Create, Leave };
 enum class Match { Exact, AnyCase };
 
+// What was done for a text without the lock, or with an earlier one.
+struct Before {
+    bool searched = false; // it is not in the table in front
+    bool fetched = false;  // what holds it is on its way from memory
+};
+
 // The one road behind every way to intern: a counted entry, null when there is none. Counted before the lock is left:
 // without a handle outside, a sweep may take the entry.
 template <class Text>
-tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match, bool searched) noexcept {
+tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Match match,
+                              const Before& before) noexcept {
     if (match == Match::AnyCase) {
         if (tagCPOMEMHEADER* found = pool.groups.Find(text, pool.entries)) return Block::Acquire(found);
         if (missing == Missing::Leave) return nullptr;
     }
+    if (!before.fetched) pool.entries.Fetch(text.key);
     CCaseSensitiveHash::Place place;
-    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, searched)) return Block::Acquire(found);
+    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, before.searched)) return Block::Acquire(found);
     if (missing == Missing::Leave) return nullptr;
     wchar_t* out;
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
@@ -86,10 +94,10 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
 }
 
 template <class Text>
-TAVO_NOINLINE CPPoolString InternWithLock(const Text& text, Missing missing, Match match, bool searched) noexcept {
+TAVO_NOINLINE CPPoolString InternWithLock(const Text& text, Missing missing, Match match, Before before) noexcept {
     Pool& pool = ThePool();
     pool.lock.Enter();
-    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match, searched);
+    tagCPOMEMHEADER* entry = InternLocked(pool, text, missing, match, before);
     const char* complaint = std::exchange(pool.groups.complaint, nullptr);
     pool.lock.Leave();
     if (TAVO_UNLIKELY(complaint != nullptr)) RaiseComplaint(complaint);
@@ -97,13 +105,13 @@ TAVO_NOINLINE CPPoolString InternWithLock(const Text& text, Missing missing, Mat
 }
 
 template <class Text> TAVO_INLINE CPPoolString Intern(const Text& text, Missing missing, Match match) noexcept {
-    bool searched = false;
+    Before before;
     if (match == Match::Exact) {
         const PoolFront::Shared shared = ThePool().entries.Share(text);
         if (TAVO_LIKELY(shared.entry != nullptr)) return PoolAccess::Adopt(shared.entry);
-        searched = shared.searched;
+        before.searched = shared.searched;
     }
-    return InternWithLock(text, missing, match, searched);
+    return InternWithLock(text, missing, match, before);
 }
 
 CPPoolString InternText(const wchar_t* text, std::size_t limit, Missing missing, Match match) noexcept {
@@ -200,6 +208,33 @@ CPPoolString InternWide(const wchar_t* text, std::size_t count) noexcept {
     if (!KeyOfUnits(text, count, key)) return {};
     return Intern(WideText{key, text, count}, Missing::Create, Match::Exact);
 }
+
+template <class Unit> CPPoolString Announced<Unit>::Begin(const Unit* text, std::size_t count) noexcept {
+    if constexpr (sizeof(Unit) == 1)
+        KeyOfAscii(text, count, m_key);
+    else
+        KeyOfUnits(text, count, m_key);
+    m_text = text;
+    m_count = count;
+    Pool& pool = ThePool();
+    const PoolFront::Shared shared = pool.entries.Share(PlainText<Unit>{m_key, text, count});
+    if (shared.entry) return PoolAccess::Adopt(shared.entry);
+    m_searched = shared.searched;
+    m_fetched = pool.lock.TryEnter();
+    if (m_fetched) {
+        pool.entries.Fetch(m_key);
+        pool.lock.Leave();
+    }
+    return {};
+}
+
+template <class Unit> CPPoolString Announced<Unit>::Finish() const noexcept {
+    return InternWithLock(PlainText<Unit>{m_key, m_text, m_count}, Missing::Create, Match::Exact,
+                          {m_searched, m_fetched});
+}
+
+template class Announced<unsigned char>;
+template class Announced<wchar_t>;
 
 void Unload() noexcept {
     // Never waits: a thread that was killed may hold the lock for ever.

@@ -37,21 +37,29 @@ public:
         return index ? reinterpret_cast<Bucket*>(index + 1) : nullptr;
     }
 
+    // Starts to fetch from memory what Locate and an insertion will look at, so that the cache misses of a large table
+    // run side by side instead of one after the other. `typicalCount` is how many entries a bucket probably has.
+    static void Fetch(const CBaseHashTable& table, unsigned long long hash, std::size_t typicalCount) {
+        const Bucket* buckets = Buckets(table);
+        if (!buckets) return;
+        const auto* bucket = reinterpret_cast<const char*>(Buffers::Block::Of(buckets[hash & table.m_mask]));
+        if (!bucket) return;
+        Simd::Prefetch(bucket);
+        // From the line before the place that the hash's value suggests; an insertion moves what stands behind.
+        constexpr std::size_t kLine = 64, kLines = 5;
+        const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, typicalCount) * sizeof(Entry);
+        for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLine);
+    }
+
     // Where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would be inserted.
-    // `order` tells how what is sought compares with an item: below 0, 0, above 0. `typicalCount` is how many entries a
-    // bucket probably has: a large table's cache misses then run side by side instead of one after the other.
-    template <class Order>
-    static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order,
-                        std::size_t typicalCount = 0) {
+    // `order` tells how what is sought compares with an item: below 0, 0, above 0.
+    template <class Order> static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order) {
         Place place{static_cast<std::size_t>(hash & table.m_mask), 0, false};
         const Bucket* buckets = Buckets(table);
         if (!buckets) return place;
         const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
         if (!bucket) return place;
         const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
-        // Where it probably stands, and what an insertion moves.
-        const auto* guessed = reinterpret_cast<const char*>(entries + Guess(hash, typicalCount));
-        for (std::size_t line = 0; line < 5; ++line) Simd::Prefetch(guessed + 64 * line - 64);
         const std::size_t count = bucket->sUsed / sizeof(Entry);
         place.index = LowerBound(entries, count, hash);
         if (place.index < count) {

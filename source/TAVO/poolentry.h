@@ -60,6 +60,24 @@ CPPoolString InternAscii(const unsigned char* text, std::size_t count) noexcept;
 // Interns `count` units, none of them 0. The null string when they hold a bad sequence.
 CPPoolString InternWide(const wchar_t* text, std::size_t count) noexcept;
 
+// Interning in two steps, for who has something else to do meanwhile: the first starts to fetch from memory what the
+// second looks at. Unit is a byte or wchar_t; `count` units, 1 at least, all from 1 to 7F, which stay where they are.
+template <class Unit> class Announced {
+public:
+    // The string when it can be told at once; else the null string, and Finish gives it.
+    CPPoolString Begin(const Unit* text, std::size_t count) noexcept;
+    // Requires: Begin gave the null string. The null string without memory.
+    CPPoolString Finish() const noexcept;
+
+private:
+    Key m_key;
+    const Unit* m_text = nullptr;
+    std::size_t m_count = 0;
+    bool m_searched = false, m_fetched = false;
+};
+extern template class Announced<unsigned char>;
+extern template class Announced<wchar_t>;
+
 // At unload: tells how many strings are still held and lets the tables go. Skipped when the lock is taken.
 void Unload() noexcept;
 

@@ -119,9 +119,12 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
     } else {
         item = Block::Adopt(entry);
     }
-    if (InsertAt(place, text.key.hashi, std::move(item))) return true;
-    LetGo(std::move(item));
-    return false;
+    if (!InsertAt(place, text.key.hashi, std::move(item))) {
+        LetGo(std::move(item));
+        return false;
+    }
+    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].GetNItems();
+    return true;
 }
 
 bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
@@ -154,6 +157,12 @@ long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPO
 // --- entries ---------------------------------------------------------------------------------------------------------
 
 CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : CBaseHashTable(kIndexLength), m_groups(groups) {}
+
+void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
+    TableAccess::Fetch(*this, key.hash, m_typicalCount);
+    m_groups.Fetch(key);
+    if (key.hash != key.hashi) TableAccess::Fetch(*this, key.hashi, m_typicalCount); // its lower case
+}
 
 bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry) noexcept {
     tagCPOMEMHEADER* block = Block::Of(entry);

@@ -32,17 +32,17 @@ public:
 
     // The same, but nothing is remembered.
     template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) const {
-        place = Lookup::TableAccess::Locate(
-            *this, text.key.hash,
-            [&](const Buffers::CPObjectMemory& item) {
-                const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
-                if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
-                if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-                return text.Compare(entry.text);
-            },
-            m_typicalCount);
+        place = Lookup::TableAccess::Locate(*this, text.key.hash, [&](const Buffers::CPObjectMemory& item) {
+            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
+            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
+            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+            return text.Compare(entry.text);
+        });
         return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
     }
+
+    // Starts to fetch what a search for that text and adding it will look at, in both tables.
+    void Fetch(const pool::Key& key) const noexcept;
 
     // The entry that is the lower case of the text.
     template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) const {
@@ -92,6 +92,9 @@ public:
         return found;
     }
 
+    // Starts to fetch what adding an entry of that key will look at.
+    void Fetch(const pool::Key& key) const noexcept { Lookup::TableAccess::Fetch(*this, key.hashi, m_typicalCount); }
+
     // Puts an entry into its group. False without memory; nothing has changed then.
     bool Add(Buffers::tagCPOMEMHEADER* entry, const CCaseSensitiveHash& entries) noexcept;
     // Takes an entry out of its group. False when it should have one and has not.
@@ -118,6 +121,8 @@ private:
                     Buffers::tagCPOMEMHEADER* second) noexcept;
 
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
+
+    std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
 };
 
 } // namespace TAVO::String

@@ -503,7 +503,10 @@ inline bool HasLines() { return false; }
 
 // Asks for the cache line at `address`, which need not be readable: to be read, or to be written soon.
 TAVO_INLINE void Prefetch(const void* address) {
-#if defined(TAVO_SSE2)
+#if defined(TAVO_SSE2) && !defined(_MSC_VER)
+    // Not the intrinsic: GCC takes a function that only prefetches for one that does nothing.
+    __asm__ volatile("prefetcht0 %0" : : "m"(*static_cast<const char*>(address)));
+#elif defined(TAVO_SSE2)
     _mm_prefetch(static_cast<const char*>(address), _MM_HINT_T0);
 #else
     static_cast<void>(address);

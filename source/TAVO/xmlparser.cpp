@@ -45,7 +45,7 @@ public:
 
     ParseResult Run() {
         ParseResult result;
-        if (Document()) {
+        if (Document() && Settle()) {
             result.root = std::move(m_root);
         } else {
             result.code = m_code;
@@ -60,15 +60,31 @@ private:
     // What an element's content has shown itself to be.
     enum class Content : std::uint8_t { Open, Children, Data, DataEnded };
 
+    // A name as the document spells it.
+    struct Spelling {
+        const Unit* text = nullptr;
+        std::size_t units = 0;
+        bool ascii = false;
+    };
+
     struct OpenElement {
         tagCPOMEMHEADER* node;
-        const Unit* name; // as the start tag spelt it
-        std::size_t nameUnits;
+        Spelling name;          // in the start tag
         std::size_t firstChild; // in m_children
         Content content;
     };
 
     enum class TagEnd { Open, Empty, Instruction };
+
+    using Values = StringCache<Unit, 1024>;
+
+    // Where a text belongs: to an attribute of the node, or of the instruction that is being read when there is none,
+    // or to the node's data.
+    struct Place {
+        tagCPOMEMHEADER* node = nullptr;
+        std::size_t attribute = kNoPlace;
+    };
+    static constexpr std::size_t kNoPlace = SIZE_MAX, kDataPlace = SIZE_MAX - 1;
 
     // --- errors ------------------------------------------------------------------------------------------------------
 
@@ -137,19 +153,19 @@ private:
     bool Instruction(bool topLevel) {
         const Unit* start = m_at;
         m_at += 2;
-        const Unit* name = m_at;
-        if (!Name()) return false;
-        const bool declaration = topLevel && IsDeclarationName(name, static_cast<std::size_t>(m_at - name));
+        Spelling name;
+        if (!Name(name)) return false;
+        const bool declaration = topLevel && IsDeclarationName(name);
         TagEnd end;
-        if (!AttributesOf(TagEnd::Instruction, end)) return false;
+        if (!AttributesOf(nullptr, TagEnd::Instruction, end) || !Settle()) return false;
         const bool good = !declaration || Declaration(start);
         DropAttributes();
         return good;
     }
 
-    bool IsDeclarationName(const Unit* name, std::size_t units) {
-        if (IsAscii(name, units)) return units == 3 && Stands(name, "xml");
-        return kUtf8 && InternName(name, units).cmp(L"xml") == 0; // overlong forms
+    bool IsDeclarationName(const Spelling& name) {
+        if (name.ascii) return name.units == 3 && Stands(name.text, "xml");
+        return kUtf8 && InternName(name).cmp(L"xml") == 0; // overlong forms
     }
 
     bool Declaration(const Unit* start) {
@@ -250,14 +266,27 @@ private:
     // ---------------------------------------------------------------------------------------------------------
 
     // Moves behind the name at m_at.
-    bool Name() {
+    bool Name(Spelling& name) {
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
+        if (TAVO_UNLIKELY(!IsAsciiClass(*m_at, kNameStartBit))) return AnyName(name);
+        const Unit* at = m_at + 1;
+        while (at != m_end && IsAsciiClass(*at, kNameBit)) ++at;
+        if (TAVO_UNLIKELY(at != m_end && *at >= 0x80)) return AnyName(name);
+        name = {m_at, static_cast<std::size_t>(at - m_at), true};
+        m_at = at;
+        return true;
+    }
+
+    // The same for names with characters above 7F; not at the end.
+    TAVO_NOINLINE bool AnyName(Spelling& name) {
         const Unit* start = m_at;
         ulong32 value;
         const Unit* at = m_at;
         if (!NameCharacter(at, value) || !IsNameStart(value)) return Fail(kInvalidTag, start);
         do m_at = at;
         while (m_at != m_end && NameCharacter(at, value) && IsNameChar(value));
+        name = {start, static_cast<std::size_t>(m_at - start), true};
+        for (const Unit* unit = start; unit < m_at; ++unit) name.ascii &= *unit < 0x80;
         return true;
     }
 
@@ -274,10 +303,10 @@ private:
         return true;
     }
 
-    CPPoolString InternName(const Unit* name, std::size_t units) {
-        if (IsAscii(name, units)) return m_names.Get(name, units);
+    CPPoolString InternName(const Spelling& name) {
+        if (TAVO_LIKELY(name.ascii)) return m_names.Get(name.text, name.units);
         m_text.Cut(0);
-        for (const Unit* at = name; at < name + units;) {
+        for (const Unit* at = name.text; at < name.text + name.units;) {
             ulong32 value;
             NameCharacter(at, value);
             if (!m_text.Push(static_cast<wchar_t>(value))) return {};
@@ -285,18 +314,12 @@ private:
         return String::pool::InternWide(m_text.First(), m_text.Count());
     }
 
-    static bool IsAscii(const Unit* text, std::size_t units) {
-        for (std::size_t i = 0; i < units; ++i)
-            if (text[i] >= 0x80) return false;
-        return true;
-    }
-
     // --- tags
     // ----------------------------------------------------------------------------------------------------------
 
-    // Reads attributes up to the end of a start tag or, with TagEnd::Instruction, of an instruction, and moves behind
-    // it.
-    bool AttributesOf(TagEnd kind, TagEnd& end) {
+    // Reads attributes of the node up to the end of a start tag or, with TagEnd::Instruction and no node, of an
+    // instruction, and moves behind it.
+    bool AttributesOf(tagCPOMEMHEADER* node, TagEnd kind, TagEnd& end) {
         m_seen.Cut(0);
         for (;;) {
             SkipBlanks();
@@ -310,7 +333,7 @@ private:
                 if (c == '/') return Close("/>", TagEnd::Empty, end);
             }
             if (c == '<') return Fail(kOpenEnclosure, m_at);
-            if (!AttributeHere()) return false;
+            if (!AttributeHere(node)) return false;
         }
     }
 
@@ -321,10 +344,10 @@ private:
         return true;
     }
 
-    bool AttributeHere() {
-        const Unit* name = m_at;
-        if (!Name()) return Fail(kBadAttribute, name);
-        const auto nameUnits = static_cast<std::size_t>(m_at - name);
+    bool AttributeHere(tagCPOMEMHEADER* node) {
+        const Unit* start = m_at;
+        Spelling name;
+        if (!Name(name)) return Fail(kBadAttribute, start);
         SkipBlanks();
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
         if (*m_at != '=') return Fail(kBadAttribute, m_at);
@@ -333,13 +356,13 @@ private:
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
         if (*m_at != '"' && *m_at != '\'') return Fail(kBadAttribute, m_at);
 
-        Attribute attribute{InternName(name, nameUnits), {}};
+        Attribute attribute{InternName(name), {}};
         if (attribute.name.isnull()) return OutOfMemory();
-        if (!Value(attribute.value)) return false;
-        if (IsDuplicate(attribute.name)) return Fail(kBadAttribute, name);
+        if (!Value({node, m_attributes.Count()}, attribute.value)) return false;
+        if (IsDuplicate(attribute.name)) return Fail(kBadAttribute, start);
         // Intended (xml-empty-attribute): an empty value is dropped, where a textbook keeps it: hosts take it for
         // missing.
-        if (!attribute.value.isdef()) return true;
+        if (attribute.value.isempty()) return true;
         return Keep(std::move(attribute)) || OutOfMemory();
     }
 
@@ -408,19 +431,18 @@ private:
 
     bool StartTag() {
         ++m_at;
-        const Unit* name = m_at;
-        if (!Name()) return false;
-        const auto nameUnits = static_cast<std::size_t>(m_at - name);
+        Spelling name;
+        if (!Name(name)) return false;
         tagCPOMEMHEADER* node = NewNode();
         if (!node) return OutOfMemory();
-        if (!m_open.Push({node, name, nameUnits, m_children.Count(), Content::Open})) {
+        if (!m_open.Push({node, name, m_children.Count(), Content::Open})) {
             Buffers::Block::Free(node);
             return OutOfMemory();
         }
         TagEnd end;
-        if (!AttributesOf(TagEnd::Open, end)) return false;
+        if (!AttributesOf(node, TagEnd::Open, end)) return false;
         Node& element = NodeOf(node);
-        element.name = InternName(name, nameUnits);
+        element.name = InternName(name);
         if (element.name.isnull()) return OutOfMemory();
         if (!m_attributes.Empty()) {
             if (!Attributes::Build(element.attributes, &AttributeAt(0), m_attributes.Count())) return OutOfMemory();
@@ -481,14 +503,15 @@ private:
         const ErrorCode wrong = element.content == Content::DataEnded ? kMixedContent : kBadTerminationTag;
         m_at += 2;
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
-        const Unit* name = m_at;
-        if (static_cast<std::size_t>(m_end - name) > element.nameUnits && name[element.nameUnits] == '>' &&
-            std::memcmp(name, element.name, element.nameUnits * sizeof(Unit)) == 0) {
-            m_at = name + element.nameUnits + 1;
+        const std::size_t units = element.name.units;
+        if (static_cast<std::size_t>(m_end - m_at) > units && m_at[units] == '>' &&
+            std::memcmp(m_at, element.name.text, units * sizeof(Unit)) == 0) {
+            m_at += units + 1;
             return FinishElement();
         }
-        bool same = Name();
-        if (same && !IsSameName(name, static_cast<std::size_t>(m_at - name), element, same)) return OutOfMemory();
+        Spelling name;
+        bool same = Name(name);
+        if (same && !IsSameName(name, element, same)) return OutOfMemory();
         if (!same) return Fail(wrong, tag);
         SkipBlanks();
         if (AtEnd()) return Fail(kOpenEnclosure, m_end);
@@ -498,10 +521,11 @@ private:
     }
 
     // Names of other spelling may be the same: UTF-8 has overlong forms. False without memory.
-    bool IsSameName(const Unit* name, std::size_t units, const OpenElement& element, bool& same) {
-        same = units == element.nameUnits && std::memcmp(name, element.name, units * sizeof(Unit)) == 0;
-        if (same || !kUtf8 || (IsAscii(name, units) && IsAscii(element.name, element.nameUnits))) return true;
-        const CPPoolString interned = InternName(name, units);
+    bool IsSameName(const Spelling& name, const OpenElement& element, bool& same) {
+        same = name.units == element.name.units &&
+               std::memcmp(name.text, element.name.text, name.units * sizeof(Unit)) == 0;
+        if (same || !kUtf8 || (name.ascii && element.name.ascii)) return true;
+        const CPPoolString interned = InternName(name);
         same = interned == NodeOf(element.node).name;
         return !interned.isnull();
     }
@@ -544,8 +568,8 @@ private:
         return static_cast<unsigned>(c) - 0x21u < 0x5Fu && c != '&' && c != stop1 && c != stop2;
     }
 
-    // The value at m_at, quotes included.
-    bool Value(CPPoolString& value) {
+    // The value at m_at, quotes included, which goes to `place`. The null string when it will be there later.
+    bool Value(const Place& place, CPPoolString& value) {
         const Unit* opened = m_at;
         const Unit quote = *opened;
         const Unit* start = opened + 1;
@@ -553,18 +577,49 @@ private:
         if (at == m_end) return Fail(kOpenString, opened);
         if (*at != quote) return ValueInPieces(value);
         m_at = at + 1;
-        value = PlainText(start, at);
-        return !value.isnull() || OutOfMemory();
+        return PlainText(place, start, at, value);
     }
 
     bool IsBlankAt(const Unit* at) const { return at != m_end && IsBlank(*at); }
 
-    // Interns what stands there as it is. Long texts do not repeat.
-    CPPoolString PlainText(const Unit* start, const Unit* end) {
+    // Interns what stands there as it is. The null string when that takes long: `place` gets it later, while what comes
+    // next in the document has been read. Long texts do not repeat.
+    bool PlainText(const Place& place, const Unit* start, const Unit* end, CPPoolString& text) {
         constexpr std::size_t kLong = 100;
         const auto units = static_cast<std::size_t>(end - start);
-        if (units == 0) return CPPoolString::pempty;
-        return units < kLong ? m_values.Get(start, units) : Intern(start, units);
+        if (units == 0) {
+            text = CPPoolString::pempty;
+            return true;
+        }
+        if (units >= kLong) {
+            text = Intern(start, units);
+            return !text.isnull() || OutOfMemory();
+        }
+        typename Values::Later later;
+        text = later.Begin(m_values, start, units);
+        if (!text.isnull()) return true;
+        if (!Settle()) return false;
+        m_later = later;
+        m_laterPlace = place;
+        return true;
+    }
+
+    // Puts the text that is still on its way into its place.
+    bool Settle() {
+        if (m_laterPlace.attribute == kNoPlace) return true;
+        const Place place = std::exchange(m_laterPlace, {});
+        CPPoolString text = m_later.Finish();
+        if (text.isnull()) return OutOfMemory();
+        TextAt(place) = std::move(text);
+        return true;
+    }
+
+    CPPoolString& TextAt(const Place& place) {
+        if (place.attribute == kDataPlace) return NodeOf(place.node).data;
+        const bool built = place.node && NodeOf(place.node).attributes.key();
+        return (built ? Attributes::First(NodeOf(place.node).attributes)[place.attribute]
+                      : AttributeAt(place.attribute))
+            .value;
     }
 
     // A value with references, runs of blanks or characters above 7F.
@@ -587,7 +642,10 @@ private:
         // Nearly always the whole data stands here as it is.
         if (at == m_end || *at != '<' || at == start || !Stands(at, "</")) return DataInPieces(element);
         m_at = at;
-        return StoreData(element, PlainText(start, at));
+        CPPoolString data;
+        if (!PlainText({element.node, kDataPlace}, start, at, data)) return false;
+        StoreData(element, std::move(data));
+        return true;
     }
 
     bool DataInPieces(OpenElement& element) {
@@ -611,17 +669,18 @@ private:
             }
         }
         CPPoolString data;
-        return EndText(data) && StoreData(element, std::move(data));
+        if (!EndText(data)) return false;
+        StoreData(element, std::move(data));
+        return true;
     }
 
-    bool StoreData(OpenElement& element, CPPoolString&& data) {
+    // The null string stands for one that is put there later.
+    void StoreData(OpenElement& element, CPPoolString&& data) {
         element.content = Content::DataEnded;
-        if (data.isnull()) return OutOfMemory();
-        if (!data.isdef()) return true; // empty sections are no data
+        if (data.isempty()) return; // empty sections are no data
         Node& node = NodeOf(element.node);
-        node.data = std::move(data);
+        if (!data.isnull()) node.data = std::move(data);
         node.contentKind = kData;
-        return true;
     }
 
     bool CDataSection() {
@@ -727,8 +786,10 @@ private:
     Scratch<std::uint32_t> m_seen;        // hash table over m_attributes, used above kFewAttributes
     Scratch<wchar_t> m_text;              // the text that is being put together
     bool m_blankPending = false;
-    StringCache<256> m_names;
-    StringCache<1024> m_values;
+    StringCache<Unit, 256> m_names;
+    Values m_values;
+    typename Values::Later m_later; // a text on its way into the pool, with a place
+    Place m_laterPlace;
 };
 
 template <class Unit> ParseResult ParseText(const Unit* text, std::size_t units) noexcept {

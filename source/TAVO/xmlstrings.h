@@ -64,82 +64,102 @@ inline CPPoolString Intern(const unsigned char* text, std::size_t count) {
 inline CPPoolString Intern(const wchar_t* text, std::size_t count) { return String::pool::InternWide(text, count); }
 
 // A table of `Slots` strings, each in the one place that its text's mix selects. A text that is met for the second time
-// in a row at a place moves in: values that occur once leave the others alone.
-template <std::size_t Slots> class StringCache {
+// in a row at a place moves in: values that occur once leave the others alone. Texts are those of the document and must
+// stay where they are, 1 to 7F all of their units: what is met again is compared with where it stood before.
+template <class Unit, std::size_t Slots> class StringCache {
 public:
-    // Interns `count` ASCII bytes (or units below 80), none of them 0.
-    template <class Unit> CPPoolString Get(const Unit* text, std::size_t count) {
-        const std::uint32_t mix = Mix(text, count);
-        Slot& slot = m_slots[mix % Slots];
-        if (TAVO_LIKELY(slot.mix == mix && slot.credit.Block() && Same(slot.credit.Block(), text, count)))
-            return slot.credit.Take();
+    // Interns `count` units, 1 at least.
+    CPPoolString Get(const Unit* text, std::size_t count) {
+        const Text key(text, count);
+        Slot& slot = m_slots[key.Place()];
+        if (TAVO_LIKELY(slot.Holds(key))) return slot.credit.Take();
         CPPoolString made = Intern(text, count);
-        if (slot.candidate == mix && made.isdef()) {
-            slot.credit.Assign(made);
-            slot.mix = mix;
-        } else {
-            slot.candidate = mix;
-        }
+        slot.Meet(key, made);
         return made;
     }
 
-private:
-    struct Slot {
-        std::uint32_t mix = 0, candidate = 0;
-        Credit credit;
+    // The same in two steps, the second of which is quicker when something else is done meanwhile.
+    class Later {
+    public:
+        // The null string when Finish gives it.
+        CPPoolString Begin(StringCache& cache, const Unit* text, std::size_t count) {
+            m_text = Text(text, count);
+            m_slot = &cache.m_slots[m_text.Place()];
+            if (m_slot->Holds(m_text)) return m_slot->credit.Take();
+            CPPoolString known = m_announced.Begin(text, count);
+            if (known.isdef()) m_slot->Meet(m_text, known);
+            return known;
+        }
+        CPPoolString Finish() const {
+            CPPoolString made = m_announced.Finish();
+            m_slot->Meet(m_text, made);
+            return made;
+        }
+
+    private:
+        String::pool::Announced<Unit> m_announced;
+        typename StringCache::Text m_text;
+        typename StringCache::Slot* m_slot = nullptr;
     };
 
-    static std::uint32_t Mix(const unsigned char* text, std::size_t count) {
-        constexpr std::uint64_t kOdd = 0x9E3779B97F4A7C15;
-        std::uint64_t mix = count * kOdd;
-        if (count >= 8) {
-            std::uint64_t word;
-            for (; count > 8; count -= 8, text += 8) {
-                std::memcpy(&word, text, 8);
-                mix = (mix ^ word) * kOdd;
-                mix ^= mix >> 32;
-            }
-            std::memcpy(&word, text + count - 8, 8); // the last eight, overlapping those before
-            mix = (mix ^ word) * kOdd;
-        } else {
-            // Without a call: four bytes from each end, or single ones.
-            std::uint32_t low = 0, high = 0;
-            if (count >= 4) {
-                std::memcpy(&low, text, 4);
-                std::memcpy(&high, text + count - 4, 4);
-            } else {
-                low = text[0];
-                high = static_cast<std::uint32_t>(text[count / 2] << 8 | text[count - 1]);
-            }
-            mix = (mix ^ (static_cast<std::uint64_t>(high) << 32 | low)) * kOdd;
-        }
-        return static_cast<std::uint32_t>(mix >> 32);
-    }
-    static std::uint32_t Mix(const wchar_t* text, std::size_t count) {
-        return Mix(reinterpret_cast<const unsigned char*>(text), count * sizeof(wchar_t));
-    }
+private:
+    // A text and a mix of all its bytes, which no other text of that length has when there are eight or fewer.
+    struct Text {
+        std::uint64_t mix = 0;
+        const Unit* units = nullptr;
+        std::size_t count = 0;
 
-    static bool Same(Buffers::tagCPOMEMHEADER* block, const unsigned char* text, std::size_t count) {
-        if (String::UnitsOf(block) != count) return false;
-        const wchar_t* units = String::EntryOf(block).text;
-        for (; count >= 8; count -= 8, units += 8, text += 8) {
-            std::uint64_t four[2], bytes;
-            std::memcpy(four, units, 16);
-            std::memcpy(&bytes, text, 8);
-            if ((Spread(static_cast<std::uint32_t>(bytes)) ^ four[0]) | (Spread(bytes >> 32) ^ four[1])) return false;
+        Text() = default;
+        Text(const Unit* text, std::size_t length) : units(text), count(length) {
+            constexpr std::uint64_t kOdd = 0x9E3779B97F4A7C15;
+            const auto* bytes = reinterpret_cast<const unsigned char*>(text);
+            std::size_t left = length * sizeof(Unit);
+            mix = left;
+            std::uint64_t word;
+            if (left >= 8) {
+                for (; left > 8; left -= 8, bytes += 8) {
+                    std::memcpy(&word, bytes, 8);
+                    mix = (mix ^ word) * kOdd;
+                    mix ^= mix >> 32;
+                }
+                std::memcpy(&word, bytes + left - 8, 8); // the last eight, overlapping those before
+            } else {
+                // Without a call: four bytes from each end, or single ones.
+                std::uint32_t low = 0, high = 0;
+                if (left >= 4) {
+                    std::memcpy(&low, bytes, 4);
+                    std::memcpy(&high, bytes + left - 4, 4);
+                } else {
+                    low = bytes[0];
+                    high = static_cast<std::uint32_t>(bytes[left / 2] << 8 | bytes[left - 1]);
+                }
+                word = static_cast<std::uint64_t>(high) << 32 | low;
+            }
+            mix = (mix ^ word) * kOdd;
         }
-        for (; count; --count)
-            if (*units++ != *text++) return false;
-        return true;
-    }
-    static bool Same(Buffers::tagCPOMEMHEADER* block, const wchar_t* text, std::size_t count) {
-        return String::UnitsOf(block) == count &&
-               std::memcmp(String::EntryOf(block).text, text, count * sizeof(wchar_t)) == 0;
-    }
-    static std::uint64_t Spread(std::uint64_t bytes) {
-        bytes = (bytes | bytes << 16) & 0x0000FFFF0000FFFF;
-        return (bytes | bytes << 8) & 0x00FF00FF00FF00FF;
-    }
+
+        std::size_t Place() const { return static_cast<std::size_t>(mix >> 40) % Slots; }
+        bool operator==(const Text& other) const {
+            return mix == other.mix && count == other.count &&
+                   (count * sizeof(Unit) <= 8 || std::memcmp(units, other.units, count * sizeof(Unit)) == 0);
+        }
+    };
+
+    struct Slot {
+        Text text; // what the credit is for
+        std::uint64_t candidate = 0;
+        Credit credit;
+
+        bool Holds(const Text& other) const { return text == other; }
+        void Meet(const Text& other, const CPPoolString& made) {
+            if (candidate == other.mix && made.isdef()) {
+                credit.Assign(made);
+                text = other;
+            } else {
+                candidate = other.mix;
+            }
+        }
+    };
 
     Slot m_slots[Slots];
 };
