@@ -177,14 +177,15 @@ bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
     try {
         for (unsigned long long round = 0; round < m_buckets && Buckets(); ++round) {
             const auto bucket = static_cast<std::size_t>(m_cursor);
-            for (std::size_t index = Buckets()[bucket].GetNItems(); index-- > 0;) DisposeEntry(bucket, index);
             m_cursor = (m_cursor + 1) & m_mask;
+            TableAccess::FetchItems(Buckets()[m_cursor]); // those of the next one, while this one's are asked
+            if (Buckets()[bucket].isEmpty()) continue;    // takes no time
+            for (std::size_t index = Buckets()[bucket].GetNItems(); index-- > 0;) DisposeEntry(bucket, index);
             if (Core::OS::GetTimeNow() - start > budget) return false;
         }
         return true;
     } catch (...) {
-        m_cursor = (m_cursor + 1) & m_mask; // one item that always throws must not keep the sweep from all others
-        return false;
+        return false; // the cursor has moved on: one item that always throws must not keep the sweep from all others
     }
 }
 

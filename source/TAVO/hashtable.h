@@ -51,6 +51,15 @@ public:
         for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLine);
     }
 
+    // Starts to fetch the beginnings of all items of a bucket.
+    static void FetchItems(const Bucket& bucket) {
+        for (std::size_t i = 0; i < bucket.GetNItems(); ++i) {
+            const auto* item = reinterpret_cast<const char*>(Buffers::Block::Of(bucket[i].item));
+            Simd::Prefetch(item);
+            Simd::Prefetch(item + 64);
+        }
+    }
+
     // Where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would be inserted.
     // `order` tells how what is sought compares with an item: below 0, 0, above 0.
     template <class Order> static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order) {

@@ -17,14 +17,15 @@ namespace TAVO::String::pool {
 // cache lines.
 constexpr std::size_t kComparedUnits = 10;
 
-// Whether one of the units that are compared is A to Z; there are as many.
+// Whether one of the units that are compared is A to Z; there are as many. They were written a moment ago, eight at
+// once and the others behind: loads that span two stores would wait for both.
 inline bool HoldsCapitals(const wchar_t* text) {
     using namespace Simd;
-    const auto capitals = [text](std::size_t from) { // of eight, in two runs that overlap
-        const Block units = Load(text + from);
-        return And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units));
-    };
-    return Mask(Or(capitals(0), capitals(kComparedUnits - 8))) != 0;
+    const Block units = Load(text);
+    if (Mask(And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units)))) return true;
+    for (std::size_t i = 8; i < kComparedUnits; ++i)
+        if (detail::FoldUnit(text[i]) != text[i]) return true;
+    return false;
 }
 
 template <bool folded, class Unit> int CompareFirstUnits(const Unit* text, std::size_t units, const wchar_t* stored) {
@@ -60,7 +61,13 @@ template <class Unit> struct PlainText {
                 Simd::Store(out + i, Simd::WidenLow(block));
                 Simd::Store(out + i + Simd::kBlock / 2, Simd::WidenHigh(block));
             }
-            for (; i < units; ++i) out[i] = text[i];
+            const std::size_t left = units - i;
+            if (left == 0) return true;
+            const auto block = Simd::LoadPart(text + i, left);
+            if (left >= Simd::kBlock / 2) Simd::Store(out + i, Simd::WidenLow(block));
+            if (left > Simd::kBlock / 2)
+                Simd::StorePart(out + i + Simd::kBlock / 2, Simd::WidenHigh(block), 2 * left - Simd::kBlock);
+            if (left < Simd::kBlock / 2) Simd::StorePart(out + i, Simd::WidenLow(block), 2 * left);
         }
         return true;
     }
