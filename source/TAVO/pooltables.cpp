@@ -159,6 +159,8 @@ long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPO
 CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : CBaseHashTable(kIndexLength), m_groups(groups) {}
 
 void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
+    constexpr std::size_t kFew = 2; // so small a table lies in the caches
+    if (m_typicalCount <= kFew) return;
     TableAccess::Fetch(*this, key.hash, m_typicalCount);
     m_groups.Fetch(key);
     if (key.hash != key.hashi) TableAccess::Fetch(*this, key.hashi, m_typicalCount); // its lower case
