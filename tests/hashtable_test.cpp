@@ -6,15 +6,12 @@
 #include <algorithm>
 #include <chrono>
 #include <functional>
-#include <gtest/gtest.h>
 #include <random>
 #include <TAVO/lookup.h>
 #include <thread>
-#include <vector>
 
 using namespace TAVO::Lookup;
-using TAVO::Buffers::CPObjectMemory;
-using TAVO::Buffers::CPPlainMemory;
+using TAVO::Buffers::CPObjectMemory, TAVO::Buffers::CPPlainMemory;
 
 namespace {
 
@@ -24,8 +21,7 @@ using Entry = std::pair<Hash, Content>;
 using Entries = std::vector<Entry>;
 constexpr Content kNone{-1, -1};
 
-class Item : public CPPlainMemory {
-public:
+struct Item : CPPlainMemory {
     Item(int value, int id) {
         if (Alloc(sizeof(Content))) *static_cast<Content*>(static_cast<void*>(*this)) = {value, id};
     }
@@ -43,12 +39,8 @@ struct Visitor : IBaseHashTableEnum {
 class Table : public CBaseHashTable {
 public:
     explicit Table(std::uint32_t length = 4) : CBaseHashTable(length) {}
-    using CBaseHashTable::AddItem;
-    using CBaseHashTable::DeleteIndex;
-    using CBaseHashTable::DeleteItem;
-    using CBaseHashTable::DisposeTable;
-    using CBaseHashTable::FindItem;
-    using CBaseHashTable::PurgeTable;
+    using CBaseHashTable::AddItem, CBaseHashTable::DeleteIndex, CBaseHashTable::DeleteItem,
+        CBaseHashTable::DisposeTable, CBaseHashTable::FindItem, CBaseHashTable::PurgeTable;
 
     void Fill(int items, Hash hashes) {
         for (int i = 0; i < items; ++i) AddItem(static_cast<Hash>(i) % hashes, Item(i, i), eHashKeep);
@@ -80,8 +72,8 @@ struct Model {
     Entries entries;
 
     static bool Before(const Entry& a, const Entry& b) {
-        return std::tuple(a.first & kMask, a.first, a.second.first) <
-               std::tuple(b.first & kMask, b.first, b.second.first);
+        const auto key = [](const Entry& e) { return std::tuple(e.first & kMask, e.first, e.second.first); };
+        return key(a) < key(b);
     }
     Entries::iterator Find(Hash hash, int value, bool anyValue = false) {
         return std::find_if(entries.begin(), entries.end(), [&](const Entry& entry) {
@@ -97,9 +89,6 @@ struct Model {
         }
         const Entry entry(hash, item); // before those that are equal
         return entries.insert(std::lower_bound(entries.begin(), entries.end(), entry, Before), entry)->second;
-    }
-    template <class Test> void EraseIf(Test test) {
-        entries.erase(std::remove_if(entries.begin(), entries.end(), test), entries.end());
     }
 };
 
@@ -118,16 +107,18 @@ TEST(HashTable, BehavesLikeTheModel) {
             const Content content = Item::Of(item);
             const auto found = model.Find(hash, content.first);
             const auto kind = random() % 64;
+            const bool isThere = found != model.entries.end();
             if (kind == 0) {
                 ASSERT_TRUE(table.Purge([](Hash, const CPObjectMemory& i) { return Item::Of(i).second % 3 != 0; }));
-                model.EraseIf([](const Entry& entry) { return entry.second.second % 3 == 0; });
+                std::erase_if(model.entries, [](const Entry& entry) { return entry.second.second % 3 == 0; });
             } else if (kind == 1) {
                 ASSERT_TRUE(table.DeleteIndex(hash));
-                model.EraseIf([&](const Entry& entry) { return ((entry.first ^ hash) & Model::kMask) == 0; });
+                std::erase_if(model.entries,
+                              [&](const Entry& entry) { return ((entry.first ^ hash) & Model::kMask) == 0; });
             } else if (kind == 2) {
                 table.disposable = [](Content disposed, TAVO::ulong32) { return disposed.second % 2 == 0; };
                 ASSERT_TRUE(table.DisposeTable(60000));
-                model.EraseIf([](const Entry& entry) { return entry.second.second % 2 == 0; });
+                std::erase_if(model.entries, [](const Entry& entry) { return entry.second.second % 2 == 0; });
             } else if (kind == 3 && step % 7 == 0) {
                 table.ClearTable();
                 model = {};
@@ -137,17 +128,17 @@ TEST(HashTable, BehavesLikeTheModel) {
                 const auto policy = static_cast<eHashCollision>(random() % 6);
                 ASSERT_EQ(Item::Of(table.AddItem(hash, item, policy)), model.Add(hash, content, policy)) << policy;
             } else if (kind < 52 || model.entries.empty()) {
-                ASSERT_EQ(Item::Of(table.FindItem(hash, item)), found == model.entries.end() ? kNone : found->second);
+                ASSERT_EQ(Item::Of(table.FindItem(hash, item)), isThere ? found->second : kNone);
             } else {
-                ASSERT_EQ(table.DeleteItem(hash, item), found != model.entries.end());
-                if (found != model.entries.end()) model.entries.erase(found);
+                ASSERT_EQ(table.DeleteItem(hash, item), isThere);
+                if (isThere) model.entries.erase(found);
             }
             if (step % 8) continue;
             ASSERT_EQ(table.List(), model.entries) << "step " << step;
             ASSERT_EQ(table.GetNItems(), model.entries.size());
-            Model same = model;
-            same.EraseIf([&](const Entry& entry) { return entry.first != hash; });
-            ASSERT_EQ(table.List(hash, true), same.entries);
+            Entries same = model.entries;
+            std::erase_if(same, [&](const Entry& entry) { return entry.first != hash; });
+            ASSERT_EQ(table.List(hash, true), same);
         }
     }
 }
@@ -201,19 +192,16 @@ TEST(HashTable, ComparisonThatThrowsFindsAndInsertsNothing) {
 TEST(HashTable, DisposalGoesOnWhereItEnded) {
     Table table;
     table.Fill(16, 16);
-    std::vector<int> asked, expected;
+    std::vector<int> asked;
     table.disposable = [&](Content item, TAVO::ulong32) {
         asked.push_back(item.first);
         std::this_thread::sleep_for(std::chrono::milliseconds(3));
         return false;
     };
-    for (int call = 0; call < 17; ++call) {
-        EXPECT_FALSE(table.DisposeTable(0));
-        expected.push_back(call % 16);
-        ASSERT_EQ(asked, expected) << "one bucket a call";
-    }
-    EXPECT_TRUE(table.DisposeTable(60000));
-    EXPECT_TRUE(asked.size() == 33 && asked[17] == 1) << "a whole round, from wherever it begins";
+    for (int call = 0; call < 17; ++call) // one bucket a call
+        EXPECT_TRUE(!table.DisposeTable(0) && asked.size() == call + 1u && asked.back() == call % 16) << call;
+    EXPECT_TRUE(table.DisposeTable(60000) && asked.size() == 33 && asked[17] == 1)
+        << "a whole round, from wherever it begins";
 }
 
 TEST(HashTable, DisposalSeesCountsMayThrowAndChangeTheTable) {
@@ -225,10 +213,8 @@ TEST(HashTable, DisposalSeesCountsMayThrowAndChangeTheTable) {
         EXPECT_EQ(count, item.first == 5 ? 4u : 3u) << "three: nobody holds it";
         return count == 3 ? true : throw 1;
     };
-    EXPECT_FALSE(table.DisposeTable(60000));
-    EXPECT_EQ(table.GetNItems(), 11u) << "up to the one that throws";
-    EXPECT_FALSE(table.DisposeTable(60000)) << "reaches the others first";
-    EXPECT_EQ(table.List(), (Entries{{5, {5, 5}}}));
+    EXPECT_TRUE(!table.DisposeTable(60000) && table.GetNItems() == 11) << "up to the one that throws";
+    EXPECT_TRUE(!table.DisposeTable(60000) && table.List() == (Entries{{5, {5, 5}}})) << "reaches the others first";
     for (int i = 0; i < 16; ++i) table.AddItem(5, Item(i, i), eHashKeep);
     std::vector<int> disposed;
     table.disposable = [](Content, TAVO::ulong32) { return true; };

@@ -10,45 +10,30 @@
 #include <algorithm>
 #include <atomic>
 #include <chrono>
-#include <gtest/gtest.h>
 #include <optional>
-#include <string>
-#include <TAVO/string.h>
 #include <thread>
-#include <vector>
 
 using namespace TAVO::String;
-using support::Bytes;
-using support::Texts;
-using support::Units;
+using namespace support;
 
 namespace {
 
 constexpr std::size_t kAll = SIZE_MAX;
 using Wide = std::vector<wchar_t>;
 
-const unsigned char* Utf8(const char* text) { return reinterpret_cast<const unsigned char*>(text); }
-void Sweep(int times = 1) {
-    for (int i = 0; i < times; ++i) EXPECT_TRUE(CStringPool::Collect(60000));
-}
-
-const wchar_t* Entry(const CPPoolString& text) { return text; }
-
 unsigned long long Checksum(const std::vector<unsigned>& values, bool folded) {
-    unsigned long long crc = 0;
+    Bytes bytes;
     for (unsigned value : values) {
         if (folded && value >= 'A' && value <= 'Z') value += 'a' - 'A';
-        for (const unsigned byte : {value & 0xFF, value >> 8 & 0xFF})
-            for (int bit = 7; bit >= 0; --bit)
-                crc = crc << 1 ^ ((crc >> 63 ^ (byte >> bit & 1)) ? 0x42F0E1EBA9EA3693 : 0);
+        for (const unsigned byte : {value, value >> 8}) bytes.push_back(static_cast<unsigned char>(byte));
     }
-    return crc;
+    return TAVO::Buffers::CMachineCRC(64, 0x42F0E1EBA9EA3693).Eval(bytes.data(), bytes.size(), 0);
 }
 
 struct Expected {
     std::size_t length = 0, utf8Size = 0;
     std::vector<unsigned> values;
-    Units units;
+    Units16 units;
 };
 
 // What interning the first n units gives; nothing for the null string.
@@ -56,17 +41,17 @@ template <class Text> std::optional<Expected> Read(Text text, std::size_t n) {
     constexpr bool kUtf8 = sizeof(text[0]) == 1;
     Expected e;
     std::size_t i = 0;
-    support::Character c;
+    Character c;
     text.push_back(0);
-    for (; (c = support::LookAt(text, i, n)).look == support::Look::Good; i += c.units) {
+    for (; (c = LookAt(text, i, n)).look == Look::Good; i += c.units) {
         if (c.value > 0x10FFFF) return {};
-        const Units units = kUtf8 ? support::Encoded16(c.value) : Units(&text[i], &text[i] + c.units);
+        const Units16 units = kUtf8 ? Encoded16(c.value) : Units16(&text[i], &text[i] + c.units);
         e.units.insert(e.units.end(), units.begin(), units.end());
         e.values.push_back(c.value);
         e.length += kUtf8 ? units.size() : 1;
-        e.utf8Size += kUtf8 ? c.units : support::Encoded8(c.value).size();
+        e.utf8Size += kUtf8 ? c.units : Encoded8(c.value).size();
     }
-    bool good = c.look == support::Look::Ended;
+    bool good = c.look == Look::Ended;
     if (kUtf8 && text[i]) // cut: what is there must be right nevertheless
         for (std::size_t k = i + 1; k < n && k < text.size(); ++k) good &= text[k] / 0x40 == 2;
     return good ? std::optional(e) : std::nullopt;
@@ -86,8 +71,9 @@ std::string Wrong(const CPPoolString& text, const std::optional<Expected>& expec
     return text.Verify() ? "" : "verify";
 }
 
-// A text under way in every spelling: whole, at most n units, looked up, with memory that ends where it may be read.
-template <class Unit, class Text> void CheckText(const support::GuardedMemory& memory, const Text& text, bool cutAll) {
+// A text under way in every spelling: whole, at most n units, looked up, with memory that ends where it may be
+// read.
+template <class Unit, class Text> void CheckText(const GuardedMemory& memory, const Text& text, bool cutAll) {
     Text terminated(text);
     terminated.push_back(0);
     const auto* whole = reinterpret_cast<const Unit*>(memory.Place(terminated.data(), terminated.size()));
@@ -99,7 +85,7 @@ template <class Unit, class Text> void CheckText(const support::GuardedMemory& m
                                  CStringPool::QueryStringRefni(whole, text.size() + 1)})
             ASSERT_EQ(Entry(same), Entry(first));
     }
-    Sweep(2);
+    Sweep();
     for (std::size_t n = cutAll ? 0 : text.size(); n <= text.size(); ++n) {
         const auto* cut = reinterpret_cast<const Unit*>(memory.Place(text.data(), n));
         const auto part = Read(text, n);
@@ -108,52 +94,45 @@ template <class Unit, class Text> void CheckText(const support::GuardedMemory& m
         ASSERT_EQ(Wrong(CStringPool::GetStringRefn(cut, n), part), "") << n << " of " << text.size();
         ASSERT_EQ(CStringPool::QueryStringRefn(cut, n).isdef(), def);
         ASSERT_EQ(CStringPool::QueryStringRefni(cut, n).isdef(), def);
-        Sweep(2);
+        Sweep();
     }
 }
 
 TEST(PoolKeys, FollowTheRulesForEveryText) {
-    const support::Assertions assertions;
-    const support::GuardedMemory memory;
-    support::TextSource source(1);
+    const Assertions assertions;
+    const GuardedMemory memory;
+    TextSource source(1);
     for (int i = 0; i < 96; ++i) {
         const std::size_t length = source.Below(i % 8 ? 40 : 300);
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, source.Utf8(length), i % 16 == 0));
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, source.Utf16(length), i % 16 == 0));
     }
-    for (const Units& text : {Units{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'}, Units{0xD83D, 0xDBFF, 0xD800, 0xDC00},
-                              Units{0xC1, 0xC0, 0x41C0, 0x410}})
+    for (const Units16& text : {Units16{'A', 'b', 'C', 'Z', '[', '@', 'z', '{', '`'},
+                                Units16{0xD83D, 0xDBFF, 0xD800, 0xDC00}, Units16{0xC1, 0xC0, 0x41C0, 0x410}})
         ASSERT_NO_FATAL_FAILURE(CheckText<wchar_t>(memory, text, true));
-    for (const std::string text : {"x\xC0\x80y", "\xF4\x90\x80\x80", "ab\xE4\xB8",
-                                   "\xF0\x9F"
-                                   "a\x80",
-                                   "\xE4\xFF\x80"})
+    for (const std::string text : {"x\xC0\x80y", "\xEF\xBF\xBF\xF0\x90\x80\x80", "\xF4\x90\x80\x80", "ab\xE4\xB8",
+                                   "\xF0\x9F\x61\x80", "\xE4\xFF\x80"})
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(text.begin(), text.end()), true)) << text;
     EXPECT_EQ(assertions.Take(), Texts());
 }
 
 TEST(PoolKeys, OverlongFormMeetsItsShortForm_Intended) {
     for (const std::string earlier : {"A", "\xC1\x81"}) {
-        Sweep(2);
+        Sweep();
         const CPPoolString first(Utf8(earlier.c_str())), overlong(Utf8("\xC1\x81")), shortForm(L"A");
         EXPECT_EQ(Entry(shortForm), Entry(overlong));
         EXPECT_EQ(shortForm.UTF8Size(), earlier.size()) << "who came first decides";
     }
 }
 
-// Adds the checksum's generator to five units from `at` on: the checksum stays.
-Wide WithGenerator(Wide text, std::size_t at) {
-    const unsigned generator[] = {0x0100, 0xF042, 0xEBE1, 0xEAA9, 0x9336};
-    for (std::size_t i = 0; i < 5; ++i) text[at + i] = static_cast<wchar_t>(text[at + i] ^ generator[i]);
-    return text;
-}
-
 // Intended: ten-units
 TEST(PoolTenUnits, DecideBetweenEqualKeys_Intended) {
+    // Added to five units, the checksum's generator leaves the checksum as it is.
+    const unsigned generator[] = {0x0100, 0xF042, 0xEBE1, 0xEAA9, 0x9336};
     for (std::size_t at = 0; at < 20; ++at) {
-        Wide text(31, L'\u4000');
-        text[30] = 0;
-        const Wide twin = WithGenerator(text, at);
+        Wide text(31, L'\u4000'), twin(text);
+        for (std::size_t i = 0; i < 5; ++i) twin[at + i] = static_cast<wchar_t>(twin[at + i] ^ generator[i]);
+        text[30] = twin[30] = 0;
         const CPPoolString first(text.data()), second(twin.data());
         ASSERT_TRUE(first.sHash() == second.sHash() && first.sHashi() == second.sHashi());
         EXPECT_EQ(Entry(first) == Entry(second), at >= 10) << at;
@@ -170,19 +149,15 @@ TEST(PoolTenUnits, CapitalsThatCancelOutKeepTheirGroup) {
     ASSERT_TRUE(one.sHash() == two.sHash() && Entry(one) != Entry(two));
     EXPECT_EQ(Entry(CStringPool::GetStringRefi(Entry(two))), Entry(one));
     one.free();
-    Sweep(2);
+    Sweep();
     EXPECT_EQ(Entry(CStringPool::GetStringRefi(Entry(two))), Entry(two));
 }
 
-TEST(Pool, NullAndEmptyTextsHaveTheirOwnEntries) {
-    const wchar_t* const noWide = nullptr;
-    const support::FailingHeap heap(0);
-    for (const std::size_t n : {std::size_t{0}, std::size_t{5}, kAll}) {
-        EXPECT_TRUE(CStringPool::GetStringRefn(noWide, n).isnull() &&
-                    CStringPool::GetStringRefni(Utf8(nullptr), n).isnull());
-        EXPECT_TRUE(CStringPool::GetStringRefn(L"", n).isempty() && CStringPool::GetStringRefni(Utf8(""), n).isempty());
-    }
-    EXPECT_TRUE(CStringPool::GetStringRef(noWide).isnull() && CStringPool::QueryStringRefi(Utf8(nullptr)).isnull());
+TEST(Pool, NullAndEmptyTextsTakeNoMemory) {
+    const FailingHeap heap(0);
+    for (const std::size_t n : {std::size_t{0}, std::size_t{5}, kAll})
+        EXPECT_TRUE(CStringPool::GetStringRefni(Utf8(nullptr), n).isnull() &&
+                    CStringPool::GetStringRefn(L"", n).isempty());
     EXPECT_TRUE(CStringPool::GetStringRef(static_cast<IStringSubmitter*>(nullptr)).isnull());
 }
 
@@ -196,43 +171,40 @@ TEST(Pool, CaseGroupsAnswerTheEarliestVariant) {
     }
     for (const std::size_t gone : {5, 0, 60, 30, 1}) variants.erase(variants.begin() + static_cast<long>(gone));
     for (; !variants.empty(); variants.erase(variants.begin())) {
-        Sweep(2);
+        Sweep();
         EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"ABCDEF GROUP")), Entry(variants.front()));
         EXPECT_EQ(Entry(CStringPool::GetStringRefi(Utf8("aBcDeF gRoUp"))), Entry(variants.front()));
     }
-    Sweep(2);
+    Sweep();
     EXPECT_STREQ(Entry(CStringPool::GetStringRefi(L"ABCdef Group")), L"ABCdef Group") << "the first of a new group";
 }
 
 bool IsKept(const wchar_t* text) { return !CStringPool::QueryStringRef(text).isnull(); }
 
 TEST(PoolSweep, TakesEntriesAtTheSecondIdleSweepInARow) {
-    Sweep(2);
+    Sweep();
     const auto items = CStringPool::GetNItems(), size = CStringPool::GetSize();
     CPPoolString text(L"swept");
-    const auto without = support::LiveBlocks();
+    const auto without = LiveBlocks();
     for (int times = 0; times < 2; ++times) {
         text = L"swept"; // the second time: between the sweeps
         EXPECT_EQ(*static_cast<const unsigned char*>(text), 's');
         EXPECT_TRUE(CStringPool::GetNItems() == items + 1 && CStringPool::GetSize() > size);
-        Sweep(3);
-        EXPECT_EQ(support::LiveBlocks(), without + 1) << "held";
+        EXPECT_TRUE(Sweep(3) && LiveBlocks() == without + 1) << "held";
         text.free();
-        Sweep();
-        EXPECT_EQ(support::LiveBlocks(), without) << "the UTF-8 form goes first";
+        EXPECT_TRUE(Sweep(1) && LiveBlocks() == without) << "the UTF-8 form goes first";
         // Intended: pool-idle
         EXPECT_TRUE(IsKept(L"swept")) << "a look-up does not prolong its life";
     }
-    Sweep();
-    EXPECT_FALSE(IsKept(L"swept"));
-    EXPECT_TRUE(CStringPool::GetNItems() == items && CStringPool::GetSize() == size);
+    EXPECT_TRUE(Sweep(1) && !IsKept(L"swept") && CStringPool::GetNItems() == items && CStringPool::GetSize() == size);
     EXPECT_EQ(Entry(CStringPool::QueryStringRef(L"true")), Entry(CPPoolString::ptrue)) << "never taken";
-    EXPECT_EQ(Wrong(CPPoolString::pfalse, Read(Units{'f', 'a', 'l', 's', 'e'}, kAll)), "");
+    EXPECT_EQ(Wrong(CPPoolString::pfalse, Read(Units16{'f', 'a', 'l', 's', 'e'}, kAll)), "");
 }
 
-// Thousands of texts that are asked for again and again, half of which go: what the pool remembers of them must go too.
+// Thousands of texts that are asked for again and again, half of which go: what the pool remembers of them must go
+// too.
 TEST(PoolSweep, InInstalmentsForgetsWhatWasAskedForOften) {
-    Sweep(2);
+    Sweep();
     const auto items = CStringPool::GetNItems();
     std::vector<CPPoolString> texts;
     for (int i = 0; i < 6000; ++i) texts.emplace_back(i + 8000000);
@@ -246,8 +218,7 @@ TEST(PoolSweep, InInstalmentsForgetsWhatWasAskedForOften) {
             CStringPool::Collect(0);
     }
     texts.clear();
-    Sweep(2);
-    EXPECT_TRUE(CStringPool::Verify() && CStringPool::GetNItems() == items);
+    EXPECT_TRUE(Sweep() && CStringPool::Verify() && CStringPool::GetNItems() == items);
 }
 
 struct Submitter : IStringSubmitter {
@@ -266,25 +237,15 @@ struct Submitter : IStringSubmitter {
 };
 
 TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
-    const support::Assertions assertions;
-    struct {
-        const char* name;
-        Submitter submitter;
-        const wchar_t* expected; // null: the null string
-    } rows[] = {
-        {"short", {400, {'a', 'b', 'c'}}, L"abc"},
-        {"ends within", {5, {'a', 0, 'c', 'd', 'e'}}, L"a"},
-        {"nothing written", {5, {}}, L""},
-        {"refused", {3, {'a', 'b', 'c'}, 0}, nullptr},
-        {"throwing", {3, {'a', 'b', 'c'}, -1}, nullptr},
-        {"half a pair inside", {3, {'a', 0xD83D, 'c'}}, nullptr},
-        {"half a pair before the end", {9, {'a', 0xD83D}}, nullptr},
-        {"already there", {4, {'t', 'r', 'u', 'e'}}, L"true"},
-    };
-    for (auto& row : rows) {
-        const CPPoolString text = CStringPool::GetStringRef(&row.submitter);
-        EXPECT_TRUE(text.Verify() && Entry(text) == Entry(CPPoolString(row.expected))) << row.name;
-        EXPECT_EQ(text.isnull(), row.expected == nullptr) << row.name;
+    const Assertions assertions;
+    using Row = std::pair<Submitter, const wchar_t*>; // null: the null string; half pairs give it, too
+    for (auto [submitter, expected] : {Row{{400, {'a', 'b', 'c'}}, L"abc"}, Row{{5, {'a', 0, 'c', 'd', 'e'}}, L"a"},
+                                       Row{{5, {}}, L""}, Row{{3, {'a', 'b', 'c'}, 0}, nullptr},
+                                       Row{{3, {'a', 'b', 'c'}, -1}, nullptr}, Row{{3, {'a', 0xD83D, 'c'}}, nullptr},
+                                       Row{{9, {'a', 0xD83D}}, nullptr}, Row{{4, {'t', 'r', 'u', 'e'}}, L"true"}}) {
+        const CPPoolString text = CStringPool::GetStringRef(&submitter);
+        EXPECT_TRUE(text.Verify() && Entry(text) == Entry(CPPoolString(expected)) && text.isnull() == !expected)
+            << submitter.announced;
     }
     for (const std::size_t announced : {kAll, kAll / 4, std::size_t{0}}) {
         Submitter submitter(announced, {});
@@ -298,7 +259,7 @@ TEST(PoolSubmitters, WriteTheirTextIntoTheEntry) {
 }
 
 TEST(Pool, VerifyFindsADamagedEntry) {
-    const support::Assertions assertions;
+    const Assertions assertions;
     const CPPoolString text(L"to be damaged");
     for (const std::size_t at : {0u, 6u, 12u}) {
         const_cast<wchar_t*>(Entry(text))[at] ^= 1;
@@ -311,22 +272,19 @@ TEST(Pool, VerifyFindsADamagedEntry) {
 
 TEST(Pool, WithoutMemoryGivesNullAndStaysWhole) {
     const CPPoolString variant(L"a text that may not fit"), second(L"a text that MAY not fit");
-    support::ForEachFailingAllocation([&] {
-        Sweep(2);
+    ForEachFailingAllocation([&] {
+        Sweep();
         const auto items = CStringPool::GetNItems();
         {
             Submitter submitter(40, {'s', 'u', 'b'});
-            std::size_t made = 0;
             const CPPoolString texts[] = {L"A text that may not fit", Utf8("a TEXT that may not fit"),
                                           CStringPool::GetStringRefi(L"another text"), 5550555,
                                           CStringPool::GetStringRef(&submitter)};
-            for (const auto& text : texts) made += !text.isnull();
+            const auto made = std::count_if(texts, texts + 5, [](auto& text) { return !text.isnull(); });
             EXPECT_EQ(CStringPool::GetNItems(), items + made + IsKept(L"meanwhile"));
             EXPECT_EQ(Entry(CStringPool::QueryStringRefi(L"A TEXT THAT MAY NOT FIT")), Entry(variant));
         }
-        EXPECT_TRUE(CStringPool::Verify());
-        Sweep(2);
-        EXPECT_EQ(CStringPool::GetNItems(), items);
+        EXPECT_TRUE(CStringPool::Verify() && Sweep() && CStringPool::GetNItems() == items);
     });
 }
 
@@ -367,11 +325,11 @@ TEST(Pool, ServesStaticObjects) {
     CPPoolString mine;
     const wchar_t* late = nullptr;
     {
-        const support::Plugin plugin("TAVOTestPlugin");
+        const Plugin plugin("TAVOTestPlugin");
         const auto held = plugin.Find<plugin::HeldEntry>(plugin::kHeldEntry);
         ASSERT_NE(held, nullptr);
         mine = plugin::kHeldText;
-        Sweep(2);
+        Sweep();
         EXPECT_EQ(held(&late), Entry(mine));
     }
     EXPECT_EQ(Entry(CStringPool::QueryStringRef(plugin::kLateText)), late) << "its destructor ran, and interned";

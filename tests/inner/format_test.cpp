@@ -4,6 +4,7 @@
 
 #include "platform/platform.h"
 #include "support/heapwatch.h"
+#include "support/log.h"
 
 #include <algorithm>
 #include <cfloat>
@@ -12,25 +13,16 @@
 #include <cmath>
 #include <cstdio>
 #include <cstring>
-#include <gtest/gtest.h>
-#include <limits>
 #include <random>
-#include <string>
-#include <vector>
 
 namespace {
 
 using TAVO::FormatWide;
 
-std::vector<wchar_t> Widen(const std::string& text) { return {text.c_str(), text.c_str() + text.size() + 1}; }
-
 template <class... Arguments> std::string Format(const wchar_t* format, Arguments... arguments) {
     wchar_t out[4096];
-    const std::size_t length = FormatWide(out, 4096, format, arguments...);
-    EXPECT_EQ(out[length], 0);
-    std::string text;
-    for (const wchar_t* unit = out; *unit; ++unit) text += *unit < 0x80 ? static_cast<char>(*unit) : '?';
-    return text;
+    EXPECT_EQ(out[FormatWide(out, 4096, format, arguments...)], 0);
+    return support::Ascii(out);
 }
 
 template <class... Arguments> std::string Expected(const std::string& format, Arguments... arguments) {
@@ -41,13 +33,11 @@ template <class... Arguments> std::string Expected(const std::string& format, Ar
 
 // Both formatters on a format that means the same to both.
 template <class... Arguments> void Compare(const std::string& format, Arguments... arguments) {
-    ASSERT_EQ(Format(Widen(format).data(), arguments...), Expected(format, arguments...)) << format;
+    const std::vector<wchar_t> wide(format.c_str(), format.c_str() + format.size() + 1);
+    ASSERT_EQ(Format(wide.data(), arguments...), Expected(format, arguments...)) << format;
 }
 
-class RandomFormats {
-public:
-    explicit RandomFormats(unsigned seed) : m_random(seed) {}
-
+struct RandomFormats {
     std::string Make(const char* length, const char* types) {
         std::string format = "<%";
         for (char flag : {'-', '+', ' ', '#', '0'})
@@ -59,18 +49,17 @@ public:
         return format += '>';
     }
 
-    unsigned Below(unsigned bound) { return static_cast<unsigned>(m_random() % bound); }
-    unsigned long long Integer() { return m_random() >> Below(64); } // all magnitudes alike
+    unsigned Below(unsigned bound) { return static_cast<unsigned>(random() % bound); }
+    unsigned long long Integer() { return random() >> Below(64); } // all magnitudes alike
     double Real() {
         const double values[] = {static_cast<double>(Integer()) / (Below(2) ? 1000.0 : -1000.0),
-                                 std::ldexp(static_cast<double>(m_random()), static_cast<int>(Below(2000)) - 1060),
+                                 std::ldexp(static_cast<double>(random()), static_cast<int>(Below(2000)) - 1060),
                                  static_cast<double>(Below(2000)) / 8.0, // ties
                                  static_cast<double>(Below(100)) * 0.01};
         return values[Below(4)];
     }
 
-private:
-    std::mt19937_64 m_random;
+    std::mt19937_64 random;
 };
 
 // Flags that a conversion does not have are undefined: each C library makes something else of them. One also forgets
@@ -91,7 +80,7 @@ const char* RealTypes() { return Expected("%-4g", 200.0) == "200 " ? "fFeEgG" : 
 #pragma GCC diagnostic ignored "-Wformat-security"
 
 TEST(Format, IntegersEqualTheCLibrary) {
-    RandomFormats formats(1);
+    RandomFormats formats{std::mt19937_64(1)};
     for (int i = 0; i < 40000; ++i) {
         const long long corners[] = {0, -1, INT_MAX, INT_MIN, LLONG_MAX, LLONG_MIN};
         const auto value = i % 4 ? static_cast<long long>(formats.Integer()) : corners[formats.Below(6)];
@@ -105,14 +94,13 @@ TEST(Format, IntegersEqualTheCLibrary) {
 }
 
 TEST(Format, RealsEqualTheCLibrary) {
-    RandomFormats formats(2);
+    RandomFormats formats{std::mt19937_64(2)};
     for (const char* name : {"de_DE.UTF-8", "German_Germany.1252"}) std::setlocale(LC_ALL, name);
     EXPECT_EQ(Format(L"%8.3f %g", 1234.5, 0.25), "1234.500 0.25") << "in any locale";
     std::setlocale(LC_ALL, "C");
     for (int i = 0; i < 60000; ++i) Compare(formats.Make("", RealTypes()), formats.Real());
-    const double infinity = std::numeric_limits<double>::infinity();
     const double corners[] = {0.0,  -0.0, 1.0,         0.5,      1.5,       2.5,     9.9995,  1e-5,  0.0001,
-                              1e15, 1e16, 123456789.0, infinity, -infinity, DBL_MAX, DBL_MIN, 5e-324};
+                              1e15, 1e16, 123456789.0, HUGE_VAL, -HUGE_VAL, DBL_MAX, DBL_MIN, 5e-324};
     for (const char* format :
          {"%f", "%e", "%g", "%G", "%#g", "%#.0f", "%#.0e", "%.17g", "%.1100f", "%.1080e", "%.1100g", "%#.1090g"})
         for (double value : corners)
@@ -140,11 +128,12 @@ TEST(Format, RulesOfItsOwn) {
 }
 
 TEST(Format, BrokenConversionsEndTheFormatting) {
-    const std::pair<const wchar_t*, const char*> rows[] = {
-        {L"%d %n %d", "1 %n %d"}, {L"%d%", "1%"},           {L"%1$d %d", "1 %d"}, // positions and order do not mix
-        {L"%d %1$d", "1 %1$d"},   {L"%1$d %1$s", "1 %1$s"},                       // a number never is a pointer
-        {L"%33$d", "%33$d"},      {L"%1$*d", "%1$*d"},      {L"%99999999999999999999$d", "%99999999999999999999$d"}};
-    for (const auto& [format, expected] : rows) EXPECT_EQ(Format(format, 1, 2), expected);
+    using Row = std::pair<const wchar_t*, const char*>;
+    for (const auto& [format, expected] : // positions and order do not mix, a number never is a pointer
+         {Row{L"%d %n %d", "1 %n %d"}, Row{L"%d%", "1%"}, Row{L"%1$d %d", "1 %d"}, Row{L"%d %1$d", "1 %1$d"},
+          Row{L"%1$d %1$s", "1 %1$s"}, Row{L"%33$d", "%33$d"}, Row{L"%1$*d", "%1$*d"},
+          Row{L"%99999999999999999999$d", "%99999999999999999999$d"}})
+        EXPECT_EQ(Format(format, 1, 2), expected);
 }
 
 TEST(Format, BoundedAndTerminatedAtEveryCapacity) {

@@ -2,10 +2,10 @@
 
 #include "heapwatch.h"
 #include "platform/heap.h"
+#include "texts.h"
 
 #include <atomic>
 #include <TAVO/acf.h>
-#include <TAVO/string.h>
 
 namespace {
 
@@ -24,17 +24,11 @@ bool MayAllocate(std::size_t) {
 
 constexpr TAVO::Platform::HeapObserver kObserver{MayAllocate, [] { ++g_live; }, [] { --g_live; }};
 
-// Strings that a test interned go with the second sweep that finds them idle.
-void SweepPool() {
-    TAVO::String::CStringPool::Collect(60000);
-    TAVO::String::CStringPool::Collect(60000);
-}
-
 // Tests whose name or suite contains "KeepsBlocks" may leave blocks behind.
 class LeakListener : public testing::EmptyTestEventListener {
     void OnTestStart(const testing::TestInfo&) override { m_before = g_live; }
     void OnTestEnd(const testing::TestInfo& info) override {
-        SweepPool();
+        support::Sweep();
         const auto left = g_live - m_before;
         const std::string name = std::string(info.test_suite_name()) + "." + info.name();
         if (left > 0 && name.find("KeepsBlocks") == std::string::npos && !info.result()->Failed())
@@ -62,7 +56,7 @@ int main(int argc, char** argv) {
     TAVO::Platform::SetHeapObserver(&kObserver);
     TAVO::String::CPPoolString(L"Capital"); // builds the pool's tables, the one for capital letters too; they stay
     TAVO::ACF::CPIACFUnknown::Factory_UnregisterClass({}); // the same for the lock of the class registry
-    SweepPool();
+    support::Sweep();
     testing::UnitTest::GetInstance()->listeners().Append(new LeakListener);
     return RUN_ALL_TESTS();
 }

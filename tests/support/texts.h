@@ -1,15 +1,36 @@
 #pragma once
 // Random texts for the transcoders, some of them damaged, and a slow reading of texts: the reference for the fast ones.
+// And what tests of pooled strings share.
 
 #include <cstdint>
 #include <random>
-#include <TAVO/core.h>
+#include <string>
+#include <TAVO/string.h>
 #include <vector>
 
 namespace support {
 
 using Bytes = std::vector<unsigned char>;
-using Units = std::vector<unsigned short>;
+using Units16 = std::vector<unsigned short>;
+
+inline const unsigned char* Utf8(const char* text) { return reinterpret_cast<const unsigned char*>(text); }
+inline const wchar_t* Entry(const TAVO::String::CPPoolString& text) { return text; }
+// Texts that nobody holds go with the second sweep that finds them idle.
+inline bool Sweep(int times = 2) {
+    bool swept = true;
+    for (; times; --times) swept &= TAVO::String::CStringPool::Collect(60000);
+    return swept;
+}
+
+// The bytes of units, in host order or swapped.
+inline std::string BytesOf(const std::u16string& units, bool swapped = false) {
+    std::string bytes;
+    for (char16_t unit : units) {
+        const char low = static_cast<char>(unit & 0xFF), high = static_cast<char>(unit >> 8);
+        bytes.append(1, swapped ? high : low).append(1, swapped ? low : high);
+    }
+    return bytes;
+}
 
 enum class Look { Good, Invalid, Ended }; // Ended: terminator, bound, or cut by the bound
 
@@ -24,7 +45,7 @@ inline unsigned LeadLength(unsigned b) {
 }
 
 // `text` ends in a terminator; n bounds it.
-inline Character LookAt(const Bytes& text, std::size_t i, std::size_t n) {
+template <class Text> Character LookAtUtf8(const Text& text, std::size_t i, std::size_t n) {
     if (i >= n || text[i] == 0) return {Look::Ended};
     const unsigned length = LeadLength(text[i]);
     if (length == 0) return {Look::Invalid};
@@ -37,7 +58,7 @@ inline Character LookAt(const Bytes& text, std::size_t i, std::size_t n) {
     return {Look::Good, length, value};
 }
 
-inline Character LookAt(const Units& text, std::size_t i, std::size_t n) {
+template <class Text> Character LookAtUtf16(const Text& text, std::size_t i, std::size_t n) {
     if (i >= n || text[i] == 0) return {Look::Ended};
     if (text[i] < 0xD800 || text[i] > 0xDFFF) return {Look::Good, 1, text[i]};
     if (text[i] >= 0xDC00) return {Look::Invalid};
@@ -46,7 +67,10 @@ inline Character LookAt(const Units& text, std::size_t i, std::size_t n) {
     return {Look::Good, 2, text[i] % 0x400 == 0 && text[i + 1] % 0x400 == 0 ? 0u : 1u};
 }
 
-inline Units Encoded16(TAVO::ulong32 value) {
+inline Character LookAt(const Bytes& text, std::size_t i, std::size_t n) { return LookAtUtf8(text, i, n); }
+inline Character LookAt(const Units16& text, std::size_t i, std::size_t n) { return LookAtUtf16(text, i, n); }
+
+inline Units16 Encoded16(TAVO::ulong32 value) {
     if (value < 0x10000) return {static_cast<unsigned short>(value)};
     return {static_cast<unsigned short>(0xD800 | value / 0x400), static_cast<unsigned short>(0xDC00 | value % 0x400)};
 }
@@ -89,11 +113,11 @@ public:
     }
 
     // The same in units.
-    Units Utf16(std::size_t length) {
+    Units16 Utf16(std::size_t length) {
         static constexpr std::uint32_t kFirst[] = {1, 0x20, 0x80, 0x800, 0xE000, 0xDC00, 0xD800};
         static constexpr std::uint32_t kCount[] = {0x7F, 0x60, 0x780, 0xD000, 0x2000, 0x400, 0x400};
         const std::uint32_t kinds = Below(3) ? 5 : 7;
-        Units text;
+        Units16 text;
         while (text.size() < length) {
             const std::uint32_t kind = Below(kinds);
             for (std::uint32_t run = 1 + Below(Below(4) ? 8 : 80); run && text.size() < length; --run) {

@@ -1,11 +1,14 @@
 #pragma once
 // A second reader of documents, slow and plain, written from the rules: the parser is compared with it.
 
+#include "texts.h"
+
 #include <algorithm>
+#include <cctype>
 #include <cstdint>
 #include <cstdio>
 #include <optional>
-#include <sstream>
+#include <set>
 #include <string>
 #include <TAVO/xml.h>
 #include <utility>
@@ -105,11 +108,6 @@ private:
         unsigned code;
         std::size_t offset;
     };
-    // A blank of the source, or the units of a character.
-    struct Token {
-        bool blank;
-        std::u16string units;
-    };
     using Attributes = std::vector<std::pair<std::u16string, std::u16string>>;
     static constexpr char32_t kNone = 0xFFFFFFFF;
 
@@ -117,18 +115,16 @@ private:
 
     Reading Read() {
         Reading reading;
-        if (m_utf8 && !IsValid()) {
-            reading.code = 13;
-            reading.message = u"Offset: 0, Illegal UTF8 character";
-            return reading;
-        }
         try {
+            std::size_t at = 0;
+            while (m_utf8 && Length(at)) at += Length(at);
+            if (m_utf8 && at < Size()) throw Error{13, 0};
             Document();
             if (m_root) reading.outline = Outline(*m_root);
         } catch (const Error& error) {
             reading.code = error.code;
             reading.offset = error.offset;
-            reading.message = Message(error);
+            reading.message = error.code == 13 ? u"Offset: 0, Illegal UTF8 character" : Message(error);
         }
         return reading;
     }
@@ -137,6 +133,7 @@ private:
 
     std::size_t Size() const { return m_text.size(); }
     char32_t At(std::size_t i) const { return i < Size() ? m_text[i] : kNone; }
+    char32_t Here() const { return At(m_at); }
     bool Is(const char* what, std::size_t at) const {
         for (; *what; ++what, ++at)
             if (At(at) != static_cast<unsigned char>(*what)) return false;
@@ -144,41 +141,22 @@ private:
     }
     bool Is(const char* what) const { return Is(what, m_at); }
     bool AtEnd() const { return m_at >= Size(); }
+    // The end of the text is this error.
+    void NotAtEnd(unsigned code) const {
+        if (AtEnd()) throw Error{code, Size()};
+    }
     static bool Blank(char32_t c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; }
     void Blanks() {
-        while (Blank(At(m_at))) ++m_at;
+        while (Blank(Here())) ++m_at;
     }
 
-    static std::size_t Utf8Length(char32_t lead) {
-        return lead < 0x80 ? 1 : lead < 0xC0 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : lead < 0xF5 ? 4 : 0;
+    support::Character CharacterAt(std::size_t at) const {
+        return m_utf8 ? LookAtUtf8(m_text, at, Size()) : LookAtUtf16(m_text, at, Size());
     }
     // Units of the good character there, 0 for none.
-    std::size_t Length(std::size_t at) const {
-        const char32_t c = At(at);
-        if (c == kNone) return 0;
-        if (!m_utf8) {
-            if (c < 0xD800 || c > 0xDFFF) return 1;
-            return c < 0xDC00 && At(at + 1) != kNone && At(at + 1) >= 0xDBFF ? 2 : 0;
-        }
-        const std::size_t length = Utf8Length(c);
-        for (std::size_t i = 1; i < length; ++i)
-            if (At(at + i) == kNone || (At(at + i) & 0xC0) != 0x80) return 0;
-        return length;
-    }
+    std::size_t Length(std::size_t at) const { return CharacterAt(at).units; }
     // Past that character, or that unit of none.
     std::size_t Step(std::size_t at) const { return Length(at) ? Length(at) : 1; }
-    bool IsValid() const {
-        std::size_t at = 0;
-        while (Length(at)) at += Length(at);
-        return at == Size();
-    }
-    char32_t Value(std::size_t at) const {
-        const std::size_t length = m_utf8 ? Length(at) : 1;
-        if (length == 1) return At(at);
-        char32_t value = At(at) & (0xFFu >> (length + 1));
-        for (std::size_t i = 1; i < length; ++i) value = value << 6 | (At(at + i) & 0x3F);
-        return value;
-    }
     // The library's own form of a character.
     static std::u16string Wide(char32_t value) {
         if (value < 0x10000) return std::u16string(1, static_cast<char16_t>(value));
@@ -186,10 +164,9 @@ private:
     }
     // The units that the character there becomes; none of what is no character.
     std::u16string UnitsAt(std::size_t at, char32_t limit = 0x110000) const {
-        const std::size_t length = Length(at);
+        const auto [look, length, value] = CharacterAt(at);
         if (!m_utf8)
             return std::u16string(m_text.begin() + std::ptrdiff_t(at), m_text.begin() + std::ptrdiff_t(at + length));
-        const char32_t value = Value(at);
         const bool isNone = !length || !value || value >= limit || (value >= 0xD800 && value <= 0xDFFF);
         return isNone ? std::u16string() : Wide(value);
     }
@@ -200,46 +177,45 @@ private:
         if (m_utf8 && Is("\xEF\xBB\xBF")) m_at = 3;
         if (!m_utf8 && At(0) == 0xFEFF) m_at = 1;
         Blanks();
-        if (AtEnd()) throw Error{1, Size()};
+        NotAtEnd(1);
         for (; Blanks(), !AtEnd();) {
-            if (At(m_at) != '<') throw Error{5, m_at};
-            if (m_at + 1 == Size()) throw Error{4, Size()};
-            if (Is("<!")) {
-                Declaration();
-            } else if (Is("<?")) {
-                Instruction(true);
-            } else if (Is("</")) {
-                throw m_at + 2 == Size() ? Error{4, Size()} : Error{14, m_at};
-            } else {
-                if (m_root) throw Error{17, m_at};
-                m_root = Element(0);
-            }
+            if (Here() != '<') throw Error{5, m_at};
+            if (m_at + 1 == Size() || (m_at + 2 == Size() && Is("</"))) throw Error{4, Size()};
+            if (Is("</")) throw Error{14, m_at};
+            if (Markup(true)) continue;
+            if (m_root) throw Error{17, m_at};
+            m_root = Element(0);
         }
+    }
+
+    // What is not part of the tree: whether there was any.
+    bool Markup(bool top) {
+        if (!top && Is("<!--")) return Find("-->", 4, 2), true;
+        if (Is("<!")) return Declaration(), true;
+        if (Is("<?")) return Instruction(top), true;
+        return false;
     }
 
     void Declaration() {
         const std::size_t start = m_at;
         const bool comment = Is("<!--");
-        m_at += 2;
-        while (!AtEnd() && At(m_at) != '>') {
-            const char32_t quote = At(m_at);
-            const std::size_t end = quote == '"' || quote == '\'' ? m_text.find(quote, m_at + 1) : m_at;
+        for (m_at += 2; !AtEnd() && Here() != '>'; ++m_at) {
+            if (Here() != '"' && Here() != '\'') continue;
+            const std::size_t end = m_text.find(Here(), m_at + 1);
             if (end == m_text.npos) throw Error{3, m_at};
-            m_at = end + 1;
+            m_at = end;
         }
         if (AtEnd()) throw comment ? Error{2, start} : Error{1, Size()};
         ++m_at;
     }
 
-    std::size_t Find(const char* what, std::size_t from) const {
-        while (from < Size() && !Is(what, from)) ++from;
-        return from;
-    }
-
-    void Comment() {
-        const std::size_t end = Find("-->", m_at + 4);
-        if (end == Size()) throw Error{2, m_at};
+    // Past the three units that end what begins here with so many; without them, this error. Where they stand.
+    std::size_t Find(const char* what, std::size_t opening, unsigned missing) {
+        std::size_t end = m_at + opening;
+        while (end < Size() && !Is(what, end)) ++end;
+        if (end >= Size()) throw Error{missing, m_at};
         m_at = end + 3;
+        return end;
     }
 
     void Instruction(bool top) {
@@ -252,38 +228,29 @@ private:
         for (const auto& [key, value] : attributes)
             if (key == u"version" && value != u"1.0") throw Error{11, start};
         for (const auto& [key, value] : attributes) {
-            if (key != u"encoding") continue;
-            std::u16string lower;
-            for (char16_t c : value) lower += c >= 'A' && c <= 'Z' ? static_cast<char16_t>(c + 32) : c;
-            const bool known =
-                m_utf8 ? lower == u"utf-8" : lower == u"utf-16" || lower == u"iso-10646-ucs-2" || lower == u"unicode";
-            if (!known) throw Error{12, start};
+            static const std::set<std::string> kKnown[] = {{"utf-16", "iso-10646-ucs-2", "unicode"}, {"utf-8"}};
+            std::string lower = Printable(value);
+            for (char& c : lower) c = static_cast<char>(std::tolower(c));
+            if (key == u"encoding" && !kKnown[m_utf8].count(lower)) throw Error{12, start};
         }
     }
 
     // --- tags ---
 
+    // As the calls that set names are told; their tests check them.
     static bool Names(char32_t c, bool first) {
-        if (c < 0x80) {
-            const bool start = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_' || c == ':';
-            return start || (!first && ((c >= '0' && c <= '9') || c == '.' || c == '-'));
-        }
         if (c > 0xFFFF || (c >= 0xD800 && c <= 0xDFFF)) return false;
         const wchar_t text[] = {first ? static_cast<wchar_t>(c) : L'a', first ? L'\0' : static_cast<wchar_t>(c), 0};
-        TAVO::XML::CPXMLObject element;
-        return element.SetName(TAVO::String::CStringPool::GetStringRef(text));
+        return TAVO::XML::CPXMLObject().SetName(TAVO::String::CStringPool::GetStringRef(text));
     }
 
     // The name at the cursor; nothing of it is the given error, at the end of the text 4.
     std::u16string Name(unsigned missing) {
-        if (AtEnd()) throw Error{4, Size()};
+        NotAtEnd(4);
         std::u16string name;
-        for (;;) {
-            const std::size_t length = Length(m_at);
-            if (!length || (length > 1 && !m_utf8)) break;
-            if (!Names(Value(m_at), name.empty())) break;
+        while (Length(m_at) && (Length(m_at) == 1 || m_utf8) && Names(CharacterAt(m_at).value, name.empty())) {
             name += UnitsAt(m_at);
-            m_at += length;
+            m_at += Length(m_at);
         }
         if (name.empty()) throw Error{missing, m_at};
         return name;
@@ -294,31 +261,29 @@ private:
         Attributes attributes;
         for (;;) {
             Blanks();
-            const char32_t c = At(m_at);
-            if (c == kNone || c == '<') throw Error{4, m_at};
-            if (instruction ? Is("?>") : Is("/>") || c == '>') return attributes;
-            if (c == (instruction ? U'?' : U'/')) throw Error{4, m_at + 1};
-            if (c == '>') throw Error{4, m_at};
+            if (AtEnd() || Here() == '<') throw Error{4, m_at};
+            if (instruction ? Is("?>") : Is("/>") || Is(">")) return attributes;
+            if (Is(instruction ? "?" : "/")) throw Error{4, m_at + 1};
+            if (Is(">")) throw Error{4, m_at};
             const std::size_t start = m_at;
             const std::u16string name = Name(6);
             Blanks();
-            if (AtEnd()) throw Error{4, m_at};
-            if (At(m_at) != '=') throw Error{6, m_at};
+            NotAtEnd(4);
+            if (!Is("=")) throw Error{6, m_at};
             ++m_at;
             Blanks();
-            const char32_t quote = At(m_at);
-            if (quote == kNone) throw Error{4, m_at};
-            if (quote != '"' && quote != '\'') throw Error{6, m_at};
+            NotAtEnd(4);
+            if (!Is("\"") && !Is("'")) throw Error{6, m_at};
             const std::size_t opened = m_at++;
-            std::vector<Token> tokens;
-            while (At(m_at) != quote) {
+            std::u16string units;
+            while (Here() != At(opened)) {
                 if (AtEnd()) throw Error{3, opened};
-                Piece(tokens);
+                Piece(units);
             }
             ++m_at;
             for (const auto& kept : attributes)
                 if (kept.first == name) throw Error{6, start};
-            const std::u16string value = Text(tokens);
+            const std::u16string value = Text(units);
             if (!value.empty()) attributes.emplace_back(name, value);
         }
     }
@@ -329,41 +294,32 @@ private:
         ++m_at;
         element.name = Name(5);
         element.attributes = ReadAttributes(false);
-        if (Is("/>")) {
-            m_at += 2;
-            return element;
-        }
-        ++m_at;
+        const bool empty = Is("/>");
+        m_at += empty ? 2 : 1;
         bool hadData = false;
-        for (;;) {
+        while (!empty) {
             Blanks();
-            if (AtEnd()) throw Error{1, Size()};
-            const bool text = At(m_at) != '<' || Is("<![CDATA[");
-            if (text && (hadData || !element.children.empty())) throw Error{15, m_at};
-            if (text) {
+            NotAtEnd(1);
+            if (!Is("<") || Is("<![CDATA[")) {
+                if (hadData || !element.children.empty()) throw Error{15, m_at};
                 element.data = Data();
                 hadData = true;
-            } else if (Is("<!--")) {
-                Comment();
-            } else if (Is("<!")) {
-                Declaration();
-            } else if (Is("<?")) {
-                Instruction(false);
             } else if (Is("</")) {
                 EndTag(element.name, hadData ? 15 : 14);
-                return element;
-            } else {
+                break;
+            } else if (!Markup(false)) {
                 if (m_at + 1 == Size()) throw Error{4, Size()};
                 if (hadData) throw Error{15, m_at};
                 element.children.push_back(Element(depth + 1));
             }
         }
+        return element;
     }
 
     void EndTag(const std::u16string& name, unsigned wrong) {
         const std::size_t start = m_at;
         m_at += 2;
-        if (AtEnd()) throw Error{4, Size()};
+        NotAtEnd(4);
         bool same = false;
         try {
             same = Name(14) == name;
@@ -371,55 +327,48 @@ private:
         }
         if (!same) throw Error{wrong, start};
         Blanks();
-        if (At(m_at) != '>') throw Error{4, m_at};
+        if (!Is(">")) throw Error{4, m_at};
         ++m_at;
     }
 
     // --- text ---
 
     std::u16string Data() {
-        std::vector<Token> tokens;
+        std::u16string units;
         for (;;) {
-            if (AtEnd()) throw Error{1, Size()};
+            NotAtEnd(1);
             if (Is("<![CDATA[")) {
-                const std::size_t start = m_at, end = Find("]]>", m_at + 9);
-                if (end == Size()) throw Error{9, start};
-                for (m_at += 9; m_at < end;) Character(tokens);
-                m_at = end + 3;
-            } else if (Is("<!--")) {
-                Comment();
+                std::size_t at = m_at + 9;
+                const std::size_t end = Find("]]>", 9, 9);
+                while (at < end) at += Character(units, at);
             } else if (Is("<!")) {
-                Declaration();
+                Markup(false);
             } else if (Is("<")) {
-                return Text(tokens);
+                return Text(units);
             } else if (Is("]]>")) {
                 throw Error{10, m_at};
             } else {
-                Piece(tokens);
+                Piece(units);
             }
         }
     }
 
-    // Blanks at both ends go, runs of them become one.
-    static std::u16string Text(const std::vector<Token>& tokens) {
-        std::size_t first = 0, last = tokens.size();
-        while (first < last && tokens[first].blank) ++first;
-        while (last > first && tokens[last - 1].blank) --last;
+    // Blanks of the source, zeros here, go at both ends; runs of them become one.
+    static std::u16string Text(std::u16string units) {
+        units.erase(units.find_last_not_of(u'\0') + 1);
         std::u16string text;
-        for (; first < last; ++first)
-            if (!tokens[first].blank || !tokens[first - 1].blank) text += tokens[first].units;
+        for (std::size_t i = 0; i < units.size(); ++i)
+            if (units[i] || (i && units[i - 1])) text += units[i] ? units[i] : u' ';
         return text;
     }
 
-    void Piece(std::vector<Token>& tokens) {
-        if (Blank(At(m_at))) {
-            tokens.push_back({true, u" "});
-            ++m_at;
-        } else if (Is("&")) {
-            tokens.push_back({false, Wide(Reference())});
-        } else {
-            Character(tokens);
-        }
+    void Piece(std::u16string& units) {
+        if (Blank(Here()))
+            units += u'\0', ++m_at;
+        else if (Is("&"))
+            units += Wide(Reference());
+        else
+            m_at += Character(units, m_at);
     }
 
     char32_t Reference() {
@@ -432,35 +381,47 @@ private:
             return value;
         }
         std::uint64_t value = 0;
-        for (m_at += 2; At(m_at) >= '0' && At(m_at) <= ':'; ++m_at)
-            if (value < 0x200000) value = value * 10 + (At(m_at) - '0');
+        for (m_at += 2; Here() >= '0' && Here() <= ':'; ++m_at)
+            if (value < 0x200000) value = value * 10 + (Here() - '0');
         const bool allowed = value == 9 || value == 10 || value == 13 || (value >= 0x20 && value <= 0xD7FF) ||
                              (value >= 0xE000 && value <= 0x10FFFF && value != 0xFFFE && value != 0xFFFF);
-        if (At(m_at) != ';' || !allowed) throw Error{7, start};
+        if (!Is(";") || !allowed) throw Error{7, start};
         if (value >= 0x100000) throw Error{16, start};
         ++m_at;
         return static_cast<char32_t>(value);
     }
 
-    void Character(std::vector<Token>& tokens) {
-        tokens.push_back({false, UnitsAt(m_at, 0x100000)});
-        if (tokens.back().units.empty()) throw Error{16, m_at};
-        m_at += Length(m_at);
+    std::size_t Character(std::u16string& units, std::size_t at) const {
+        const std::u16string more = UnitsAt(at, 0x100000);
+        if (more.empty()) throw Error{16, at};
+        units += more;
+        return Length(at);
     }
 
     // --- the message ---
 
     std::u16string Message(const Error& error) const {
-        std::istringstream texts(
-            "Bad file|End of file|Open comment|Open string|Open enclosure|Invalid tag|Bad attribute|"
-            "Bad escape|External replacement|Open CDATA section|Bad data terminator|"
-            "Version != 1.0|Unsupported encoding specified|Bad character encoding|"
-            "Bad termination tag|Mixed content|Illegal character|Root element missing|DOM error");
-        std::string text;
-        for (unsigned code = 0; code <= error.code; ++code) std::getline(texts, text, '|');
+        static const char* const kTexts[] = {"Bad file",
+                                             "End of file",
+                                             "Open comment",
+                                             "Open string",
+                                             "Open enclosure",
+                                             "Invalid tag",
+                                             "Bad attribute",
+                                             "Bad escape",
+                                             "External replacement",
+                                             "Open CDATA section",
+                                             "Bad data terminator",
+                                             "Version != 1.0",
+                                             "Unsupported encoding specified",
+                                             "Bad character encoding",
+                                             "Bad termination tag",
+                                             "Mixed content",
+                                             "Illegal character",
+                                             "Root element missing"};
         const auto lines = std::count(m_text.begin(), m_text.begin() + std::ptrdiff_t(error.offset), U'\n');
-        const std::string header = "[" + text + ", Line " + std::to_string(lines + 1) + ", Offset " +
-                                   std::to_string(error.offset) + (error.offset > 60 ? "]..." : "]");
+        const std::string header = std::string("[").append(kTexts[error.code]) + ", Line " + std::to_string(lines + 1) +
+                                   ", Offset " + std::to_string(error.offset) + (error.offset > 60 ? "]..." : "]");
         std::u16string message(header.begin(), header.end());
         std::size_t at = error.offset > 60 ? error.offset - 60 : 0;
         // What the error position cuts is no character of the excerpt.
@@ -472,8 +433,7 @@ private:
                 message += u' ';
         message += u"[[*]]";
         for (; at < Size() && message.size() < 120; at += Step(at)) message += UnitsAt(at);
-        if (at < Size()) message += u"...";
-        return message;
+        return at < Size() ? message + u"..." : message;
     }
 
     std::u32string m_text;

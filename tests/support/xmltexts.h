@@ -16,17 +16,6 @@ inline std::u16string ToUtf16(const std::string& text) {
     return std::filesystem::path(bytes).u16string();
 }
 
-// The bytes of units, in host order or swapped.
-inline std::string BytesOf(const std::u16string& units, bool swapped = false) {
-    std::string bytes;
-    for (char16_t unit : units) {
-        const char low = static_cast<char>(unit & 0xFF), high = static_cast<char>(unit >> 8);
-        bytes += swapped ? high : low;
-        bytes += swapped ? low : high;
-    }
-    return bytes;
-}
-
 template <class... Arguments> Reading OpenText(Arguments... arguments) {
     TAVO::XML::CXMLDoc document;
     const bool opened = document.OpenDocText(arguments...);

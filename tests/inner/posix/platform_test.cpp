@@ -1,23 +1,28 @@
-// Linux: library names, UTF-8 as the code page, protected pages.
+// Linux: library names, UTF-8 as the code page, turns at the pool's lock, threads of the host's Boost.
 
 #include "platform/platform.h"
-#include "support/guardpage.h"
+#include "poollock.h"
 
+#include <atomic>
+#include <boost/thread/thread_only.hpp>
+#include <chrono>
+#include <cstring>
 #include <gtest/gtest.h>
+#include <sched.h>
+#include <TAVO/threading.h>
+#include <thread>
 
 using namespace TAVO;
+using namespace TAVO::Threading;
 
 TEST(ConfigurationPath, DropsVersionDigits) {
-    const struct {
-        const wchar_t* path;
-        std::size_t stem;
-    } rows[] = {
-        {L"/lib/libTAVO.so", 12},  {L"/lib/libTAVO.so.1.20.3", 12}, {L"/lib/a-1.2.so.3", 10}, {L"", 0},
-        {L"/lib/libTAVO.1.2", 14}, {L"/lib/libTAVO.so.x1", 15},     {L"/a.b/libTAVO", 0},     {L"/a.so.1/lib", 0}};
-    for (const auto& row : rows) {
+    using Row = std::pair<const wchar_t*, std::size_t>;
+    for (const auto& [path, stem] :
+         {Row{L"/lib/libTAVO.so", 12}, Row{L"/lib/libTAVO.so.1.20.3", 12}, Row{L"/lib/a-1.2.so.3", 10}, Row{L"", 0},
+          Row{L"/lib/libTAVO.1.2", 14}, Row{L"/lib/libTAVO.so.x1", 15}, Row{L"/a.b/lib", 0}, Row{L"/a.so.1/lib", 0}}) {
         std::size_t length = 0;
-        while (row.path[length]) ++length;
-        EXPECT_EQ(Platform::FindConfigurationStem(row.path, length), row.stem) << row.stem;
+        while (path[length]) ++length;
+        EXPECT_EQ(Platform::FindConfigurationStem(path, length), stem);
     }
 }
 
@@ -34,12 +39,11 @@ TEST(CodePage, IsUtf8AndReplacesWhatHasNoForm) {
     };
     wchar_t wide[16];
     char narrow[32];
-    for (const auto& row : rows) {
-        ASSERT_GT(Platform::AnsiToWide(row.first, -1, wide, 16), 0);
-        EXPECT_STREQ(wide, row.second) << row.first;
-        if (&row - rows >= 2) continue; // the others lose something
-        ASSERT_GT(Platform::WideToAnsi(row.second, -1, narrow, 32), 0);
-        EXPECT_STREQ(narrow, row.first);
+    for (const auto& [utf8, units] : rows) {
+        ASSERT_GT(Platform::AnsiToWide(utf8, -1, wide, 16), 0);
+        EXPECT_STREQ(wide, units) << utf8;
+        Platform::WideToAnsi(units, -1, narrow, 32);
+        EXPECT_EQ(std::strcmp(narrow, utf8) == 0, units[0] != L'a' && units[0] != 0xFFFD) << "these lose something";
     }
     EXPECT_EQ(Platform::WideToAnsi(L"\xD83D\xDE00", 1, narrow, 8), 3) << "a length that cuts a pair";
     ASSERT_EQ(Platform::WideToAnsi(L"\xDC00\xD800", -1, narrow, 32), 7);
@@ -48,10 +52,56 @@ TEST(CodePage, IsUtf8AndReplacesWhatHasNoForm) {
     EXPECT_EQ(Platform::AnsiToWide("\xF0\x9F\x98\x80", 4, wide, 2), 2);
 }
 
-TEST(Memory, ProtectedPagesAreUnreadable) {
-    const support::GuardedMemory memory;
-    EXPECT_TRUE(Platform::IsReadable(memory.End() - 1)) << "the last byte before";
-    for (const std::uintptr_t address :
-         {reinterpret_cast<std::uintptr_t>(memory.End()), std::uintptr_t{0}, UINTPTR_MAX})
-        EXPECT_FALSE(Platform::IsReadable(reinterpret_cast<void*>(address))) << address;
+// On one processor, where the scheduler does as told: a thread that leaves the lock only to take it again. The other,
+// of the lowest class, never runs in between, so without being handed the lock over it would wait for ever.
+TEST(PoolLock, IsHandedOverToASleeper) {
+    String::pool::Lock lock;
+    std::atomic<bool> held{false};
+    std::atomic<int> turns{0};
+    const auto onOneProcessor = [](auto body) {
+        return std::thread([=] {
+            cpu_set_t allowed;
+            sched_getaffinity(0, sizeof allowed, &allowed);
+            for (int i = 0; CPU_COUNT(&allowed) > 1; ++i) CPU_CLR(i, &allowed);
+            sched_setaffinity(0, sizeof allowed, &allowed);
+            body();
+        });
+    };
+    constexpr int kNever = 600; // some ten do, more on a busy machine, since the sleeper runs when nobody else wants to
+    int holds = 0;
+    auto greedy = onOneProcessor([&] {
+        lock.Enter();
+        held = true;
+        for (; turns < 5 && holds < kNever; ++holds) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(5));
+            lock.Leave();
+            lock.Enter();
+        }
+        lock.Leave();
+    });
+    while (!held) std::this_thread::yield();
+    auto sleeper = onOneProcessor([&] {
+        const sched_param parameters{};
+        sched_setscheduler(0, SCHED_IDLE, &parameters);
+        for (; turns < 5; ++turns) lock.Enter(), lock.Leave();
+    });
+    greedy.join();
+    sleeper.join();
+    EXPECT_LT(holds, kNever);
+}
+
+// Threads that a host started with the Boost that the library uses, too.
+TEST(ForeignThread, IsNotInterruptedByWaits) {
+    bool asked = false;
+    const CPEvent event(false);
+    boost::thread host([&] {
+        event.Wait(WaitForever);
+        EXPECT_EQ(event.Wait(2), WaitTimedOut);
+        CurrentThread::sleep(2);
+        asked = boost::this_thread::interruption_requested();
+    });
+    host.interrupt();
+    event.Set();
+    host.join();
+    EXPECT_TRUE(asked) << "still to be answered by the host";
 }
