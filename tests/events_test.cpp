@@ -6,7 +6,7 @@
 
 #include <algorithm>
 #include <chrono>
-#include <memory>
+#include <list>
 #include <random>
 
 using namespace TAVO::Threading;
@@ -14,6 +14,8 @@ using support::Job;
 using TAVO::ulong32;
 
 namespace {
+
+using Clock = std::chrono::steady_clock;
 
 // Some time that no clock measures.
 void Spin(unsigned long long turns) {
@@ -38,37 +40,28 @@ TEST(Events, FollowANaiveModel) {
         const auto place = std::find(attached.begin(), attached.end(), &one);
         const bool isAttached = place != attached.end();
         const std::size_t index = random() % kEvents;
-        const ulong32 ms = random() % 500 == 0;
-        switch (random() % 8) {
-        case 0:
-        case 1:
-            one.set = random() % 2;
+        const ulong32 ms = random() % 500 == 0, act = random() % 8;
+        if (act < 2) {
+            one.set = act != 0;
             one.set ? one.event.Set() : one.event.Reset();
-            break;
-        case 2:
+        } else if (act == 2) {
             ASSERT_EQ(one.event.Wait(ms), one.set ? 0 : WaitTimedOut) << step;
             one.set &= one.manual;
-            break;
-        case 3:
-        case 4:
+        } else if (act < 5) {
             ASSERT_NE(multiple.Attach(one.event), isAttached) << step;
             if (!isAttached) attached.push_back(&one);
-            break;
-        case 5:
+        } else if (act == 5) {
             ASSERT_EQ(multiple.Detach(one.event), isAttached) << step;
             if (isAttached) attached.erase(place);
-            break;
-        case 6:
+        } else if (act == 6) {
             ASSERT_EQ(multiple.Reset(index), index < attached.size()) << step;
             if (index < attached.size()) attached[index]->set = false;
-            break;
-        default: {
+        } else {
             const auto first = std::find_if(attached.begin(), attached.end(), [](Model* m) { return m->set; });
             const auto found = static_cast<unsigned long long>(first - attached.begin());
             const auto none = attached.empty() ? WaitNoState : WaitTimedOut;
             ASSERT_EQ(multiple.Wait(ms), first == attached.end() ? none : found) << step;
             if (first != attached.end()) (*first)->set &= (*first)->manual;
-        }
         }
     }
 }
@@ -93,16 +86,16 @@ TEST(Events, NoSignalIsLostOrUsedTwice) {
     const std::function<void()> kinds[] = {[&] { waitFor(WaitForever); }, [&] { waitFor(1); }, poll};
     std::mt19937 random(2);
     for (unsigned chosen = 1; chosen < 8; ++chosen) { // every set of kinds at once
-        std::vector<std::unique_ptr<Job>> jobs;
+        std::list<Job> jobs;
         for (int kind = 0; kind < 3; ++kind)
-            if (chosen >> kind & 1) jobs.push_back(std::make_unique<Job>(kinds[kind]));
-        const auto patience = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+            if (chosen >> kind & 1) jobs.emplace_back(kinds[kind]);
+        const auto patience = Clock::now() + std::chrono::seconds(20);
         used = 0;
         for (int round = 1; round <= kRounds; ++round) {
             Spin(random() % 4000);
             last.Set();
             first.Set();
-            while (used < 2 * round && std::chrono::steady_clock::now() < patience) std::this_thread::yield();
+            while (used < 2 * round && Clock::now() < patience) std::this_thread::yield();
         }
         stop.Set();
         jobs.clear();
@@ -125,13 +118,12 @@ TEST(Events, AnInterruptedWaitUsesNoSignal) {
         });
         while (!began) std::this_thread::yield();
         if (round % 8 == 0) CurrentThread::sleep(1);
-        {
-            Job setter([&event, pause = random() % 2000] {
-                Spin(pause);
-                event.Set();
-            });
-            EXPECT_TRUE(job.thread.Terminate());
-        }
+        std::thread setter([&event, pause = random() % 2000] {
+            Spin(pause);
+            event.Set();
+        });
+        EXPECT_TRUE(job.thread.Terminate());
+        setter.join();
         ASSERT_EQ(event.Wait(0), used ? WaitTimedOut : 0) << round;
     }
 }
@@ -163,9 +155,9 @@ TEST(Events, TimeOutsAreNeverShorter) {
         [&] { return event.Wait(15) == WaitTimedOut; }, [&] { return multiple.Wait(15) == WaitTimedOut; },
         [&] { return job.thread.Wait(15) == WaitTimedOut; }, [] { return CurrentThread::sleep(15), true; }};
     for (const auto& wait : waits) {
-        const auto start = std::chrono::steady_clock::now();
+        const auto start = Clock::now();
         EXPECT_TRUE(wait());
-        const std::chrono::duration<double> taken = std::chrono::steady_clock::now() - start;
+        const std::chrono::duration<double> taken = Clock::now() - start;
         EXPECT_TRUE(taken.count() >= 0.015 && taken.count() < 10) << &wait - waits << ": " << taken.count();
     }
     event.Set();

@@ -33,18 +33,16 @@ struct Work final : IMaintenanceRequest {
     std::atomic<unsigned long long> due{0};
     Gate runs;
 
-    explicit Work(std::function<void()> body = {}, std::function<void()> question = {})
+    explicit Work(
+        std::function<void()> body = [] {}, std::function<void()> question = [] {})
         : run(std::move(body)), ask(std::move(question)) {}
 
     const wchar_t* GetName() override { return L"work"; }
-    unsigned long long GetDueTime() override {
-        if (ask) ask();
-        return due;
-    }
+    unsigned long long GetDueTime() override { return ask(), due; }
     void Run() override {
         due = kNever;
         runs.Step();
-        if (run) run();
+        run();
     }
     std::int32_t GetPriority() override { return 0; }
 };
@@ -88,13 +86,12 @@ TEST(Maintenance, RefusesWhatItCannotKeep) {
     std::atomic<int> granted{0};
     Gate asked;
     CPWork curious;
-    curious->due = kNever;
-    curious->ask = [&] {
-        if (RegisterRequest(work) || UnregisterRequest(curious)) ++granted;
-        asked.Step();
-    };
+    curious = CPWork([] {},
+                     [&] {
+                         granted += RegisterRequest(work) || UnregisterRequest(curious);
+                         asked.Step();
+                     });
     EXPECT_TRUE(RegisterRequest(curious) && asked.Reached(1) && UnregisterRequest(curious));
-    curious->ask = {};
     EXPECT_EQ(granted, 0);
 }
 
@@ -104,7 +101,7 @@ TEST(Maintenance, ThrowingRequestsAreRetiredAndMayComeBack) {
     const auto fail = [&] {
         if (broken) throw std::runtime_error("broken");
     };
-    const CPWork runner(fail), asker(std::function<void()>(), fail), sound;
+    const CPWork runner(fail), asker([] {}, fail), sound;
     EXPECT_TRUE(RegisterRequest(runner) && RegisterRequest(asker) && runner->runs.Reached(1));
     EXPECT_TRUE(RegisterRequest(sound) && sound->runs.Reached(1)) << "the thread goes on";
     runner->due = sound->due = 0;
@@ -119,12 +116,11 @@ TEST(Maintenance, ThrowingRequestsAreRetiredAndMayComeBack) {
 TEST(Maintenance, LeavingWaitsForTheRunAndNothingIsCalledAfterwards) {
     const Running services;
     for (int round = 0; round < 50; ++round) {
-        std::atomic<bool> gone{false};
-        std::atomic<int> calledAfterwards{0};
+        std::atomic<int> gone{0}, calledAfterwards{0};
         const auto look = [&] { calledAfterwards += gone; };
         CPWork work(look, look);
         EXPECT_TRUE(RegisterRequest(work) && work->runs.Reached(round % 2) && UnregisterRequest(work));
-        gone = true;
+        gone = 1;
         Wake();
         EXPECT_EQ(work.lockcnt(), 1u) << "the list's handle is gone";
         EXPECT_EQ(calledAfterwards, 0);
@@ -141,11 +137,10 @@ TEST(Maintenance, LeavingGivesUpAfterTenSecondsAlsoInTheOwnRunIntended) {
     EXPECT_TRUE(RegisterRequest(work) && work->runs.Reached(1));
     const auto before = Core::OS::GetTimeNow();
     UnregisterRequest(work);
-    const auto waited = Core::OS::GetTimeNow() - before;
+    EXPECT_GE(Core::OS::GetTimeNow() - before, 9000u);
     // Whoever of the two gives up first lets the run end, which may still save the other one.
     while (work.lockcnt() > 1) std::this_thread::yield();
     EXPECT_FALSE(own);
-    EXPECT_GE(waited, 9000u);
     EXPECT_TRUE(UnregisterRequest(work)) << "removed when the run ended";
     work->run = {};
 }
@@ -175,25 +170,21 @@ TEST(Maintenance, StartsStopsAndRegistersOnManyThreadsAndAStopIsQuick) {
             for (int i = 0; i < 100; ++i) {
                 const Running services;
                 const CPWork work;
-                EXPECT_TRUE(RegisterRequest(work));
-                EXPECT_TRUE(work->runs.Reached(i % 3 == t % 2));
+                EXPECT_TRUE(RegisterRequest(work) && work->runs.Reached(i % 3 == t % 2));
                 Wake();
                 EXPECT_TRUE(UnregisterRequest(work));
             }
         });
     for (auto& thread : threads) thread.join();
     EXPECT_FALSE(IsRunning());
-
     ASSERT_TRUE(AppInit());
     const auto before = Develop::_now_milli();
     AppExit();
     EXPECT_LE(Develop::_now_milli() - before, 50u);
-}
 
-TEST(Maintenance, StartingAndRegisteringSurviveAFailingHeap) {
     support::ForEachFailingAllocation([] {
         const bool started = AppInit();
-        EXPECT_EQ(started, IsRunning() && started);
+        EXPECT_TRUE(!started || IsRunning());
         CPWork work;
         const bool registered = work.key() && RegisterRequest(work);
         EXPECT_TRUE(!registered || UnregisterRequest(work));

@@ -30,8 +30,7 @@ const ParseRow kParseRows[] = {
     {L"c:a\\b", PathRootDriveRelative, {L"c:", L"a\\", L"b", L""}},
     {L"\\\\server\\share\\a\\b.c", PathRootNetwork, {L"\\\\server\\share\\", L"a\\", L"b", L".c"}},
     {L"\\\\.\\pipe\\x", PathRootDevice, {L"\\\\.\\", L"pipe\\", L"x", L""}},
-    {L"\\\\?\\UNC\\server\\share\\a", PathRootDevice, {L"\\\\?\\UNC\\server\\share\\", L"", L"a", L""}},
-};
+    {L"\\\\?\\UNC\\server\\share\\a", PathRootDevice, {L"\\\\?\\UNC\\server\\share\\", L"", L"a", L""}}};
 
 } // namespace
 

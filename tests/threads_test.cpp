@@ -32,7 +32,7 @@ TEST(Threads, RunAnObjectAndLetItGo) {
     EXPECT_TRUE(failing.thread.Wait(WaitForever) == 0 && failing.State() == ThreadFailed);
 }
 
-TEST(Threads, RefuseWhatTheyCannotRun) {
+TEST(Threads, RefuseWhatTheyCannotRunAndAnswerForTheirClassOnly) {
     CPThread thread;
     EXPECT_FALSE(thread.Execute(CPObjectMemory(), 0) || thread.Execute(CPEvent(true), 0) || thread.key());
     int runs = 0;
@@ -43,9 +43,6 @@ TEST(Threads, RefuseWhatTheyCannotRun) {
         EXPECT_EQ(thread.Wait(WaitForever), started ? 0 : WaitNoState);
         EXPECT_EQ(runs, started);
     });
-}
-
-TEST(Threads, AnswerForTheirClassOnly) {
     const CPObjectMemory object = Wrapper::Create();
     Wrapper* wrapper = Wrapper::From(object); // at the begin of the payload
     _acfUID other = support::Call::uid;
@@ -53,8 +50,7 @@ TEST(Threads, AnswerForTheirClassOnly) {
     const auto query = Wrapper::_vtbl.queryinterface;
     EXPECT_EQ(query(wrapper, acfTypeOf<IThreadExecute>::uid), static_cast<IThreadExecute*>(wrapper));
     EXPECT_TRUE(query(wrapper, support::Call::uid) == &wrapper->Object() && !query(wrapper, other));
-    EXPECT_EQ(wrapper->QueryInterface(support::Call::uid), &wrapper->Object());
-    EXPECT_EQ(Wrapper::From(CPEvent(true)), nullptr);
+    EXPECT_TRUE(wrapper->QueryInterface(support::Call::uid) == &wrapper->Object() && !Wrapper::From(CPEvent(true)));
 }
 
 TEST(Threads, EndAtEveryInterruptionPoint) {
@@ -63,15 +59,12 @@ TEST(Threads, EndAtEveryInterruptionPoint) {
     EXPECT_TRUE(nothing.Attach(never));
     set.Set();
     Job other([&] { never.Wait(WaitForever); });
-    const std::function<void()> points[] = {
-        [] { CurrentThread::sleep(100000); },
-        [&] { never.Wait(WaitForever); },
-        [&] { nothing.Wait(WaitForever); },
-        [&] { other.thread.Wait(WaitForever); },
-        [&] {
-            for (;;) set.Wait(0); // one that never has to wait is one, too
-        },
+    const auto endless = [&] {
+        for (;;) set.Wait(0); // one that never has to wait is one, too
     };
+    const std::function<void()> points[] = {[] { CurrentThread::sleep(100000); }, [&] { never.Wait(WaitForever); },
+                                            [&] { nothing.Wait(WaitForever); }, [&] { other.thread.Wait(WaitForever); },
+                                            endless};
     for (const auto& point : points)
         for (const bool asleep : {false, true}) {
             const CPEvent begun(false);
@@ -100,9 +93,10 @@ TEST(Threads, AreLeftToThemselvesAfterFiveSeconds) {
     go = true;
 }
 
-TEST(Threads, CannotWaitForThemselves) {
+// Intended: thread-runs-on
+TEST(Threads, CannotWaitForThemselvesAndRunOnWithoutHandles_Intended) {
     const CPEvent go(false);
-    bool interrupted = false;
+    bool interrupted = false, ended = false;
     Job job([&] {
         go.Wait(WaitForever); // until the handle is complete
         CPThread self = job.thread;
@@ -114,15 +108,9 @@ TEST(Threads, CannotWaitForThemselves) {
     go.Set();
     while (job.object.lockcnt() > 1) std::this_thread::yield(); // it was detached
     EXPECT_TRUE(interrupted && job.State() == ThreadFailed);
-}
-
-// Intended: thread-runs-on
-TEST(Threads, RunOnWithoutHandles_Intended) {
-    const CPEvent go(false);
-    bool ended = false;
     {
-        Job job([&] { ended = go.Wait(60000) == 0; });
-        job.thread.free();
+        Job left([&] { ended = go.Wait(60000) == 0; });
+        left.thread.free();
         go.Set();
     }
     EXPECT_TRUE(ended);

@@ -1,5 +1,6 @@
 // The command-line tool, run as its users run it: what it prints, writes and answers.
 
+#include "support/log.h"
 #include "support/process.h"
 #include "support/scratch.h"
 
@@ -18,12 +19,7 @@ const std::string kNotes = TAVO_TEST_DATA "/notes-utf16.xml";
 // Both platforms take UTF-8 here: the tool's arguments, and wide paths through the library for the rest.
 struct Folder {
     support::ScratchFolder scratch;
-    support::WideText wide = scratch.Path();
-    std::string operator/(const std::string& name) const {
-        std::string path;
-        for (const wchar_t* unit = wide; *unit; ++unit) path += static_cast<char>(*unit);
-        return path + '/' + name;
-    }
+    std::string operator/(const std::string& name) const { return support::Ascii(scratch.Path()) + '/' + name; }
     // ASCII names only.
     std::string Put(const std::string& name, const std::string& bytes) const {
         support::Put(support::Widen(*this / name), bytes);
@@ -33,8 +29,9 @@ struct Folder {
 
 std::string Get(const std::string& path) { return support::Get(support::Widen(path)); }
 bool Contains(const std::string& text, const std::string& part) { return text.find(part) != text.npos; }
+// Empty stands for nothing at all, and what begins with '=' for the whole text.
 bool Tells(const std::string& text, const std::string& part) {
-    return part.empty() ? text.empty() : Contains(text, part);
+    return part.empty() || part[0] == '=' ? text == part.substr(!part.empty()) : Contains(text, part);
 }
 
 // The units of an ASCII text, low byte first or last.
@@ -44,30 +41,21 @@ std::string Utf16(const std::string& ascii, bool bigEndian = false) {
     return bytes;
 }
 
-void ExpectRun(const Finished& run, int code, const std::string& output, const std::string& errors) {
-    EXPECT_EQ(run.code, code);
-    EXPECT_EQ(run.output, output);
-    EXPECT_TRUE(Tells(run.errors, errors)) << run.errors;
-}
-
 // A command's arguments stand between bars.
 Finished Call(const std::string& command, const std::string& input = {}) {
-    std::vector<std::string> arguments(1);
-    for (const char c : command)
-        if (c == '|')
-            arguments.emplace_back();
-        else
-            arguments.back() += c;
+    std::vector<std::string> arguments;
+    std::istringstream stream(command + '|');
+    for (std::string each; std::getline(stream, each, '|');) arguments.push_back(each);
     return RunTool(arguments, input);
 }
 
 struct Row {
     std::string arguments; // behind those that all rows have
     int code;
-    std::string output, errors = {}; // parts of what is written; empty for nothing at all
+    std::string output, errors = {};
 };
 
-void ExpectRows(const std::string& command, const std::string& input, std::initializer_list<Row> rows) {
+void ExpectRows(const std::string& command, const std::string& input, const std::vector<Row>& rows) {
     for (const Row& row : rows) {
         const Finished run = Call(command + row.arguments, input);
         EXPECT_TRUE(run.code == row.code && Tells(run.output, row.output) && Tells(run.errors, row.errors))
@@ -80,9 +68,7 @@ void ExpectRows(const std::string& command, const std::string& input, std::initi
 
 TEST(ToolCheck, TellsCodeLineColumnAndOffset) {
     const struct {
-        std::string text;
-        const char* complaint; // with "line:column: " before it
-        const char* words;
+        std::string text, complaint, words;
     } rows[] = {
         {"", "1:1: error 0 (Bad file) at offset 0: ", "empty"},
         {"\xEF\xBB\xBF<a", "1:3: error 4 (Open enclosure) at offset 5: ", "'>'"},
@@ -94,51 +80,41 @@ TEST(ToolCheck, TellsCodeLineColumnAndOffset) {
         {Utf16("<a>\n\n<b/>x</a>"), "3:5: error 15 (Mixed content) at offset 9: ", "not both"},
         {Utf16("<a></b>", true), "1:4: error 14 (Bad termination tag) at offset 3: ", "match"},
         {Utf16("<a>") + std::string("\x3D\xD8\x00\xDE", 4) + Utf16("</b>"), // columns count pairs once
-         "1:5: error 15 (Mixed content) at offset 5: ", "not both"},
-    };
+         "1:5: error 15 (Mixed content) at offset 5: ", "not both"}};
     for (const auto& row : rows) {
-        const Finished run = RunTool({"xml", "check", "-"}, row.text);
-        EXPECT_TRUE(run.code == kBadInput && run.errors.empty()) << run.errors;
-        EXPECT_EQ(run.output.find(std::string("(standard input):") + row.complaint), 0u) << run.output;
-        EXPECT_TRUE(Contains(run.output, row.words)) << run.output;
+        ExpectRows("xml|check|-", row.text, {{"", kBadInput, "(standard input):" + row.complaint}});
+        ExpectRows("xml|check|-", row.text, {{"", kBadInput, row.words}});
     }
-    ExpectRun(Call("xml|check|-", "<a b=\"&amp;\">&lt;&#65;<!-- & --><![CDATA[&]]></a>"), kFine,
-              "(standard input): fine\n", "2 references by name");
+    ExpectRows("xml|check|-", "<a b=\"&amp;\">&lt;&#65;<!-- & --><![CDATA[&]]></a>",
+               {{"", kFine, "=(standard input): fine\n", "2 references by name"}});
 }
 
 TEST(ToolCheck, StopsOrKeepsGoing) {
     const Folder folder;
     const std::string good = folder.Put("good.xml", "<a/>"), bad = folder.Put("bad.xml", "<a>");
-    const std::string none = folder / "none.xml";
-    Finished run = RunTool({"xml", "check", good, bad, good});
-    EXPECT_EQ(run.code, kBadInput);
-    EXPECT_EQ(run.output.find(good + ": fine\n" + bad + ":1:4: error 1 "), 0u) << run.output;
-    EXPECT_EQ(run.output.find(": fine"), run.output.rfind(": fine"));
+    const std::string none = folder / "none.xml", fine = good + ": fine\n", wrong = bad + ":1:4: error 1 (";
+    EXPECT_FALSE(Contains(Call("xml|check|" + bad + '|' + good).output, fine));
     ExpectRows("xml|check|", "",
-               {{"--keep-going|" + bad + '|' + none + '|' + good, kFileTrouble, good + ": fine\n", none + ": does not"},
+               {{good + '|' + bad + '|' + good, kBadInput, fine + wrong},
+                {"--keep-going|" + bad + '|' + none + '|' + good, kFileTrouble, fine, none + ": does not"},
                 {none + '|' + good, kFileTrouble, "", none + ": does not exist"},
                 {folder / ".", kFileTrouble, "", "is a folder"},
                 {folder / "new/none.xml", kFileTrouble, "", "does not exist"}});
     EXPECT_FALSE(TAVO::Files::OS::_TestDirExists(support::Widen(folder / "new"))) << "looking makes no folders";
 }
 
-TEST(ToolTree, OutlinesAndJson) {
-    const std::string text = "<a b=\"1\" c=\"&#34;\"><d>x\xC3\xA9<![CDATA[\n\\\t\x01]]></d><e/></a>";
-    ExpectRun(Call("xml|tree|-", text), kFine, "a b=\"1\" c=\"\\\"\"\n  d: \"x\xC3\xA9\\n\\\\\\t\\u0001\"\n  e\n", "");
-    ExpectRun(Call("xml|tree|--json|-", text), kFine,
-              "{\"name\":\"a\",\"attributes\":{\"b\":\"1\",\"c\":\"\\\"\"},\"children\":[\n"
-              "{\"name\":\"d\",\"text\":\"x\xC3\xA9\\n\\\\\\t\\u0001\"},\n{\"name\":\"e\"}]}\n",
-              "");
-}
-
-TEST(ToolTree, MayBeDeeperThanAnyStack) {
-    constexpr std::size_t kDepth = 100000;
+TEST(ToolTree, OutlinesAndJsonDeeperThanAnyStack) {
+    ExpectRows("xml|tree|", "<a b=\"1\" c=\"&#34;\"><d>x\xC3\xA9<![CDATA[\n\\\t\x01]]></d><e/></a>",
+               {{"-", kFine, "=a b=\"1\" c=\"\\\"\"\n  d: \"x\xC3\xA9\\n\\\\\\t\\u0001\"\n  e\n"},
+                {"--json|-", kFine,
+                 "={\"name\":\"a\",\"attributes\":{\"b\":\"1\",\"c\":\"\\\"\"},\"children\":[\n"
+                 "{\"name\":\"d\",\"text\":\"x\xC3\xA9\\n\\\\\\t\\u0001\"},\n{\"name\":\"e\"}]}\n"}});
     std::string text;
-    for (std::size_t i = 0; i < kDepth; ++i) text += "<a>";
-    for (std::size_t i = 0; i < kDepth; ++i) text += "</a>";
-    EXPECT_TRUE(Contains(Call("xml|tree|-", text).output, "(99999) a\n"));
-    EXPECT_EQ(Call("xml|tree|--json|-", text).code, kFine);
-    EXPECT_EQ(Call("xml|format|--strict|-|-o|-", text).code, kFine);
+    for (const char* tag : {"<a>", "</a>"})
+        for (int depth = 0; depth < 100000; ++depth) text += tag;
+    ExpectRows(
+        "xml|", text,
+        {{"tree|-", kFine, "(99999) a\n"}, {"tree|--json|-", kFine, "{"}, {"format|--strict|-|-o|-", kFine, "<a/>"}});
 }
 
 TEST(ToolGet, FindsTextsAndAttributes) {
@@ -148,7 +124,10 @@ TEST(ToolGet, FindsTextsAndAttributes) {
                 {"bins", kBadInput, "", "10 elements and no text"},
                 {"bins/bin/clip/media", kFine, "\n"},
                 {"", kUsage, "", "no path"},
-                {".|--attribute|1", kUsage, "", "no attribute"}});
+                {".|--attribute|1", kUsage, "", "no attribute"},
+                {"bins/bin/clip|--attribute|rate|--as|rational", kFine, "=50/1\n"},
+                {"bins/bin/clip|--attribute|rate|--as|number", kUsage, "", "not in"},
+                {"bins/bin/clip|--attribute|name|--as|int", kBadInput, "", "clip name: \"Harbour 01\""}});
 }
 
 TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
@@ -164,9 +143,6 @@ TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
         {"timecode", "10:00:00:00 {25/1}Hz", "10:00:00:00 {25/1}Hz"},
         {"id", "00000000-0000-0000-0000-000000000000", "00000000-0000-0000-0000-000000000000"},
         {"binary", "21BA", "12ab"}};
-    for (const auto& [type, text, value] : values)
-        ExpectRun(Call(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>"), kFine,
-                  std::string(value) + '\n', "");
     const char* const faults[][3] = {{"int", "+x7", "character 2 is \"x\", where a digit belongs"},
                                      {"hex", "0xg", "character 3 is \"g\", where a hexadecimal digit"},
                                      {"double", "-.", "it ends where character 3, a digit, belongs"},
@@ -179,13 +155,11 @@ TEST(ToolGet, ReadsValuesOrNamesTheCharacter) {
                                      {"id", "{15603cd4-ab81-4d6f-b05f-c6bea760a789}", "without braces"},
                                      {"binary", "21B", "it ends where character 4, the second digit"},
                                      {"binary", "", "it ends where character 1, a hexadecimal digit"}};
-    for (const auto& [type, text, fault] : faults)
-        ExpectRows(std::string("xml|get|-|.|--as|") + type, std::string("<v>") + text + "</v>",
-                   {{"", kBadInput, "", fault}});
-    ExpectRows("xml|get|" + kTimeline + "|bins/bin/clip|--attribute|", "",
-               {{"rate|--as|rational", kFine, "50/1\n"},
-                {"rate|--as|number", kUsage, "", "not in"},
-                {"name|--as|int", kBadInput, "", "clip name: \"Harbour 01\""}});
+    const auto get = [](const char* type, const std::string& text, const Row& row) {
+        ExpectRows(std::string("xml|get|-|.|--as|") + type, "<v>" + text + "</v>", {row});
+    };
+    for (const auto& [type, text, value] : values) get(type, text, {"", kFine, std::string("=") + value + '\n'});
+    for (const auto& [type, text, fault] : faults) get(type, text, {"", kBadInput, "", fault});
 }
 
 TEST(ToolSet, ChangesTextsAndAttributes) {
@@ -200,15 +174,13 @@ TEST(ToolSet, ChangesTextsAndAttributes) {
                 {"b|\xF4\x80\x80\x80", kBadInput, "", "cannot be kept"},
                 {".|&|--attribute|x", kFine, "<a x=\"&amp;\"><b>old" + rest, "comes back as \"<;\""},
                 {"b|\xF0\x9F\x98\x80|--strict", kBadInput, "", "not written"}});
-
     const Folder folder;
     const std::string file = folder.Put("a.xml", "<a><b>1</b></a>");
-    ExpectRun(RunTool({"xml", "set", file, "b", "2", "-o", file}), kFine, "", "");
-    const std::string changed = Get(file);
-    EXPECT_TRUE(Contains(changed, "<a><b>2</b></a>"));
-    EXPECT_EQ(RunTool({"xml", "set", file, "b", "x  y", "--strict", "-o", file}).code, kBadInput);
-    EXPECT_EQ(RunTool({"xml", "set", file, "q", "3", "-o", file}).code, kBadInput);
-    EXPECT_EQ(Get(file), changed) << "left alone on failure";
+    ExpectRows("xml|set|" + file + "|-o|" + file, "",
+               {{"|b|2", kFine, ""},
+                {"|b|x  y|--strict", kBadInput, "", "not written"},
+                {"|q|3", kBadInput, "", "there is no q"}});
+    EXPECT_TRUE(Contains(Get(file), "<a><b>2</b></a>")) << "left alone on failure";
 }
 
 // The tree of each sample stays the same through every form of output, from files and standard input.
@@ -216,13 +188,13 @@ TEST(ToolFormat, KeepsTheSamplesInEveryEncoding) {
     const Folder folder;
     const std::string out = folder / "out.xml";
     for (const std::string& sample : {kTimeline, kNotes}) {
-        const std::string tree = RunTool({"xml", "tree", sample}).output;
+        const std::string tree = Call("xml|tree|" + sample).output;
         EXPECT_GT(tree.size(), 500u);
         for (const std::string form : {"utf-8", "utf-16|--pretty", "utf-16-raw", "utf-8|--pretty"}) {
             const std::string command = "xml|format|--strict|--encoding|" + form;
-            ExpectRun(Call(command + '|' + sample + "|-o|" + out), kFine, "", "");
-            EXPECT_EQ(RunTool({"xml", "tree", out}).output, tree) << form;
-            ExpectRun(Call(command + "|-|-o|-", Get(sample)), kFine, Get(out), "");
+            ExpectRows(command, "", {{'|' + sample + "|-o|" + out, kFine, ""}});
+            ExpectRows("xml|tree|" + out, "", {{"", kFine, '=' + tree}});
+            ExpectRows(command, Get(sample), {{"|-|-o|-", kFine, '=' + Get(out)}});
         }
     }
 }
@@ -230,14 +202,14 @@ TEST(ToolFormat, KeepsTheSamplesInEveryEncoding) {
 // Characters above U+FFFF: shown as they came, lost in every output but the raw one, and the tool says so.
 TEST(ToolFormat, TellsWhatIsLost) {
     const std::string smile = "\xF0\x9F\x98\x80", pair("\x3D\xD8\x00\xDE", 4), utf8 = "<a>" + smile + "</a>";
-    const std::string utf16 = Utf16("<a>") + pair + Utf16("</a>");
-    for (const std::string& text : {utf8, utf16}) {
-        ExpectRun(Call("xml|get|-|.", text), kFine, smile + '\n', "");
-        const std::string lost = "the text \"" + smile + "\" in a, which comes back as \"\\u0001\"";
-        ExpectRows("xml|format|-|-o|-|--encoding|", text,
-                   {{"utf-8", kFine, "<a>\x01</a>", lost}, {"utf-16", kFine, Utf16("<a>\x01</a>"), lost}});
-    }
-    ExpectRows("xml|format|-|-o|-|--encoding|utf-16-raw|--strict", utf16, {{"", kFine, pair}});
+    const std::string utf16 = Utf16("<a>") + pair + Utf16("</a>"), format = "format|-|-o|-|--encoding|";
+    const std::string lost = "the text \"" + smile + "\" in a, which comes back as \"\\u0001\"";
+    for (const std::string& text : {utf8, utf16})
+        ExpectRows("xml|", text,
+                   {{"get|-|.", kFine, '=' + smile + '\n'},
+                    {format + "utf-8", kFine, "<a>\x01</a>", lost},
+                    {format + "utf-16", kFine, Utf16("<a>\x01</a>"), lost}});
+    ExpectRows("xml|", utf16, {{format + "utf-16-raw|--strict", kFine, Utf16(">") + pair}});
 }
 
 TEST(ToolFiles, MayHaveAnyName) {
@@ -245,17 +217,18 @@ TEST(ToolFiles, MayHaveAnyName) {
     for (const char* name : {"with blank.xml", "\xC3\xA9t\xC3\xA9.xml", "\xE6\x97\xA5\xE6\x9C\xAC.xml",
                              "\xF0\x9F\x98\x80.xml", "-minus.xml"}) {
         const std::string file = folder / name;
-        ExpectRun(RunTool({"xml", "format", kNotes, "-o", file}), kFine, "", "");
-        ExpectRun(RunTool({"xml", "check", file}), kFine, file + ": fine\n", "");
+        ExpectRows(
+            "xml|", "",
+            {{"format|" + kNotes + "|-o|" + file, kFine, ""}, {"check|" + file, kFine, '=' + file + ": fine\n"}});
     }
-    EXPECT_EQ(support::List(folder.wide).size(), 5u);
-    ExpectRows("xml|stat|", "",
-               {{kTimeline + '|' + kNotes, kFine, "2 documents\n  size                  67,023 bytes\n"},
-                {"none.xml|" + kNotes, kFileTrouble, "elements              19,", "does not exist"}});
-    ExpectRun(RunTool({"xml", "format", kNotes, "-o", folder / "."}), kFileTrouble, "", "cannot be opened for writing");
+    EXPECT_EQ(support::List(folder.scratch.Path()).size(), 5u);
+    ExpectRows("xml|", "",
+               {{"stat|" + kTimeline + '|' + kNotes, kFine, "2 documents\n  size                  67,023 bytes\n"},
+                {"stat|none.xml|" + kNotes, kFileTrouble, "elements              19,", "does not exist"},
+                {"format|" + kNotes + "|-o|" + folder / ".", kFileTrouble, "", "cannot be opened for writing"}});
 }
 
-TEST(ToolTimecode, TakesSystemsByNameCodeAndRate) {
+TEST(ToolTimecode, TakesSystemsAndCounts) {
     ExpectRows("tc|show|0|--system|", "",
                {{"ntsc(df)", kFine, "system            2 NTSC(DF)\n"},
                 {"30000/1001/D", kFine, "system            2 NTSC(DF)\n"},
@@ -267,19 +240,6 @@ TEST(ToolTimecode, TakesSystemsByNameCodeAndRate) {
                 {"14", kUsage, "", "codes go from 0 to 13"},
                 {"29.97", kUsage, "", "give a name, a code, or a rate"},
                 {"\xFF", kUsage, "", "\"\xEF\xBF\xBD\" is no system"}});
-}
-
-TEST(ToolTimecode, ShowsAPositionInEveryForm) {
-    ExpectRun(RunTool({"tc", "show", "--json", "--system", "PAL", "--", "-48"}), kFine,
-              "{\"system\":{\"code\":0,\"name\":\"PAL\"},\"count\":-48,\"fields\":-2,\"frames\":-1,"
-              "\"wholeFrames\":true,\"seconds\":-0.04,\"sign\":-1,\"days\":0,\"hh\":0,\"mm\":0,\"ss\":0,\"ff\":1,"
-              "\"fixedText\":\"-00:00:00:01\",\"universalText\":\"23:59:59:24-{25/1}Hz\"}\n",
-              "");
-    ExpectRows("tc|show|9223372036854775807|--system|PAL", "", // counts beyond 32 bits of fields are not cut
-               {{"", kFine, "fields            384307168202282325\n"}, {"", kFine, "days              88959992639\n"}});
-}
-
-TEST(ToolTimecode, ReadsCountsWithUnits) {
     ExpectRows("tc|check|--system|0|", "",
                {{"+1200", kFine, "PAL, 1200 base"},
                 {"1.5s", kFine, "PAL, 1800 base"},
@@ -308,11 +268,10 @@ TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
         {"10:00:00:00\xC3\xA9{25/1}Hz", valid + "PAL, 43200000 base units"}, // any mark does
         {"10:00:00:00\xC3\xA9{25\xC3\xA9", "character 16 is \"\xC3\xA9\", where \"/\" within"},
         {"99999999999:0:0:0 {25/1}Hz", "the number of the hours does not fit 32 bits"},
-        {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "47 characters at most, and this one 120"},
-    };
-    std::vector<std::string> arguments = {"tc", "check", "--"};
-    for (const auto& row : rows) arguments.push_back(row.first);
-    const Finished run = RunTool(arguments);
+        {"10:00:00:00 {25/1}Hz" + std::string(100, ' '), "47 characters at most, and this one 120"}};
+    std::string command = "tc|check|--";
+    for (const auto& row : rows) command += '|' + row.first;
+    const Finished run = Call(command);
     EXPECT_EQ(run.code, kBadInput) << "the worst of all";
     std::istringstream lines(run.output);
     std::string line;
@@ -325,19 +284,25 @@ TEST(ToolTimecode, ChecksTextsAndTellsWhatIsWrong) {
                 {"2|00:01:00:00", kBadInput, invalid + "the frames are 00: NTSC(DF) skips this label"},
                 {"1|00:01:00;02", kBadInput, invalid + "its separators are those of HD30 and not of NTSC"},
                 {"1|10:00:00:00 {25/1}Hz", kBadInput, invalid + "its rate is that of PAL and not of NTSC"}});
-    ExpectRun(RunTool({"tc", "check", "--json", "10:00:00:25"}), kBadInput,
-              "[\n{\"text\":\"10:00:00:25\",\"verdict\":\"invalid\",\"reason\":\"the frames are 25: PAL counts 00 to "
-              "24\"}\n]\n",
-              "");
 }
 
-TEST(ToolTimecode, Computes) {
+TEST(ToolTimecode, ComputesAndShows) {
     ExpectRows(
         "tc|", "",
-        {{"systems|--json", kFine,
+        {{"check|--json|10:00:00:25", kBadInput,
+          "=[\n{\"text\":\"10:00:00:25\",\"verdict\":\"invalid\",\"reason\":\"the frames are 25: PAL counts 00 to "
+          "24\"}\n]\n"},
+         {"show|--json|--system|PAL|--|-48", kFine,
+          "={\"system\":{\"code\":0,\"name\":\"PAL\"},\"count\":-48,\"fields\":-2,\"frames\":-1,"
+          "\"wholeFrames\":true,\"seconds\":-0.04,\"sign\":-1,\"days\":0,\"hh\":0,\"mm\":0,\"ss\":0,\"ff\":1,"
+          "\"fixedText\":\"-00:00:00:01\",\"universalText\":\"23:59:59:24-{25/1}Hz\"}\n"},
+         // counts beyond 32 bits of fields are not cut
+         {"show|9223372036854775807|--system|PAL", kFine, "fields            384307168202282325\n"},
+         {"show|9223372036854775807|--system|PAL", kFine, "days              88959992639\n"},
+         {"show|10:00:00:25", kBadInput, "", "the frames are 25"},
+         {"systems|--json", kFine,
           "{\"code\":9,\"name\":\"PAL(PX)\",\"rate\":\"25/2\",\"frameUnits\":96,\"fieldUnits\":48,"
           "\"unitSeconds\":0.0008333333333333334,\"drop\":null,\"separators\":\".,:\"},\n"},
-         {"show|10:00:00:25", kBadInput, "", "the frames are 25"},
          {"convert|10:00:00:00|--to|NTSC(DF)", kFine, "count             43200000\n"},
          {"convert|00.00.01,00|--to|PAL", kFine, "system            0 PAL\n", "warning: no standard knows HDFILM(DF)"},
          {"convert|1200|--to|PAL", kBadInput, "", "does not tell its system"},
@@ -351,9 +316,6 @@ TEST(ToolTimecode, Computes) {
           "    +0           72000   00.01.00.04  00:01:00:04 {60000/1001}Hz/D\n"},
          {"table|--system|PAL|--frames|0|--json", kFine, "\"count\":72000,"},
          {"table|--system|PAL|--frames|-1", kUsage, "", "--frames"}});
-}
-
-TEST(ToolRational, Approximates) {
     ExpectRows("rational|approx|--max-den|", "",
                {{"3|--|-0.3333", kFine, "fraction          -1/3\n"},
                 {"1|", kBadInput, "", "character 1"},
@@ -379,22 +341,21 @@ TEST(ToolUsage, HasCodesOfItsOwn) {
 
 // Long enough for a progress line on a terminal; but this is none.
 TEST(ToolProgress, StaysOutOfFiles) {
-    const Finished run = RunTool({"xml", "stat", "--repeat", support::RepeatsFor(1000, kTimeline), kTimeline});
+    const Finished run = Call("xml|stat|" + kTimeline + "|--repeat|" + support::RepeatsFor(1000, kTimeline));
     EXPECT_TRUE(run.code == kFine && run.errors.empty() && !Contains(run.output, "\x1b")) << run.errors;
 }
 
 TEST(ToolId, ParsesFormatsAndMakes) {
-    const std::string id = "15603CD4-AB81-4D6F-B05F-C6BEA760A789", lower = "15603cd4-ab81-4d6f-b05f-c6bea760a789";
-    for (const std::string& text : {id, lower, '{' + id + '}', std::string("15603CD4AB814D6FB05Fc6bea760a789")})
-        ExpectRun(RunTool({"id", "parse", text}), kFine, '"' + text + "\": " + id + '\n', "");
-    const std::string ends = ": invalid: it ends where character ";
-    ExpectRows(
-        "id|parse|", "",
-        {{"", kBadInput, ends + "1, a hexadecimal digit, belongs; the library reads the null identifier"},
-         {id + "\xC3\xA9", kBadInput, "character 37 is \"\xC3\xA9\", where the end belongs; the library reads 1"},
-         {'{' + id, kBadInput, ends + "38, \"}\", belongs; the library refuses it"}});
-    ExpectRows("id|format|x", "", {{"", kBadInput, "", "no identifier"}});
-    EXPECT_EQ(RunTool({"id", "parse", Call("id|new|--count|3").output.substr(74, 36)}).code, kFine);
+    const std::string id = "15603CD4-AB81-4D6F-B05F-C6BEA760A789", ends = ": invalid: it ends where character ";
+    for (const std::string& text : {id, '{' + id + '}', std::string("15603CD4AB814D6FB05Fc6bea760a789")})
+        ExpectRows("id|parse|", "", {{text, kFine, "=\"" + text + "\": " + id + '\n'}});
+    ExpectRows("id|", "",
+               {{"parse|", kBadInput, ends + "1, a hexadecimal digit, belongs; the library reads the null identifier"},
+                {"parse|" + id + "\xC3\xA9", kBadInput,
+                 "character 37 is \"\xC3\xA9\", where the end belongs; the library reads 1"},
+                {"parse|{" + id, kBadInput, ends + "38, \"}\", belongs; the library refuses it"},
+                {"format|x", kBadInput, "", "no identifier"},
+                {"parse|" + Call("id|new|--count|3").output.substr(74, 36), kFine, "-4"}});
 }
 
 TEST(ToolCodec, CodesFilesAndPipes) {
@@ -403,32 +364,29 @@ TEST(ToolCodec, CodesFilesAndPipes) {
     for (int byte = 0; byte < 256; ++byte) all += static_cast<char>(byte);
     const std::string source = folder.Put("bytes", all), text = folder / "text";
     for (const std::string code : {"3fff", "hex"}) {
-        ExpectRun(Call("codec|encode|" + code + "|" + source + "|-o|" + text), kFine, "", "");
-        ExpectRun(Call("codec|decode|" + code + "|" + text), kFine, all, "");
-        ExpectRun(Call("codec|decode|" + code, "\xEF\xBB\xBF" + Get(text) + "\r\n"), kFine, all, "");
+        ExpectRows("codec|encode|" + code, "", {{"|" + source + "|-o|" + text, kFine, ""}});
+        ExpectRows("codec|decode|" + code, "\xEF\xBB\xBF" + Get(text) + "\r\n",
+                   {{"|" + text, kFine, '=' + all}, {"", kFine, '=' + all}});
     }
-    ExpectRun(Call("codec|decode|hex", "\xFE\xFF" + Utf16("4F4b", true)), kFine, "OK", "");
-    ExpectRun(Call("codec|encode|3f", std::string("\0\x0E", 2)), kFine, "\xC4\x81!\x01!!\n",
-              "1 of 2 bytes would come back changed, the first at offset 1");
+    ExpectRows("codec|decode|hex", "\xFE\xFF" + Utf16("4F4b", true), {{"", kFine, "=OK"}});
+    ExpectRows("codec|encode|3f", std::string("\0\x0E", 2),
+               {{"", kFine, "=\xC4\x81!\x01!!\n", "1 of 2 bytes would come back changed, the first at offset 1"}});
 }
 
 TEST(ToolCodec, TellsThePlaceOfFaults) {
     const std::string header = "\xCC\x86", unit = "\xE4\x80\x80", utf16 = "\xFF\xFE\x06\x03";
     const struct {
-        const char* code;
-        std::string text, complaint;
-    } rows[] = {
-        {"3fff", "\xEF\xBB\xBFx", "1, at offset 3: U+0078 is no header: that is U+0301 to U+0307"},
-        {"3fff", header + unit + unit + unit + '\n', "5, at offset 11: the text ends within a group of four units"},
-        {"3fff", header + unit + "\xE4\x80", "3, at offset 5: E4 80 is truncated"},
-        {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+1F600 belongs to no code"},
-        {"3fff", utf16 + "@", "2, at offset 4: the text ends within a unit"},
-        {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
-        {"3f", "\xC4\x82!%!!", "3, at offset 3: U+0025 does not belong there"},
-        {"hex", "4F 4", "5, at offset 4: the text ends within a byte"},
-    };
+        std::string code, text, complaint;
+    } rows[] = {{"3fff", "\xEF\xBB\xBFx", "1, at offset 3: U+0078 is no header: that is U+0301 to U+0307"},
+                {"3fff", header + unit + unit + unit + '\n', "5, at offset 11: the text ends within a group of four"},
+                {"3fff", header + unit + "\xE4\x80", "3, at offset 5: E4 80 is truncated"},
+                {"3fff", "\xF0\x9F\x98\x80", "1, at offset 0: U+1F600 belongs to no code"},
+                {"3fff", utf16 + "@", "2, at offset 4: the text ends within a unit"},
+                {"3f", "\xC4\x83", "1, at offset 0: U+0103 stands for a size that is a multiple of 3"},
+                {"3f", "\xC4\x82!%!!", "3, at offset 3: U+0025 does not belong there"},
+                {"hex", "4F 4", "5, at offset 4: the text ends within a byte"}};
     for (const auto& row : rows)
-        ExpectRun(Call("codec|decode|" + std::string(row.code), row.text), kBadInput, "", "unit " + row.complaint);
+        ExpectRows("codec|decode|", row.text, {{row.code, kBadInput, "", "unit " + row.complaint}});
 }
 
 TEST(ToolCrc, GivesTheCheckValueOfEachName) {
@@ -441,21 +399,18 @@ TEST(ToolCrc, GivesTheCheckValueOfEachName) {
     unsigned names = 0;
     for (std::string name, meaning; list >> name && std::getline(list >> std::ws, meaning); ++names) {
         const bool isAlias = meaning[0] != '-';
-        const std::string expected = valueOf(isAlias ? meaning : name) + "  -\n";
+        const std::string expected = '=' + valueOf(isAlias ? meaning : name) + "  -\n";
         std::replace(meaning.begin(), meaning.end(), ' ', '|');
-        EXPECT_EQ(Call("crc|--name|" + name, digits).output, expected) << name;
-        EXPECT_EQ(Call("crc|" + (isAlias ? "--name|" + name : meaning), digits).output, expected) << name;
+        ExpectRows("crc|", digits,
+                   {{"--name|" + name, kFine, expected}, {isAlias ? "--name|" + name : meaning, kFine, expected}});
     }
     EXPECT_EQ(names, 32u);
-}
-
-TEST(ToolCrc, ReadsFilesAndNumbers) {
     const Folder folder;
     const std::string empty = folder.Put("empty", ""), large = folder.Put("large", std::string(3000000, 'x'));
-    ExpectRun(Call("crc|--name|crc-16|" + empty + "|no such file|" + large), kFileTrouble,
-              "0000  " + empty + "\n" + "cb0b  " + large + '\n', "no such file: does not exist");
     ExpectRows("crc|", "",
-               {{"--name|crc-99", kUsage, "", "\"crc-99\" is no name"},
+               {{"--name|crc-16|" + empty + "|no such file|" + large, kFileTrouble,
+                 "=0000  " + empty + "\ncb0b  " + large + '\n', "no such file: does not exist"},
+                {"--name|crc-99", kUsage, "", "\"crc-99\" is no name"},
                 {"--width|8", kUsage, "", "--poly HEX"},
                 {"--name|crc-8|--refin", kUsage, "", "--name NAME alone"},
                 {"--width|8|--poly|107", kUsage, "", "\"107\" is no hexadecimal number of 8 bits"}});
@@ -477,8 +432,7 @@ TEST(ToolUrl, EscapesAndNamesWhatIsNot) {
 
 TEST(ToolText, ValidatesByTheStandard) {
     const struct {
-        const char* encoding;
-        std::string text, told;
+        std::string encoding, text, told;
     } rows[] = {
         {"utf-8", "\xF0\x8F\xBF\xBF", "1:1: invalid utf-8 at byte offset 0: F0 8F BF BF is overlong: U+FFFF takes 3"},
         {"utf-8", "\xF4\x90\x80\x80", "F4 90 80 80 is U+110000, above U+10FFFF"},
@@ -488,15 +442,10 @@ TEST(ToolText, ValidatesByTheStandard) {
         {"utf-16", "\xFE\xFF" + Utf16("a", true) + std::string("\xD8\x00\x00", 3), "4: D800 is a lone high surrogate"},
         {"utf-16be", Utf16("a", true) + "a", ":1:2: invalid utf-16be at byte offset 2: the text is truncated"},
         {"utf-32be", std::string("\0\x11\0\0", 4), "00110000 is above U+10FFFF"},
-    };
-    for (const auto& row : rows) {
-        const Finished run = RunTool({"text", "validate", "--from", row.encoding, "-"}, row.text);
-        EXPECT_TRUE(run.code == kBadInput && Contains(run.output, row.told)) << run.output << run.errors;
-    }
-    ExpectRows("text|validate|--json|-", "\xFE\xFF\xD8\x3D\xDE",
-               {{"", kBadInput,
-                 "\"encoding\":\"utf-16\",\"valid\":false,\"line\":1,\"column\":1,\"offset\":2,\"reason\":"
-                 "\"D83D is a lone high surrogate"}});
+        {"utf-16|--json", "\xFE\xFF\xD8\x3D\xDE",
+         "\"encoding\":\"utf-16\",\"valid\":false,\"line\":1,\"column\":1,\"offset\":2,\"reason\":"
+         "\"D83D is a lone high surrogate"}};
+    for (const auto& row : rows) ExpectRows("text|validate|-|--from|", row.text, {{row.encoding, kBadInput, row.told}});
 }
 
 TEST(ToolText, Recodes) {

@@ -112,13 +112,11 @@ TEST(FileUrls, OfPathsAndBack_Intended) {
     const struct {
         const wchar_t* path;
         const char* url; // behind "file:///"
-    } rows[] = {
-        {L"C:\\a b\\c.mov", "C%3A%5Ca%20b%5Cc.mov"},
-        {L"/home/x", "/home/x"},
-        {L"\\\\srv\\s\\100%", "%5C%5Csrv%5Cs%5C100%25"},
-        {L"\\\\?\\C:\\\u00E9\u65E5~", "%5C%5C%3F%5CC%3A%5C%C3%A9%E6%97%A5~"},
-        {L"/", "/"},
-    };
+    } rows[] = {{L"C:\\a b\\c.mov", "C%3A%5Ca%20b%5Cc.mov"},
+                {L"/home/x", "/home/x"},
+                {L"\\\\srv\\s\\100%", "%5C%5Csrv%5Cs%5C100%25"},
+                {L"\\\\?\\C:\\\u00E9\u65E5~", "%5C%5C%3F%5CC%3A%5C%C3%A9%E6%97%A5~"},
+                {L"/", "/"}};
     for (const auto& row : rows) {
         const CUTF8Char url = file_EncodeURL(row.path);
         EXPECT_EQ(Text(url), std::string("file:///") + row.url);
@@ -136,25 +134,23 @@ TEST(FileUrls, ForeignForms) {
     const struct {
         const char* url;
         const wchar_t* path; // null: none
-    } rows[] = {
-        {"file:///C:/a", L"C:/a"},
-        {"FILE://LocalHost/c%3a%5CX", L"c:\\X"},
-        {"file:///", L"/"},
-        {"file:///C:a", L"/C:a"},
-        {"file:///%5Ca", L"\\a"},
-        {"file://server/share/a%20b", L"//server/share/a b"},
-        {"file://localhost", L"//localhost"},
-        {"file:///%C3%A9%zz%", L"/\u00E9%zz%"},
-        {"file:///%F0%90%80%80", L"/\xD840\xDC00"}, // the library's own pair
-        {"file://", nullptr},
-        {"file:/a", nullptr},
-        {" file:///a", nullptr},
-        // Intended: file-url-whole
-        {"file:///a%00b", nullptr},
-        {"file:///a%FFb", nullptr},
-        {"file:///a%C3", nullptr},
-        {"file:///a%F4%90%80%80", nullptr},
-    };
+    } rows[] = {{"file:///C:/a", L"C:/a"},
+                {"FILE://LocalHost/c%3a%5CX", L"c:\\X"},
+                {"file:///", L"/"},
+                {"file:///C:a", L"/C:a"},
+                {"file:///%5Ca", L"\\a"},
+                {"file://server/share/a%20b", L"//server/share/a b"},
+                {"file://localhost", L"//localhost"},
+                {"file:///%C3%A9%zz%", L"/\u00E9%zz%"},
+                {"file:///%F0%90%80%80", L"/\xD840\xDC00"}, // the library's own pair
+                {"file://", nullptr},
+                {"file:/a", nullptr},
+                {" file:///a", nullptr},
+                // Intended: file-url-whole
+                {"file:///a%00b", nullptr},
+                {"file:///a%FFb", nullptr},
+                {"file:///a%C3", nullptr},
+                {"file:///a%F4%90%80%80", nullptr}};
     for (const auto& row : rows) {
         const CACFWChar path = file_DecodeURL(Bytes(row.url));
         EXPECT_TRUE(row.path ? path && WideText(path) == WideText(row.path) : !path) << row.url;

@@ -29,17 +29,15 @@ void ExpectCompletion(const std::string& shell, const std::string& ask) {
     ASSERT_TRUE(mkdtemp(folder));
     const std::string enter = std::string("cd ") + folder + " && ";
     Shell(enter + "touch 'take one.xml' reel.xml && " + support::ToolPath() + " help completion " + shell + " >script");
-    const std::pair<const char*, std::string> rows[] = {
-        {"x", "xml\n"},
-        {"xml s", "set\nstat\n"},
-        {"xml check --k", "--keep-going\n"},
-        {"xml set reel.xml --encoding utf-16", "utf-16\nutf-16-raw\n"},
-        {"xml format reel.xml -o re", "reel.xml\n"},
-        {"xml check ta", "take one.xml\n"},
-        {"tc show --system NTSC", "NTSC\nNTSC(DF)\nNTSC(PX)\n"},
-        {"rational approx --max-den ", ""},
-        {"nothing --max", ""},
-    };
+    const std::pair<const char*, std::string> rows[] = {{"x", "xml\n"},
+                                                        {"xml s", "set\nstat\n"},
+                                                        {"xml check --k", "--keep-going\n"},
+                                                        {"xml set reel.xml --encoding utf-16", "utf-16\nutf-16-raw\n"},
+                                                        {"xml format reel.xml -o re", "reel.xml\n"},
+                                                        {"xml check ta", "take one.xml\n"},
+                                                        {"tc show --system NTSC", "NTSC\nNTSC(DF)\nNTSC(PX)\n"},
+                                                        {"rational approx --max-den ", ""},
+                                                        {"nothing --max", ""}};
     for (const auto& [words, expected] : rows)
         EXPECT_EQ(Shell(enter + ask + " '" + words + "' | sort").output, expected) << shell << ": " << words;
     Shell(std::string("rm -r ") + folder);
