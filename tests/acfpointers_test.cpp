@@ -18,6 +18,7 @@ const cacfuid kProbe = acfTypeOf<IProbe>::uid, kUnknown = acfTypeOf<IACFUnknown>
 const cacfuid kClass("24508B8F-A78E-4243-9E68-71AA029C838A");
 
 std::size_t Word(CPIACFUnknown& wrapper) { return reinterpret_cast<std::size_t>(*wrapper.rec()); }
+std::size_t Checked(const Probe& probe) { return reinterpret_cast<std::size_t>(&probe) | 1; }
 
 // A pointer as a creation call leaves it, with a reference.
 void PutRaw(CPIACFUnknown& wrapper, IACFUnknown& object) {
@@ -36,6 +37,7 @@ template <class Wrapper> struct WrapperOfAnyKind : testing::Test {
     Probe probe;
     ~WrapperOfAnyKind() override { EXPECT_EQ(probe.references, 1); }
 };
+using Wrapper = WrapperOfAnyKind<CPIACFUnknown>;
 using Kinds = testing::Types<CPIACFUnknown, Chosen, Typed>;
 TYPED_TEST_SUITE(WrapperOfAnyKind, Kinds);
 
@@ -44,8 +46,7 @@ TYPED_TEST_SUITE(WrapperOfAnyKind, Kinds);
 TYPED_TEST(WrapperOfAnyKind, OwnsOneReferenceOfItsType) {
     Probe& probe = this->probe;
     TypeParam empty, held(&probe);
-    EXPECT_TRUE(!empty && Word(empty) == 1 && probe.asked == this->type);
-    EXPECT_EQ(Word(held), reinterpret_cast<std::size_t>(&probe) | 1);
+    EXPECT_TRUE(!empty && Word(empty) == 1 && probe.asked == this->type && Word(held) == Checked(probe));
     TypeParam copy(held);
     EXPECT_TRUE(copy == held && copy != empty && held.GetLockCount() == 3);
     EXPECT_EQ(probe.queries, 2) << "a copy queries";
@@ -64,7 +65,8 @@ TYPED_TEST(WrapperOfAnyKind, OwnsOneReferenceOfItsType) {
     EXPECT_TRUE(!copy && Word(held) == 1 && held.GetLockCount() == 0);
 }
 
-TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFails) {
+// Intended: wrapper-keeps-stored
+TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFailsAndIntendedKeepsWhatWasStored) {
     Probe& probe = this->probe;
     for (const Mode query : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
         const TypeParam good(&probe);
@@ -76,17 +78,11 @@ TYPED_TEST(WrapperOfAnyKind, StaysEmptyWhereTheQueryFails) {
         EXPECT_EQ(Word(raw), 1u) << "released, once";
         probe.query = Mode::Gives;
     }
-}
-
-// Intended: wrapper-keeps-stored
-TYPED_TEST(WrapperOfAnyKind, IntendedResolvingKeepsWhatWasStored) {
-    Probe& probe = this->probe;
     Probe other;
     probe.given = &other;
     TypeParam raw;
     PutRaw(raw, probe);
-    EXPECT_TRUE(raw && Word(raw) == (reinterpret_cast<std::size_t>(&probe) | 1));
-    EXPECT_TRUE(probe.references == 1 && other.references == 2);
+    EXPECT_TRUE(raw && Word(raw) == Checked(probe) && probe.references == 1 && other.references == 2);
     probe.AddRef(); // the wrapper will release what it stored, not what it queried
 }
 
@@ -115,8 +111,8 @@ TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactoriesIntended) {
                 {Mode::Throws, Mode::Gives, false, false},
                 {Mode::GivesNull, Mode::Gives, false, false},
                 {Mode::Gives, Mode::Refuses, true, false}}; // a plain wrapper finds out at its first use
+    TypeParam wrapper(&this->probe);
     for (const auto& row : rows) {
-        TypeParam wrapper(&this->probe);
         factory.creation = row.creation;
         factory.made.query = row.query;
         const bool answer = this->type == kUnknown ? row.created : row.typed;
@@ -124,10 +120,10 @@ TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactoriesIntended) {
         EXPECT_TRUE(wrapper.createInstance(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
         EXPECT_TRUE(factory.askedClass == kClass && factory.askedType == kUnknown);
         EXPECT_EQ(factory.made.references, row.typed ? 2 : 1);
+        wrapper = &this->probe;
     }
     EXPECT_EQ(factory.components, 4) << "half of them";
     factory.creation = factory.made.query = Mode::Gives;
-    TypeParam wrapper(&this->probe);
     EXPECT_FALSE(wrapper.createComponent(kClass) || wrapper) << "no factory of the process";
     ASSERT_TRUE(CPIACFUnknown::Factory_Set(&factory));
     EXPECT_TRUE(wrapper.createComponent(kClass) && wrapper && wrapper.createInstance(kClass) && wrapper);
@@ -139,39 +135,31 @@ TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactoriesIntended) {
     EXPECT_TRUE(wrapper.createInstance(kClass, nullptr) && !wrapper);
 }
 
-TEST(Wrapper, TakesPointersOfOtherKinds) {
-    Probe probe;
-    {
-        Typed typed(&probe);
-        CPIACFUnknown plain(typed);
-        probe.asked.reset();
-        plain = std::move(typed); // another type: queried, and the source lets go
-        EXPECT_TRUE(probe.asked == kUnknown && !typed && probe.references == 2);
-        typed = plain;
-        EXPECT_TRUE(probe.asked == kProbe && typed->Answer() == 42);
-        IPACF chosen(acfTypeOf<IACFClassFactory>::uid, &probe);
-        EXPECT_FALSE(chosen);
-        chosen = IPACF(kProbe, &probe); // with its type
-        EXPECT_TRUE(kProbe == chosen.GetType() && chosen == typed);
-    }
-    EXPECT_EQ(probe.references, 1);
+TEST_F(Wrapper, TakesPointersOfOtherKinds) {
+    Typed typed(&probe);
+    CPIACFUnknown plain(typed);
+    probe.asked.reset();
+    plain = std::move(typed); // another type: queried, and the source lets go
+    EXPECT_TRUE(probe.asked == kUnknown && !typed && probe.references == 2);
+    typed = plain;
+    EXPECT_TRUE(probe.asked == kProbe && typed->Answer() == 42);
+    IPACF chosen(acfTypeOf<IACFClassFactory>::uid, &probe);
+    EXPECT_FALSE(chosen);
+    chosen = IPACF(kProbe, &probe); // with its type
+    EXPECT_TRUE(kProbe == chosen.GetType() && chosen == typed);
 }
 
-TEST(Wrapper, ComparesAndCountsWithoutResolving) {
-    Probe probe;
-    {
-        CPIACFUnknown raw, checked(&probe), zero;
-        PutRaw(raw, probe);
-        *zero.rec() = nullptr;
-        IACFUnknown* out = nullptr;
-        EXPECT_TRUE(raw == checked && zero == CPIACFUnknown() && raw.GetLockCount() == 3);
-        EXPECT_TRUE(raw.QueryRawInterface(&out) && out == &probe && probe.queries == 1);
-        out->Release();
-        EXPECT_FALSE(raw.QueryRawInterface(nullptr) || zero.QueryRawInterface(&out) || out || zero);
-        probe.addRefThrows = true;
-        EXPECT_FALSE(checked.QueryRawInterface(&out) || out || checked.GetLockCount());
-    }
-    EXPECT_EQ(probe.references, 1);
+TEST_F(Wrapper, ComparesAndCountsWithoutResolving) {
+    CPIACFUnknown raw, checked(&probe), zero;
+    PutRaw(raw, probe);
+    *zero.rec() = nullptr;
+    IACFUnknown* out = nullptr;
+    EXPECT_TRUE(raw == checked && zero == CPIACFUnknown() && raw.GetLockCount() == 3);
+    EXPECT_TRUE(raw.QueryRawInterface(&out) && out == &probe && probe.queries == 1);
+    out->Release();
+    EXPECT_FALSE(raw.QueryRawInterface(nullptr) || zero.QueryRawInterface(&out) || out || zero);
+    probe.addRefThrows = true;
+    EXPECT_FALSE(checked.QueryRawInterface(&out) || out || checked.GetLockCount());
 }
 
 // --- components ------------------------------------------------------------------------------------------------------
@@ -188,8 +176,6 @@ struct Twofold final : CComponent<Twofold, IProbe, IACFClassFactory> {
     }
     int ACF_CALL Answer() override { return 7; }
     acfResult ACF_CALL CreateInstance(IACFUnknown*, IACFUnknown*, const _acfUID&, IACFUnknown**) override { return 8; }
-
-private:
     int* m_ends;
 };
 
@@ -206,8 +192,7 @@ TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
         ASSERT_TRUE(probe && factory && component);
         EXPECT_EQ(probe->Answer() + factory->CreateInstance(nullptr, nullptr, kClass, nullptr), 15);
         EXPECT_TRUE(CPIACFUnknown(probe) == made && CPIACFUnknown(factory) == made) << "one identity";
-        EXPECT_EQ(made.GetLockCount(), 4u);
-        EXPECT_FALSE(CPACI<IACFDefinition>(made));
+        EXPECT_TRUE(made.GetLockCount() == 4 && !CPACI<IACFDefinition>(made));
     }
     EXPECT_EQ(ends, 1);
     Twofold fixed(&ends, false);
@@ -223,30 +208,25 @@ TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
 // Intended: static-factory-counts
 TEST(ClassFactory, IntendedCountsAndResults) {
     struct Maker final : _csFactory {
-        Mode mode = Mode::Gives;
         Probe probe;
-        bool Create(const _acfUID& type, IACFUnknown** out) override {
-            probe.query = mode;
-            return probe.QueryInterface(type, out) >= 0;
-        }
+        bool Create(const _acfUID& type, IACFUnknown** out) override { return probe.QueryInterface(type, out) >= 0; }
     } maker;
     IACFUnknown* out = &maker.probe;
-    const auto query = [&](const _acfUID& type) {
-        return static_cast<std::uint32_t>(maker.QueryInterface(type, &out));
+    // The result, where nothing is given out.
+    const auto query = [&](const _acfUID& type, IACFUnknown** to) {
+        return static_cast<std::uint32_t>(maker.QueryInterface(type, to)) + (to && *to ? 1u : 0u);
     };
-    const auto create = [&](IACFUnknown* outer) {
-        return static_cast<std::uint32_t>(maker.CreateInstance(nullptr, outer, kProbe, &out));
+    const auto create = [&](IACFUnknown* outer, IACFUnknown** to) {
+        return static_cast<std::uint32_t>(maker.CreateInstance(nullptr, outer, kProbe, to)) + (to && *to ? 1u : 0u);
     };
     EXPECT_TRUE(maker.AddRef() == 2 && maker.AddRef() == 2 && maker.Release() == 0);
-    EXPECT_TRUE(query(kProbe) == 0x80000004u && !out);
-    EXPECT_TRUE(query(kUnknown) == 0 && out == &maker);
-    EXPECT_TRUE(query(acfTypeOf<IACFClassFactory>::uid) == 0 && out == &maker);
-    EXPECT_TRUE(create(&maker.probe) == 0x80040110u && !out);
-    EXPECT_TRUE(create(nullptr) == 0 && out == &maker.probe);
+    EXPECT_TRUE(query(kProbe, &out) == 0x80000004u && query(kProbe, nullptr) == 0x80000003u);
+    EXPECT_TRUE(query(kUnknown, &out) == 1 && out == &maker);
+    EXPECT_TRUE(query(acfTypeOf<IACFClassFactory>::uid, &out) == 1 && out == &maker);
+    EXPECT_TRUE(create(&maker.probe, &out) == 0x80040110u && create(nullptr, nullptr) == 0x80000003u);
+    EXPECT_TRUE(create(nullptr, &out) == 1 && out == &maker.probe);
     for (const Mode mode : {Mode::Refuses, Mode::Throws, Mode::GivesNull}) {
-        maker.mode = mode;
-        EXPECT_TRUE(create(nullptr) == 0x80040111u && !out);
+        maker.probe.query = mode;
+        EXPECT_EQ(create(nullptr, &out), 0x80040111u);
     }
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.QueryInterface(kProbe, nullptr)), 0x80000003u);
-    EXPECT_EQ(static_cast<std::uint32_t>(maker.CreateInstance(nullptr, nullptr, kProbe, nullptr)), 0x80000003u);
 }
