@@ -5,19 +5,10 @@
 #include "support/log.h"
 
 #include <algorithm>
-#include <cstring>
-#include <gtest/gtest.h>
-#include <string>
 #include <thread>
-#include <vector>
 
 using namespace TAVO::ACF;
-using support::Ascii;
-using support::Assertions;
-using support::FakeFactory;
-using support::Probe;
-using support::Texts;
-using TAVO::String::CPPoolString;
+using namespace support;
 
 namespace {
 
@@ -43,7 +34,7 @@ struct Classes {
         EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(4), {}, L";Odd;", nullptr));
     }
     ~Classes() {
-        for (std::uint32_t number = 1; number <= 4; ++number) EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(number)));
+        for (const std::uint32_t number : {1, 2, 3, 4}) EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(number)));
     }
 };
 
@@ -60,7 +51,7 @@ std::string Names(IACFEnumDefinitions& definitions) {
 
 // A host's factory with definitions of its own: one class, and no more to tell.
 struct HostFactory : FakeFactory {
-    struct Registry final : support::Fake<IACFDefinitionRegistry> {
+    struct Registry final : Fake<IACFDefinitionRegistry> {
         bool throws = false;
         acfResult None(auto* out) const {
             if (throws) throw "registry";
@@ -116,7 +107,7 @@ TEST(ClassRegistry, KeepsTheFirstAndTakesTheSameAgain) {
     const auto add = [](const cacfuid& category, const wchar_t* names, CPIACFUnknown::CreateFunction create) {
         return Unknown::Factory_RegisterClass(Id(9), category, names, create);
     };
-    const support::Log log;
+    const Log log;
     for (int round = 0; round < 2; ++round) {
         EXPECT_TRUE(add(kFilters, L"A", MakeProbe) && add(kFilters, L"A", MakeProbe));
         EXPECT_FALSE(add(kReaders, L"A", MakeProbe) || add(kFilters, L"B", MakeProbe) ||
@@ -148,7 +139,7 @@ TEST(ClassRegistry, CreatesFindsAndEnumerates) {
         EXPECT_EQ(Unknown::Factory_FindClass(name, found), number != 0) << Ascii(name);
         EXPECT_EQ(found, number ? Id(number) : cacfuid()) << Ascii(name);
     }
-    const std::pair<cacfuid, const char*> lists[] = {{kFilters, "Blur;soft Sharpen "},
+    const std::pair<cacfuid, std::string> lists[] = {{kFilters, "Blur;soft Sharpen "},
                                                      {kReaders, "Reel;Soft "},
                                                      {Id(0xF3), ""},
                                                      {{}, "Blur;soft Reel;Soft Sharpen ;Odd; "}};
@@ -156,12 +147,9 @@ TEST(ClassRegistry, CreatesFindsAndEnumerates) {
         EnumDefinitions list;
         ASSERT_TRUE(Unknown::Factory_EnumDefinitions(category, list));
         EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(6), category, L"Late", MakeProbe));
-        for (int round = 0; round < 2; ++round) {
-            EXPECT_EQ(Names(*list.Get()), expected);
-            EXPECT_EQ(Names(*list.Get()), "") << "at its end";
-            EXPECT_EQ(list->Reset(), acfOk);
-        }
-        EXPECT_EQ(list->GetCount(), std::count(expected, expected + std::strlen(expected), ' '));
+        for (int round = 0; round < 2; ++round)
+            EXPECT_TRUE(Names(*list.Get()) == expected && Names(*list.Get()) == "" && list->Reset() == acfOk);
+        EXPECT_EQ(list->GetCount(), std::count(expected.begin(), expected.end(), ' '));
         EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(6)));
     }
 }
@@ -189,9 +177,9 @@ TEST(ClassRegistry, DefinitionsOutliveTheirClassAndTellTextsPieceByPiece) {
 TEST(ClassRegistry, ComponentInformation) {
     const Classes classes;
     const Assertions kept;
-    COMPONENT_INFO info;
-    EXPECT_TRUE(Unknown::Factory_GetComponentInfo(Id(3), info));
-    EXPECT_TRUE(Unknown::Factory_GetComponentInfo(info.uidClass, info)) << "asked with its own field";
+    COMPONENT_INFO info; // asked the second time with its own field
+    EXPECT_TRUE(Unknown::Factory_GetComponentInfo(Id(3), info) &&
+                Unknown::Factory_GetComponentInfo(info.uidClass, info));
     EXPECT_TRUE(info.uidClass == Id(3) && info.uidCategory == kFilters && Ascii(info.sName) == "Blur");
     EXPECT_FALSE(info.uidVendor || info.sVendor || info.uidModule || info.sModule || info.uidInterface);
     EXPECT_FALSE(Unknown::Factory_GetComponentInfo(Id(5), info) || info.uidClass || info.sName);
@@ -228,8 +216,8 @@ TEST(ClassRegistry, AsksTheFactoryThatKnowsDefinitions) {
 }
 
 TEST(ClassRegistry, LosesNothingWithoutMemory) {
-    const CPPoolString names(L"Held;Names");
-    support::ForEachFailingAllocation([&] {
+    const TAVO::String::CPPoolString names(L"Held;Names");
+    ForEachFailingAllocation([&] {
         CPIACFUnknown object;
         EnumDefinitions list;
         COMPONENT_INFO info;
@@ -244,15 +232,15 @@ TEST(ClassRegistry, LosesNothingWithoutMemory) {
 
 TEST(ClassRegistry, ServesThreadsAtOnce) {
     std::vector<std::thread> threads;
-    for (std::uint32_t number = 21; number < 24; ++number)
+    for (const std::uint32_t number : {21, 22, 23})
         threads.emplace_back([number] {
             for (int round = 0; round < 200; ++round) {
                 CPACI<IProbe> object;
                 EnumDefinitions list;
                 cacfuid found;
                 EXPECT_TRUE(Unknown::Factory_RegisterClass(Id(number), kFilters, L"Same", MakeProbe));
-                EXPECT_TRUE(Unknown::Factory_CreateClass(Id(number), object));
-                EXPECT_TRUE(Unknown::Factory_FindClass(L"same", found));
+                EXPECT_TRUE(Unknown::Factory_CreateClass(Id(number), object) &&
+                            Unknown::Factory_FindClass(L"same", found));
                 EXPECT_TRUE(Unknown::Factory_EnumDefinitions(kFilters, list) && list->GetCount() >= 1);
                 EXPECT_TRUE(Unknown::Factory_UnregisterClass(Id(number)));
             }

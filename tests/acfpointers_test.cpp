@@ -1,16 +1,13 @@
-// Wrappers of interface pointers, and the bases of components, over fakes that count.
+// Wrappers of interface pointers, and the bases of components, over fakes that count; identifiers and their text.
 
 #include "support/acffakes.h"
 #include "support/heapwatch.h"
 #include "support/log.h"
 
-#include <gtest/gtest.h>
+#include <set>
 
 using namespace TAVO::ACF;
-using support::Assertions;
-using support::Mode;
-using support::Probe;
-using support::Texts;
+using namespace support;
 
 namespace {
 
@@ -40,6 +37,27 @@ template <class Wrapper> struct WrapperOfAnyKind : testing::Test {
 using Wrapper = WrapperOfAnyKind<CPIACFUnknown>;
 using Kinds = testing::Types<CPIACFUnknown, Chosen, Typed>;
 TYPED_TEST_SUITE(WrapperOfAnyKind, Kinds);
+
+struct Twofold final : CComponent<Twofold, IProbe, IACFClassFactory> {
+    explicit Twofold(int* ends, bool counted = true) : CComponent(counted), m_ends(ends) {
+        if (!ends) throw "no";
+    }
+    ~Twofold() {
+        AddRef(), Release(); // as code does that a destructor calls
+        ++*m_ends;
+    }
+    int ACF_CALL Answer() override { return 7; }
+    acfResult ACF_CALL CreateInstance(IACFUnknown*, IACFUnknown*, const _acfUID&, IACFUnknown**) override { return 8; }
+    int* m_ends;
+};
+
+const std::string kText = "15603CD4-AB81-4D6F-B05F-C6BEA760A789", kNull = "00000000-0000-0000-0000-000000000000";
+
+std::string Text(const cacfuid& id) {
+    char text[cacfuid::TextUnits];
+    id.GetText(text);
+    return text;
+}
 
 } // namespace
 
@@ -103,23 +121,21 @@ TYPED_TEST(WrapperOfAnyKind, EndsWellWhenReleaseComesBackOrThrows) {
 }
 
 TYPED_TEST(WrapperOfAnyKind, CreatesThroughFactoriesIntended) {
-    support::FakeFactory factory;
-    const struct {
-        Mode creation, query;
-        bool created, typed;
-    } rows[] = {{Mode::Gives, Mode::Gives, true, true},
-                {Mode::Throws, Mode::Gives, false, false},
-                {Mode::GivesNull, Mode::Gives, false, false},
-                {Mode::Gives, Mode::Refuses, true, false}}; // a plain wrapper finds out at its first use
+    FakeFactory factory;
+    // A plain wrapper finds out at its first use.
+    const std::tuple<Mode, Mode, bool, bool> rows[] = {{Mode::Gives, Mode::Gives, true, true},
+                                                       {Mode::Throws, Mode::Gives, false, false},
+                                                       {Mode::GivesNull, Mode::Gives, false, false},
+                                                       {Mode::Gives, Mode::Refuses, true, false}};
     TypeParam wrapper(&this->probe);
-    for (const auto& row : rows) {
-        factory.creation = row.creation;
-        factory.made.query = row.query;
-        const bool answer = this->type == kUnknown ? row.created : row.typed;
-        EXPECT_TRUE(wrapper.createComponent(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
-        EXPECT_TRUE(wrapper.createInstance(kClass, &factory) == answer && static_cast<bool>(wrapper) == row.typed);
+    for (const auto& [creation, query, created, typed] : rows) {
+        factory.creation = creation;
+        factory.made.query = query;
+        const bool answer = this->type == kUnknown ? created : typed;
+        EXPECT_TRUE(wrapper.createComponent(kClass, &factory) == answer && static_cast<bool>(wrapper) == typed);
+        EXPECT_TRUE(wrapper.createInstance(kClass, &factory) == answer && static_cast<bool>(wrapper) == typed);
         EXPECT_TRUE(factory.askedClass == kClass && factory.askedType == kUnknown);
-        EXPECT_EQ(factory.made.references, row.typed ? 2 : 1);
+        EXPECT_EQ(factory.made.references, typed ? 2 : 1);
         wrapper = &this->probe;
     }
     EXPECT_EQ(factory.components, 4) << "half of them";
@@ -164,23 +180,6 @@ TEST_F(Wrapper, ComparesAndCountsWithoutResolving) {
 
 // --- components ------------------------------------------------------------------------------------------------------
 
-namespace {
-
-struct Twofold final : CComponent<Twofold, IProbe, IACFClassFactory> {
-    explicit Twofold(int* ends, bool counted = true) : CComponent(counted), m_ends(ends) {
-        if (!ends) throw "no";
-    }
-    ~Twofold() {
-        AddRef(), Release(); // as code does that a destructor calls
-        ++*m_ends;
-    }
-    int ACF_CALL Answer() override { return 7; }
-    acfResult ACF_CALL CreateInstance(IACFUnknown*, IACFUnknown*, const _acfUID&, IACFUnknown**) override { return 8; }
-    int* m_ends;
-};
-
-} // namespace
-
 TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
     int ends = 0;
     {
@@ -198,7 +197,7 @@ TEST(Component, IsOneObjectBehindAllItsInterfacesIntended) {
     Twofold fixed(&ends, false);
     EXPECT_TRUE(fixed.AddRef() == 0 && fixed.Release() == 0 && ends == 1) << "static ones are not counted";
     EXPECT_FALSE(Twofold::Make(nullptr));
-    support::ForEachFailingAllocation([] {
+    ForEachFailingAllocation([] {
         int once = 0;
         const bool there = static_cast<bool>(Twofold::Make(&once));
         EXPECT_EQ(once, there);
@@ -229,4 +228,47 @@ TEST(ClassFactory, IntendedCountsAndResults) {
         maker.probe.query = mode;
         EXPECT_EQ(create(nullptr, &out), 0x80040111u);
     }
+}
+
+// --- identifiers -----------------------------------------------------------------------------------------------------
+
+TEST(Identifier, ReadsAndWritesSixteenBytes) {
+    const cacfuid id(_acfUID{0x15603CD4, 0xAB81, 0x4D6F, {0xB0, 0x5F, 0xC6, 0xBE, 0xA7, 0x60, 0xA7, 0x89}});
+    EXPECT_EQ(Text(id), kText);
+    EXPECT_STREQ(id.ANSI(), kText.c_str());
+    EXPECT_STREQ(static_cast<TAVO::String::CACFWChar>(id), L"15603CD4-AB81-4D6F-B05F-C6BEA760A789");
+    for (std::size_t byte = 0; byte < sizeof(_acfUID); ++byte) {
+        cacfuid other(id), single;
+        reinterpret_cast<unsigned char*>(&other.rec())[byte] ^= 1;
+        reinterpret_cast<unsigned char*>(&single.rec())[byte] = 1;
+        EXPECT_TRUE(other != id && !(other == id) && single) << byte;
+        EXPECT_EQ(cacfuid(Text(single).c_str()), single) << byte;
+        single.reset();
+        EXPECT_FALSE(single) << byte;
+    }
+    std::set<std::string> seen;
+    for (int i = 0; i < 200; ++i) { // new ones are random, of version four
+        const std::string text = Text(cacfuid::New());
+        EXPECT_TRUE(seen.insert(text).second && text[14] == '4' && text.find_first_of("89AB", 19) == 19) << text;
+    }
+}
+
+// The fuzz replay compares any text with a plain reading of the rules; here is what the rules say.
+// Intended: identifier-dashes
+TEST(Identifier, IntendedReadingOfOtherTexts) {
+    const std::string odd = "-AB81-4D6F-B05F-C6BEA760A789", read = "FFFF547F-4D6F-B05F-A789-C6BEA760A789";
+    // Empty: refused, which leaves the null identifier.
+    const std::pair<std::string, std::string> rows[] = {
+        {kText, kText}, {'{' + kText + '}', ""},   {"", kNull},         {kText.substr(0, 24), ""},
+        {odd, read},    {kText.substr(0, 35), ""}, {kText + '-', kNull}};
+    for (const auto& [text, identifier] : rows) {
+        const std::u16string wide(text.begin(), text.end());
+        cacfuid fromNarrow(kText.c_str()), fromWide(kText.c_str());
+        EXPECT_EQ(fromNarrow.Set(text.c_str()), !identifier.empty()) << text;
+        EXPECT_EQ(fromWide.Set(reinterpret_cast<const wchar_t*>(wide.c_str())), !identifier.empty()) << text;
+        EXPECT_EQ(Text(fromNarrow), identifier.empty() ? kNull : identifier) << text;
+        EXPECT_EQ(fromNarrow, fromWide) << text;
+    }
+    cacfuid id(kText.c_str());
+    EXPECT_TRUE(id.Set(static_cast<const char*>(nullptr)) && !id && id.Set(static_cast<const wchar_t*>(nullptr)));
 }

@@ -1,4 +1,4 @@
-// Log, assertions, result codes, clocks and random numbers as a host sees them.
+// Log, assertions, result codes, clocks, the stopwatch and random numbers as a host sees them.
 
 #include "support/log.h"
 #include "support/machine.h"
@@ -6,10 +6,7 @@
 #include <chrono>
 #include <gtest/gtest.h>
 #include <regex>
-#include <string>
-#include <TAVO/develop.h>
 #include <thread>
-#include <vector>
 
 using namespace TAVO;
 using namespace TAVO::Develop;
@@ -26,6 +23,30 @@ void Throw(_acfDebugLevel level, const wchar_t*, const char*, long32, const wcha
     if (level == acfDebugInfo) SetExternalLogger(support::Log::Keep);
     throw 1;
 }
+
+// The rules once more, in plain words.
+struct NaiveTwister {
+    std::vector<std::uint64_t> state;
+    std::size_t index = 0;
+
+    explicit NaiveTwister(std::uint32_t seed) : state{seed} {
+        for (std::uint64_t i = 1; i < 624; ++i)
+            state.push_back((1812433253ULL * (state[i - 1] ^ state[i - 1] / 0x40000000) + i) % 0x100000000);
+    }
+    std::uint32_t Next() {
+        for (std::size_t i = 0; index == 624 && i < 624; ++i) {
+            const std::uint64_t joined = (state[i] & 0x80000001) | (state[(i + 1) % 624] & 0x7FFFFFFE);
+            state[i] = joined / 2 ^ state[(i + 397) % 624];
+            if (state[i] % 2 == 1) state[i] ^= 0x9908B0DF;
+        }
+        std::uint64_t y = state[index %= 624];
+        ++index;
+        y ^= y >> 11;
+        y ^= (y << 7) & 0x9D2C5680;
+        y ^= (y << 15) & 0xEFC60000;
+        return static_cast<std::uint32_t>(y ^ y >> 18);
+    }
+};
 
 } // namespace
 
@@ -87,26 +108,24 @@ static support::Texts LinesOf(const support::LibraryCopy& copy, long32 code) {
 }
 
 TEST(Configuration, SwitchesReportsOfFailedResultCodes) {
-    const struct {
-        const char* text;
-        bool box, log, stop;
-    } rows[] = {{nullptr, false, false, false},
-                {"[Debug]\nAssertBox=1\n", true, false, false},
-                {"; ours\r\n[debug]\r\nlogfailedhresult = 2\r\nAssertBox=0\n", false, true, false},
-                {"[Debug]\nBreakOnHRESULT=-1\nLogFailedHRESULT=0x10", false, true, true}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.text ? row.text : "no file");
-        const support::LibraryCopy copy("Renamed", row.text);
+    const std::tuple<const char*, bool, bool, bool> rows[] = {
+        {nullptr, false, false, false},
+        {"[Debug]\nAssertBox=1\n", true, false, false},
+        {"; ours\r\n[debug]\r\nlogfailedhresult = 2\r\nAssertBox=0\n", false, true, false},
+        {"[Debug]\nBreakOnHRESULT=-1\nLogFailedHRESULT=0x10", false, true, true}};
+    for (const auto& [text, box, log, stop] : rows) {
+        SCOPED_TRACE(text ? text : "no file");
+        const support::LibraryCopy copy("Renamed", text);
         const tagSWITCHES switches = copy.Find<tagSWITCHES (*)()>("_ZN4TAVO7Develop11GetSwitchesEv")();
-        EXPECT_TRUE(switches.AssertBox == row.box && switches.LogFailedHRESULT == row.log);
-        EXPECT_EQ(switches.BreakOnHRESULT, row.stop);
+        EXPECT_TRUE(switches.AssertBox == box && switches.LogFailedHRESULT == log);
+        EXPECT_EQ(switches.BreakOnHRESULT, stop);
         for (const long32 good : {0, 5}) EXPECT_EQ(LinesOf(copy, good), support::Texts());
         support::Texts expected;
-        if (row.stop) expected.push_back(kAssertion + "|RTA_ON_TRUE|source/TAVO/TAVOACF,25:lResult < 0");
-        if (row.log)
+        if (stop) expected.push_back(kAssertion + "|RTA_ON_TRUE|source/TAVO/TAVOACF,25:lResult < 0");
+        if (log)
             expected.push_back(std::to_string(acfDebugTrace) +
                                " TAVO source/TAVO/TAVOACF:28 lResult < 0: %x|2147500037");
-        if (row.box) continue; // nobody would answer it
+        if (box) continue; // nobody would answer it
         EXPECT_EQ(LinesOf(copy, static_cast<long32>(0x80004005)), expected);
     }
 }
@@ -129,33 +148,44 @@ TEST(Clocks, AgreeWithTheStandardOnes) {
     EXPECT_FALSE(_isBigEndian() || _isWChar32());
 }
 
-namespace {
+// Its word comes first.
+static unsigned long long& Word(CHFLapse& watch) { return *reinterpret_cast<unsigned long long*>(&watch); }
 
-// The rules once more, in plain words.
-struct NaiveTwister {
-    std::vector<std::uint64_t> state;
-    std::size_t index = 0;
-
-    explicit NaiveTwister(std::uint32_t seed) : state{seed} {
-        for (std::uint64_t i = 1; i < 624; ++i)
-            state.push_back((1812433253ULL * (state[i - 1] ^ state[i - 1] / 0x40000000) + i) % 0x100000000);
+// Intended: lapse-count
+TEST(Stopwatch, KeepsAndReportsTimesAndIntendedCountsTwiceThem) {
+    const support::Log log;
+    {
+        CHFLapse watch(L"import"), unnamed(String::CPPoolString::pempty);
+        EXPECT_EQ(Word(unnamed), 0u) << "stands";
+        Word(watch) = 10749999 << 1;
+        watch.Stop(L"%d clips", 3);
+        watch.Lapse(nullptr);
+        watch.Stop();
+        EXPECT_EQ(Word(watch), 10749999u << 1) << "only Start changes a stopped watch";
+        EXPECT_TRUE(watch.lapse_nano() == 10749999 && watch.lapse_micro() == 10750 && watch.lapse_milli() == 11);
+        EXPECT_TRUE(watch.count_micro() == 21500 && watch.count_milli() == 21);
+        EXPECT_TRUE(watch.lapse_double() == 10749999 / 1e9 && watch.count_double() == 21499998 / 1e9);
+        Word(unnamed) = 3600000004999999ULL << 1;
+        unnamed.Lapse(L"100%%%d", 7);
     }
-    std::uint32_t Next() {
-        for (std::size_t i = 0; index == 624 && i < 624; ++i) {
-            const std::uint64_t joined = (state[i] & 0x80000001) | (state[(i + 1) % 624] & 0x7FFFFFFE);
-            state[i] = joined / 2 ^ state[(i + 397) % 624];
-            if (state[i] % 2 == 1) state[i] ^= 0x9908B0DF;
-        }
-        std::uint64_t y = state[index %= 624];
-        ++index;
-        y ^= y >> 11;
-        y ^= (y << 7) & 0x9D2C5680;
-        y ^= (y << 15) & 0xEFC60000;
-        return static_cast<std::uint32_t>(y ^ y >> 18);
+    EXPECT_EQ(log.Take(), (support::Texts{"16 import - 10.75ms none:0 %d clips|3", "16 import - 10.75ms none:0 ",
+                                          "16 CHFLapse - 3600000005.00ms none:0 100%%%d|7"}))
+        << "and no totals";
+    { // one with a name runs from its start, laps add up, and it tells its total at the end
+        CHFLapse watch(L"import"), unnamed{String::CPPoolString()};
+        unnamed.Start();
+        const auto start = Word(watch);
+        EXPECT_TRUE(start & Word(unnamed) & 1);
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        watch.Lapse(L"lap");
+        EXPECT_TRUE(Word(watch) == start && watch.lapse_double() >= 0.019 && watch.lapse_double() < 5);
     }
-};
-
-} // namespace
+    const support::Texts lines = log.Take();
+    ASSERT_EQ(lines.size(), 2u) << "a watch without a name has no total";
+    EXPECT_EQ(lines[0].substr(lines[0].find("ms")), "ms none:0 lap");
+    EXPECT_EQ(lines[1].substr(lines[1].find("ms")), "ms none:0 Total");
+    EXPECT_GE(std::stod(lines[1].substr(lines[1].find(" - ") + 3)), 19.0);
+}
 
 // Intended: random-first-outputs, random-oddness
 TEST(Random, SequenceOfASeedIsIntended) {

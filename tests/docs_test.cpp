@@ -122,13 +122,14 @@ std::vector<Block> Blocks() {
         pages.push_back("docs/" + support::Ascii(name));
     std::vector<Block> blocks;
     for (const std::string& page : pages) {
-        bool isInside = false;
-        std::size_t number = 0;
-        for (const std::string& line : Lines(support::Get(support::Widen(root + page)))) {
-            ++number;
-            if (isInside && line != "```") blocks.back().lines.push_back(line);
-            isInside = isInside ? line != "```" : line == "```console";
-            if (isInside && line == "```console") blocks.push_back({page + ':' + std::to_string(number), {}});
+        std::string text = support::Get(support::Widen(root + page));
+        std::erase(text, '\r');
+        const std::string begin = "\n```console\n", end = "\n```\n";
+        for (std::size_t at = 0; (at = text.find(begin, at)) != text.npos;) {
+            const auto line = 2 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(at), '\n');
+            const auto inside = at + begin.size();
+            at = text.find(end, inside);
+            blocks.push_back({page + ':' + std::to_string(line), Lines(text.substr(inside, at - inside))});
         }
     }
     return blocks;

@@ -4,18 +4,21 @@
 #include "support/heapwatch.h"
 
 #include <atomic>
+#include <cstdlib>
 #include <functional>
-#include <gtest/gtest.h>
+#include <random>
 #include <stdexcept>
-#include <TAVO/develop.h>
 #include <TAVO/maintenance.h>
 #include <TAVO/string.h>
+#include <TAVO/xml.h>
 #include <thread>
 #include <vector>
 
 using namespace TAVO;
 using namespace TAVO::Maintenance;
+using namespace TAVO::String;
 using support::Gate;
+using Clock = std::chrono::steady_clock;
 
 namespace {
 
@@ -63,10 +66,8 @@ TEST(Maintenance, RunsWhatFallsDueAndWhatIsWoken) {
     }
     EXPECT_FALSE(IsRunning());
     late->due = 0;
-    {
-        const Running again;
-        EXPECT_TRUE(late->runs.Reached(2)) << "entries survive a stop";
-    }
+    const Running again;
+    EXPECT_TRUE(late->runs.Reached(2)) << "entries survive a stop";
     EXPECT_TRUE(UnregisterRequest(early) && UnregisterRequest(late));
 }
 
@@ -156,11 +157,8 @@ TEST(Maintenance, RequestsMayRegisterOthersAndAskTheServicesToEnd) {
     EXPECT_TRUE(AppInit() && RegisterRequest(first) && first->runs.Reached(1));
     while (first.lockcnt() > 2) std::this_thread::yield(); // the run is over
     EXPECT_EQ(second->runs.Steps(), 0) << "the thread was asked to end";
-    {
-        const Running again; // brings the old thread to its end first
-        EXPECT_TRUE(second->runs.Reached(1));
-    }
-    EXPECT_TRUE(UnregisterRequest(first) && UnregisterRequest(second));
+    const Running again; // brings the old thread to its end first
+    EXPECT_TRUE(second->runs.Reached(1) && UnregisterRequest(first) && UnregisterRequest(second));
 }
 
 TEST(Maintenance, StartsStopsAndRegistersOnManyThreadsAndAStopIsQuick) {
@@ -178,9 +176,9 @@ TEST(Maintenance, StartsStopsAndRegistersOnManyThreadsAndAStopIsQuick) {
     for (auto& thread : threads) thread.join();
     EXPECT_FALSE(IsRunning());
     ASSERT_TRUE(AppInit());
-    const auto before = Develop::_now_milli();
+    const auto before = Clock::now();
     AppExit();
-    EXPECT_LE(Develop::_now_milli() - before, 50u);
+    EXPECT_LE(Clock::now() - before, std::chrono::milliseconds(50));
 
     support::ForEachFailingAllocation([] {
         const bool started = AppInit();
@@ -193,16 +191,45 @@ TEST(Maintenance, StartsStopsAndRegistersOnManyThreadsAndAStopIsQuick) {
     });
 }
 
+// Strings, documents and requests on every processor, while the pool is swept. For a soak: TAVO_SOAK_SECONDS.
+TEST(Maintenance, SweepsUnderABusyHost) {
+    const char* const wanted = std::getenv("TAVO_SOAK_SECONDS");
+    const auto end = Clock::now() + std::chrono::milliseconds(wanted ? 1000 * std::atoi(wanted) : 500);
+    const Running services;
+    const auto entries = CStringPool::GetNItems();
+    const auto host = [&](unsigned seed) {
+        std::mt19937 random(seed);
+        std::vector<CPPoolString> held(5000);
+        while (Clock::now() < end) {
+            std::string text = "<timeline>";
+            for (int i = 0; i < 5000; ++i) { // some are met again and again and some seldom
+                const std::string name = "Clip " + std::to_string(random() % (1u << random() % 17));
+                held[random() % held.size()] = CPPoolString(name.c_str());
+                if (i % 100 == 0) text += "<clip name='" + name + "'><in>01:00:00:00</in></clip>";
+            }
+            text += "</timeline>";
+            XML::CXMLDoc document;
+            EXPECT_TRUE(document.OpenDocText(text.data(), text.size()));
+            const CPWork work;
+            EXPECT_TRUE(RegisterRequest(work) && UnregisterRequest(work));
+            if (seed == 0) CStringPool::Collect(1);
+        }
+    };
+    std::vector<std::thread> threads;
+    for (unsigned seed = 0; seed < 3; ++seed) threads.emplace_back(host, seed);
+    for (auto& thread : threads) thread.join();
+    EXPECT_TRUE(CStringPool::Verify() && CStringPool::Collect(60000) && CStringPool::Collect(60000));
+    EXPECT_LE(CStringPool::GetNItems(), entries) << "nothing is left, nor lost";
+}
+
 TEST(Maintenance, PoolSweepsStartOnce) {
-    EXPECT_TRUE(String::CStringPool::AppInit() && !String::CStringPool::AppInit());
+    EXPECT_TRUE(CStringPool::AppInit() && !CStringPool::AppInit());
     EXPECT_FALSE(AppInit()) << "the sweeps were started by themselves";
-    EXPECT_TRUE(IsRunning()) << "what did start stays started";
-    EXPECT_TRUE(AppInit()) << "counts on";
+    EXPECT_TRUE(IsRunning() && AppInit()) << "what did start stays started, and counts on";
     AppExit();
     AppExit();
-    EXPECT_FALSE(IsRunning());
-    EXPECT_TRUE(String::CStringPool::AppInit()) << "the stop let go of them";
-    String::CStringPool::AppExit();
+    EXPECT_TRUE(!IsRunning() && CStringPool::AppInit()) << "the stop let go of them";
+    CStringPool::AppExit();
 }
 
 } // namespace

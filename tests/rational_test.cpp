@@ -57,17 +57,13 @@ TEST(Rational, IntegersDoublesOrderAndSignsIntended) {
 
 TEST(Rational, FromDoubles) {
     constexpr double kPi = 3.14159265358979, kInfinity = std::numeric_limits<double>::infinity();
-    const struct {
-        double x;
-        long32 maxDen, n, d;
-        bool result;
-    } rows[] = {{-kPi, 100, -311, 99, true},     {-0.0, 5, 0, 1, true}, {1073741823.0, 10, 1073741823, 1, true},
-                {1073741823.5, 10, 1, 0, false}, {0.5, 0, 1, 0, true},  {kInfinity - kInfinity, 10, 1, 0, false},
-                {1e-310, INT_MAX, 0, 1, true}};
-    for (const auto& row : rows) {
+    const std::tuple<double, long32, long32, long32, bool> rows[] = {
+        {-kPi, 100, -311, 99, true},     {-0.0, 5, 0, 1, true}, {1073741823.0, 10, 1073741823, 1, true},
+        {1073741823.5, 10, 1, 0, false}, {0.5, 0, 1, 0, true},  {kInfinity - kInfinity, 10, 1, 0, false},
+        {1e-310, INT_MAX, 0, 1, true}};
+    for (const auto& [x, maxDen, n, d, result] : rows) {
         CRational r(7, 5);
-        EXPECT_EQ(r.fassign(row.x, row.maxDen), row.result) << row.x;
-        EXPECT_EQ(Both(r), std::make_pair(row.n, row.d)) << row.x;
+        EXPECT_TRUE(r.fassign(x, maxDen) == result && Both(r) == std::make_pair(n, d)) << x;
     }
     // A brute search finds nothing nearer.
     std::mt19937 random(11);

@@ -9,8 +9,7 @@
 
 using namespace TAVO::Internetional;
 using support::WideText;
-using TAVO::String::CACFWChar;
-using TAVO::String::CUTF8Char;
+using namespace TAVO::String;
 
 namespace {
 
@@ -93,8 +92,8 @@ TEST(Urls, AgreeWithANaiveReading_Intended) {
 
 // Intended: file-url-letter
 TEST(FileUrls, OfPathsAndBack_Intended) {
+    // Behind "file:///".
     const std::pair<const wchar_t*, const char*> rows[] = {
-        // behind "file:///"
         {L"C:\\a b\\c.mov", "C%3A%5Ca%20b%5Cc.mov"},
         {L"/home/x", "/home/x"},
         {L"/", "/"},
@@ -122,16 +121,13 @@ TEST(FileUrls, OfPathsAndBack_Intended) {
 
 // Intended: file-url-whole, file-url-pairs, file-url-relative
 TEST(FileUrls, ForeignFormsAndPathsWithoutAUrlOfTheirOwn_Intended) {
+    // The last is the library's own pair.
     const std::pair<const char*, const wchar_t*> rows[] = {
-        {"file:///C:/a", L"C:/a"},
-        {"FILE://LocalHost/c%3a%5CX", L"c:\\X"},
-        {"file:///", L"/"},
-        {"file:///C:a", L"/C:a"},
-        {"file:///%5Ca", L"\\a"},
-        {"file://server/share/a%20b", L"//server/share/a b"},
-        {"file://localhost", L"//localhost"},
-        {"file:///%C3%A9%zz%", L"/\u00E9%zz%"},
-        {"file:///%F0%90%80%80", L"/\xD840\xDC00"}}; // the library's own pair
+        {"FILE://LocalHost/c%3a%5CX", L"c:\\X"},   {"file:///", L"/"},
+        {"file://server/a%20b", L"//server/a b"},  {"file:///C:/a", L"C:/a"},
+        {"file://localhost", L"//localhost"},      {"file:///C:a", L"/C:a"},
+        {"file:///%C3%A9%zz%", L"/\u00E9%zz%"},    {"file:///%5Ca", L"\\a"},
+        {"file:///%F0%90%80%80", L"/\xD840\xDC00"}};
     for (const auto& [url, path] : rows) EXPECT_STREQ(*file_DecodeURL(Bytes(url)), path) << url;
     for (const char* url : {"file://", "file:/a", " file:///a", "file:///a%00b", "file:///a%FFb", "file:///a%C3",
                             "file:///a%F4%90%80%80"})

@@ -50,7 +50,6 @@ void Mutate(Input& input, const Input& other) {
 int main(int argc, char** argv) {
     for (int i = 1; i < argc; ++i) RunFile(argv[i]);
     if (argc > 1) return 0;
-
     std::vector<std::filesystem::path> paths;
     for (const auto& entry : std::filesystem::directory_iterator(TAVO_CORPUS)) paths.push_back(entry.path());
     std::sort(paths.begin(), paths.end());

@@ -10,10 +10,8 @@
 #include <unistd.h>
 
 using namespace TAVO::Files::OS;
-using Files = support::FileTest;
-using support::Ascii;
-using support::Put;
-using support::WideText;
+using namespace support;
+using File = FileTest;
 
 unsigned support::KindsThatOpenElsewhere(const wchar_t* path) {
     const pid_t child = fork();
@@ -23,7 +21,7 @@ unsigned support::KindsThatOpenElsewhere(const wchar_t* path) {
     return WIFEXITED(status) ? static_cast<unsigned>(WEXITSTATUS(status)) : ~0u;
 }
 
-TEST_F(Files, IsNotAskedOfDevicesAndAForeignLockDoesNotHangAnOpen) {
+TEST_F(File, IsNotAskedOfDevicesAndAForeignLockDoesNotHangAnOpen) {
     CFile second;
     EXPECT_TRUE(file.Open(L"/dev/null", FileAccessWrite, OpenFileExisting));
     EXPECT_TRUE(second.Open(L"/dev/null", FileAccessWrite, OpenFileTruncate) && second.Write("x", 1, nullptr));
@@ -36,9 +34,9 @@ TEST_F(Files, IsNotAskedOfDevicesAndAForeignLockDoesNotHangAnOpen) {
     EXPECT_TRUE(file.Open(path, FileAccessRead, OpenFileExisting));
 }
 
-TEST_F(Files, LosesNoDescriptorsAndHandsNoneOn) {
+TEST_F(File, LosesNoDescriptorsAndHandsNoneOn) {
     Put(path, "x");
-    const auto openDescriptors = [] { return support::List(L"/proc/self/fd").size(); };
+    const auto openDescriptors = [] { return List(L"/proc/self/fd").size(); };
     const auto before = openDescriptors();
     const int lowest = dup(STDERR_FILENO);
     close(lowest);
@@ -55,34 +53,34 @@ TEST_F(Files, LosesNoDescriptorsAndHandsNoneOn) {
     EXPECT_EQ(openDescriptors(), before);
 }
 
-TEST_F(Files, ATemporaryOneGoesByTheNameItHasAtTheEnd) {
+TEST_F(File, ATemporaryOneGoesByTheNameItHasAtTheEnd) {
     for (const bool renamed : {true, false}) {
         _DeleteFile(path);
         ASSERT_TRUE(file.Open(path, FileAccessWrite, OpenFileCreate | OpenFileTemporary));
         EXPECT_TRUE(renamed ? CFile::RenameFile(path, folder / L"moved") : _DeleteFile(path));
         Put(path, "another file");
         file.Close();
-        EXPECT_EQ(support::List(folder.Path()), std::vector<WideText>{L"file"}) << "not ours, so it stays";
+        EXPECT_EQ(List(folder.Path()), std::vector<WideText>{L"file"}) << "not ours, so it stays";
     }
 }
 
-TEST_F(Files, AReadFromAPipeTakesWhatIsThere) {
+TEST_F(File, AReadFromAPipeTakesWhatIsThere) {
     int ends[2];
     ASSERT_TRUE(pipe2(ends, O_CLOEXEC) == 0 && write(ends[1], "abc", 3) == 3);
     char buffer[16];
-    const WideText pipe = support::Widen("/proc/self/fd/" + std::to_string(ends[0]));
+    const WideText pipe = Widen("/proc/self/fd/" + std::to_string(ends[0]));
     ASSERT_TRUE(file.Open(pipe, FileAccessRead, OpenFileExisting));
     EXPECT_TRUE(file.Read(buffer, sizeof buffer, &done) && done == 3) << "and does not wait for more";
     EXPECT_TRUE(!file.SetPointer(0) && file.GetPointer() == ~std::size_t{0});
     for (const int end : ends) close(end);
 }
 
-TEST_F(Files, ListedWithNamesThatAreNoTextAndWhatLinksLeadTo) {
+TEST_F(File, ListedWithNamesThatAreNoTextAndWhatLinksLeadTo) {
     const std::string here = Ascii(folder.Path());
     ASSERT_TRUE(_CreateDir(folder / L"dir"));
     for (const char* target : {"dir", "nowhere"}) ASSERT_EQ(symlink(target, (here + "/to_" + target).c_str()), 0);
-    EXPECT_EQ(support::List(folder.Path(), nullptr, false), std::vector<WideText>{L"to_nowhere"});
-    EXPECT_EQ(support::List(folder.Path(), nullptr, true).size(), 3u);
+    EXPECT_EQ(List(folder.Path(), nullptr, false), std::vector<WideText>{L"to_nowhere"});
+    EXPECT_EQ(List(folder.Path(), nullptr, true).size(), 3u);
     EXPECT_FALSE(_TestFileExists(folder / L"to_nowhere"));
 
     const int descriptor = open((here + "/a\xFF" + "b").c_str(), O_CREAT | O_WRONLY | O_CLOEXEC, 0444);

@@ -1,6 +1,5 @@
 #include "support/machine.h"
 
-#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
@@ -55,7 +54,7 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
     std::string text(1 << 16, 0); // the texts of a test are small enough to wait in the pipe
     const auto got = read(ends[0], text.data(), text.size());
     close(ends[0]);
-    return text.substr(0, static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
+    return text.substr(0, got > 0 ? static_cast<std::size_t>(got) : 0);
 }
 
 void RunOnStack(std::size_t bytes, const std::function<void()>& body) {
