@@ -1,6 +1,5 @@
-# Installs the library, moves the tree away, builds the consumer against it and runs it. Run by ctest:
-#   cmake -D WAY=package|pkg-config -D BUILD=<build tree> -D SOURCE=<this folder> -D COMPILER=... -D FLAGS=...
-#         -D LINK_FLAGS=... [-D TOOLCHAIN=... -D EMULATOR=...] -P check.cmake
+# Installs the library, moves the tree away, builds the consumer against it and runs it. Run by ctest with WAY=package or
+# pkg-config, BUILD (the tree), SOURCE (this folder), COMPILER, FLAGS, LINK_FLAGS, and TOOLCHAIN and EMULATOR or nothing.
 function(run)
   execute_process(COMMAND ${ARGN} RESULT_VARIABLE result OUTPUT_VARIABLE output ERROR_VARIABLE output)
   if(NOT result EQUAL 0)
@@ -30,13 +29,8 @@ endforeach()
 if(WAY STREQUAL package)
   file(GLOB_RECURSE config ${tree}/*/TAVOConfig.cmake)
   get_filename_component(folder ${config} DIRECTORY)
-  set(options -DTAVO_DIR=${folder} -DCMAKE_CXX_FLAGS=${FLAGS} -DCMAKE_EXE_LINKER_FLAGS=${LINK_FLAGS})
-  if(TOOLCHAIN)
-    list(APPEND options -DCMAKE_TOOLCHAIN_FILE=${TOOLCHAIN})
-  else()
-    list(APPEND options -DCMAKE_CXX_COMPILER=${COMPILER})
-  endif()
-  run(${CMAKE_COMMAND} -G Ninja -S ${SOURCE} -B ${work}/build ${options})
+  run(${CMAKE_COMMAND} -G Ninja -S ${SOURCE} -B ${work}/build -DTAVO_DIR=${folder} -DCMAKE_CXX_COMPILER=${COMPILER}
+    -DCMAKE_TOOLCHAIN_FILE=${TOOLCHAIN} -DCMAKE_CXX_FLAGS=${FLAGS} -DCMAKE_EXE_LINKER_FLAGS=${LINK_FLAGS})
   run(${CMAKE_COMMAND} --build ${work}/build)
   file(GLOB program ${work}/build/consumer ${work}/build/consumer.exe)
 else()

@@ -19,16 +19,15 @@ using Input = std::vector<std::uint8_t>;
 constexpr int kMutations = 4000;
 constexpr std::size_t kLongest = 65536;
 
-void Run(const Input& input) {
+Input Run(const Input& input) {
     const Input exact(input); // capacity equals size, so that a sanitizer sees the end
     LLVMFuzzerTestOneInput(exact.data(), exact.size());
+    return exact;
 }
 
 Input RunFile(const std::filesystem::path& path) {
     std::ifstream file(path, std::ios::binary);
-    const Input input(std::istreambuf_iterator<char>(file), {});
-    Run(input);
-    return input;
+    return Run(Input(std::istreambuf_iterator<char>(file), {}));
 }
 
 std::mt19937 g_random{1};
@@ -37,20 +36,13 @@ std::ptrdiff_t Below(std::size_t limit) { return g_random() % static_cast<std::u
 void Mutate(Input& input, const Input& other) {
     const auto place = input.begin() + Below(input.size() + 1);
     const auto behind = place + std::min<std::ptrdiff_t>(input.end() - place, 1 + Below(8));
-    switch (Below(4)) {
-    case 0: // flip a bit
-        if (place != behind) *place ^= static_cast<std::uint8_t>(1u << Below(8));
-        break;
-    case 1: // a byte more
-        input.insert(place, static_cast<std::uint8_t>(g_random()));
-        break;
-    case 2: // some bytes less
-        input.erase(place, behind);
-        break;
-    default: // the rest of another seed
-        input.erase(place, input.end());
-        input.insert(input.end(), other.begin() + Below(other.size() + 1), other.end());
-    }
+    const auto how = Below(4);
+    if (how == 0 && place != behind) *place ^= static_cast<std::uint8_t>(1u << Below(8)); // flip a bit
+    if (how == 1) input.insert(place, static_cast<std::uint8_t>(g_random()));             // a byte more
+    if (how == 2) input.erase(place, behind);                                             // some bytes less
+    if (how < 3) return;
+    input.erase(place, input.end()); // the rest of another seed
+    input.insert(input.end(), other.begin() + Below(other.size() + 1), other.end());
 }
 
 } // namespace
@@ -58,7 +50,6 @@ void Mutate(Input& input, const Input& other) {
 int main(int argc, char** argv) {
     for (int i = 1; i < argc; ++i) RunFile(argv[i]);
     if (argc > 1) return 0;
-
     std::vector<std::filesystem::path> paths;
     for (const auto& entry : std::filesystem::directory_iterator(TAVO_CORPUS)) paths.push_back(entry.path());
     std::sort(paths.begin(), paths.end());

@@ -8,25 +8,23 @@
 
 namespace {
 
+std::atomic<bool> g_started{false};
+
 struct Endless final : TAVO::Maintenance::IMaintenanceRequest {
-    std::atomic<bool>& started;
-    explicit Endless(std::atomic<bool>& s) : started(s) {}
     const wchar_t* GetName() override { return L"endless"; }
     unsigned long long GetDueTime() override { return 0; }
     std::int32_t GetPriority() override { return 0; }
     void Run() override {
-        for (started = true;;) std::this_thread::sleep_for(std::chrono::seconds(1));
+        for (g_started = true;;) std::this_thread::sleep_for(std::chrono::seconds(1));
     }
 };
-
-std::atomic<bool> g_started{false};
 
 } // namespace
 
 int main(int argc, char**) {
     if (!TAVO::AppInit()) return 1;
     if (argc < 2) return 0;
-    if (!TAVO::Maintenance::RegisterRequest(TAVO::Maintenance::CPRequest<Endless>(g_started))) return 2;
+    if (!TAVO::Maintenance::RegisterRequest(TAVO::Maintenance::CPRequest<Endless>())) return 2;
     while (!g_started) std::this_thread::yield();
     return 0;
 }

@@ -13,24 +13,11 @@ namespace identities {
 
 enum Way { AtLoad, FromValues };
 
-constexpr const char* kNames[] = {"CPPlainMemory",
-                                  "vector of handles",
-                                  "vector of strings",
-                                  "vector of HASHENTRY",
-                                  "CPPoolString",
-                                  "CPXMLObject",
-                                  "CPMutex",
-                                  "CPCriticalSection",
-                                  "CPRWInterlock",
-                                  "CPEvent",
-                                  "CPMultipleEvent",
-                                  "CPThread",
-                                  "CPACI",
-                                  "ptrue",
-                                  "pfalse",
-                                  "pempty",
-                                  "the null string",
-                                  "an interned string"};
+constexpr const char* kNames[] = {"CPPlainMemory", "handles",        "strings",         "HASHENTRY",
+                                  "CPPoolString",  "CPXMLObject",    "CPMutex",         "CPCriticalSection",
+                                  "CPRWInterlock", "CPEvent",        "CPMultipleEvent", "CPThread",
+                                  "CPACI",         "ptrue",          "pfalse",          "pempty",
+                                  "null string",   "interned string"};
 constexpr int kIdentities = sizeof(kNames) / sizeof(*kNames);
 
 struct Table {
@@ -54,22 +41,18 @@ namespace {
 
 const void* Text(const CPPoolString& string) { return static_cast<const wchar_t*>(string); }
 /// The type of a block, as it stands in its header.
-const void* TypeOf(const Buffers::CPObjectMemory& block) {
-    return reinterpret_cast<const void*>(static_cast<std::size_t>(block.GetTypeID()));
-}
-template <class Class> const void* TypeOf() {
-    return reinterpret_cast<const void*>(static_cast<std::size_t>(Class::GetTypeID()));
-}
+const void* TypeOf(const Buffers::CPObjectMemory& block) { return reinterpret_cast<const void*>(block.GetTypeID()); }
 // The virtual table, which is the class where modules meet.
 const void* ClassOf(const EnumWrapper& wrapper) { return *reinterpret_cast<const void* const*>(&wrapper); }
 
 const CPPoolString g_interned(L"interned by every module");
 const EnumWrapper g_wrapper;
 const Table g_atLoad = {{&Buffers::CPPlainMemory::_vtbl, &Handles::_vtbl, &Strings::_vtbl, &HashEntries::_vtbl,
-                         TypeOf<CPPoolString>(), &XML::CPXMLObject::_vtbl, &CPMutex::_vtbl, &CPCriticalSection::_vtbl,
-                         &CPRWInterlock::_vtbl, &CPEvent::_vtbl, &CPMultipleEvent::_vtbl, &CPThread::_vtbl,
-                         ClassOf(g_wrapper), Text(CPPoolString::ptrue), Text(CPPoolString::pfalse),
-                         Text(CPPoolString::pempty), Text(CPPoolString()), Text(g_interned)}};
+                         reinterpret_cast<const void*>(CPPoolString::GetTypeID()), &XML::CPXMLObject::_vtbl,
+                         &CPMutex::_vtbl, &CPCriticalSection::_vtbl, &CPRWInterlock::_vtbl, &CPEvent::_vtbl,
+                         &CPMultipleEvent::_vtbl, &CPThread::_vtbl, ClassOf(g_wrapper), Text(CPPoolString::ptrue),
+                         Text(CPPoolString::pfalse), Text(CPPoolString::pempty), Text(CPPoolString()),
+                         Text(g_interned)}};
 
 // Runs nothing.
 struct Nothing {
@@ -88,11 +71,12 @@ Table OfValues() {
     plain.Alloc(1);
     XML::CPXMLObject element;
     element.SetName(L"element");
-    return {{TypeOf(plain), TypeOf(Handles(1)), TypeOf(Strings(1)), TypeOf(HashEntries(1)), TypeOf<CPPoolString>(),
-             TypeOf(element), TypeOf(CPMutex()), TypeOf(CPCriticalSection()), TypeOf(CPRWInterlock()),
-             TypeOf(CPEvent(true)), TypeOf(CPMultipleEvent()), TypeOf(RunningThread()), ClassOf(EnumWrapper(g_wrapper)),
-             Text(Pool::GetStringRefi(L"TRUE")), Text(Pool::GetStringRefi(L"False")),
-             Text(Pool::GetStringRefn(L"text", 0)), Text(Pool::QueryStringRef(L"nobody interned this")),
+    return {{TypeOf(plain), TypeOf(Handles(1)), TypeOf(Strings(1)), TypeOf(HashEntries(1)),
+             reinterpret_cast<const void*>(CPPoolString::GetTypeID()), TypeOf(element), TypeOf(CPMutex()),
+             TypeOf(CPCriticalSection()), TypeOf(CPRWInterlock()), TypeOf(CPEvent(true)), TypeOf(CPMultipleEvent()),
+             TypeOf(RunningThread()), ClassOf(EnumWrapper(g_wrapper)), Text(Pool::GetStringRefi(L"TRUE")),
+             Text(Pool::GetStringRefi(L"False")), Text(Pool::GetStringRefn(L"text", 0)),
+             Text(Pool::QueryStringRef(L"nobody interned this")),
              Text(Pool::GetStringRefi(L"INTERNED by every MODULE"))}};
 }
 

@@ -1,5 +1,5 @@
 #pragma once
-// What the plug-in's static objects do with the pool.
+// What the plug-in does with the pool, and what the loading tests let it do.
 
 namespace plugin {
 
@@ -8,5 +8,7 @@ using HeldEntry = const wchar_t* (*)(const wchar_t** late);
 constexpr const char* kHeldEntry = "TavoTestHeldEntry";
 constexpr const wchar_t* kHeldText = L"Held by a plug-in's static object";
 constexpr const wchar_t* kLateText = L"interned by a plug-in's static destructor";
+
+enum Deed { Start, Use, RunAThread, KeepHandles, Stop };
 
 } // namespace plugin

@@ -33,23 +33,7 @@ Module::~Module() {
 }
 void* Module::FindSymbol(const char* name, const char*) const { return m_module ? dlsym(m_module, name) : nullptr; }
 
-namespace {
-
-// Lets the traced child run to its end, signals passed on.
-int FollowChild(pid_t child) {
-    int status = 0;
-    while (waitpid(child, &status, 0) == child) {
-        if (WIFEXITED(status)) return WEXITSTATUS(status);
-        if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
-        ptrace(PTRACE_CONT, child, nullptr, WSTOPSIG(status) == SIGTRAP ? 0 : WSTOPSIG(status));
-    }
-    return -1;
-}
-
-} // namespace
-
 std::string RunUnderDebugger(const char* test, int& exitCode) {
-    exitCode = -1;
     int ends[2];
     if (pipe(ends) != 0) return "no pipe";
     const std::string filter = std::string("--gtest_filter=") + test;
@@ -63,12 +47,14 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
         _exit(127);
     }
     close(ends[1]);
-    exitCode = FollowChild(child); // the texts of a test are small enough to wait in the pipe
-    std::string text;
-    char piece[4096];
-    for (ssize_t got; (got = read(ends[0], piece, sizeof piece)) > 0;) text.append(piece, piece + got);
+    int status = 0; // it runs to its end, signals passed on
+    while (waitpid(child, &status, 0) == child && WIFSTOPPED(status))
+        ptrace(PTRACE_CONT, child, nullptr, WSTOPSIG(status) == SIGTRAP ? 0 : WSTOPSIG(status));
+    exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    std::string text(1 << 16, 0); // the texts of a test are small enough to wait in the pipe
+    const auto got = read(ends[0], text.data(), text.size());
     close(ends[0]);
-    return text;
+    return text.substr(0, got > 0 ? static_cast<std::size_t>(got) : 0);
 }
 
 void RunOnStack(std::size_t bytes, const std::function<void()>& body) {

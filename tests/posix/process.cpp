@@ -10,17 +10,12 @@ extern char** environ;
 
 namespace support {
 
-namespace {
-
-std::string Contents(std::FILE* file) {
+static std::string Contents(std::FILE* file) {
     std::string bytes(static_cast<std::size_t>(lseek(fileno(file), 0, SEEK_END)), 0);
-    const auto got = pread(fileno(file), bytes.data(), bytes.size(), 0);
+    EXPECT_EQ(pread(fileno(file), bytes.data(), bytes.size(), 0), static_cast<ssize_t>(bytes.size()));
     std::fclose(file);
-    EXPECT_EQ(got, static_cast<ssize_t>(bytes.size()));
     return bytes;
 }
-
-} // namespace
 
 std::string ToolPath() {
     char path[4096];

@@ -6,7 +6,7 @@
 #include <windows.h>
 
 using namespace TAVO::Files::OS;
-using FileActions = support::FileTest;
+using File = support::FileTest;
 
 // Run by KindsThatOpenElsewhere as a process of its own.
 TEST(FileSharingChild, DISABLED_OpensEveryKind) {
@@ -32,7 +32,7 @@ unsigned support::KindsThatOpenElsewhere(const wchar_t* sharedFile) {
     return code;
 }
 
-TEST_F(FileActions, LeaveOpenAndReadOnlyFilesAlone) {
+TEST_F(File, LeaveOpenAndReadOnlyFilesAlone) {
     support::Put(path, "x");
     ASSERT_TRUE(file.Open(path, FileAccessRead, OpenFileExisting));
     EXPECT_FALSE(_DeleteFile(path));

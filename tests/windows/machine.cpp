@@ -22,35 +22,6 @@ void* Module::FindSymbol(const char*, const char* name) const {
     return m_module ? reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_module), name)) : nullptr;
 }
 
-namespace {
-
-std::string ReadText(HANDLE process, const OUTPUT_DEBUG_STRING_INFO& info) {
-    std::string text(info.nDebugStringLength, '\0');
-    SIZE_T got = 0;
-    ReadProcessMemory(process, info.lpDebugStringData, &text[0], text.size(), &got);
-    return text.c_str(); // without the terminator, which was counted
-}
-
-// Takes the child's events until it ends.
-std::string FollowChild(HANDLE process, int& exitCode) {
-    std::string text;
-    DEBUG_EVENT event;
-    while (WaitForDebugEvent(&event, 60000)) {
-        DWORD how = DBG_CONTINUE;
-        const DWORD code = event.dwDebugEventCode;
-        if (code == OUTPUT_DEBUG_STRING_EVENT) text += ReadText(process, event.u.DebugString);
-        if (code == EXCEPTION_DEBUG_EVENT &&
-            event.u.Exception.ExceptionRecord.ExceptionCode != static_cast<DWORD>(EXCEPTION_BREAKPOINT))
-            how = DBG_EXCEPTION_NOT_HANDLED;
-        if (code == EXIT_PROCESS_DEBUG_EVENT) exitCode = static_cast<int>(event.u.ExitProcess.dwExitCode);
-        ContinueDebugEvent(event.dwProcessId, event.dwThreadId, how);
-        if (code == EXIT_PROCESS_DEBUG_EVENT) break;
-    }
-    return text;
-}
-
-} // namespace
-
 std::string RunUnderDebugger(const char* test, int& exitCode) {
     exitCode = -1;
     char program[MAX_PATH];
@@ -63,7 +34,23 @@ std::string RunUnderDebugger(const char* test, int& exitCode) {
     if (!CreateProcessA(nullptr, &command[0], nullptr, nullptr, FALSE, DEBUG_ONLY_THIS_PROCESS, nullptr, nullptr,
                         &startup, &child))
         return "no process";
-    const std::string text = FollowChild(child.hProcess, exitCode);
+    std::string text;
+    DEBUG_EVENT event = {};
+    while (event.dwDebugEventCode != EXIT_PROCESS_DEBUG_EVENT && WaitForDebugEvent(&event, 60000)) {
+        DWORD how = DBG_CONTINUE;
+        if (event.dwDebugEventCode == OUTPUT_DEBUG_STRING_EVENT) {
+            const OUTPUT_DEBUG_STRING_INFO& info = event.u.DebugString;
+            std::string piece(info.nDebugStringLength, '\0');
+            ReadProcessMemory(child.hProcess, info.lpDebugStringData, &piece[0], piece.size(), nullptr);
+            text += piece.c_str(); // without the terminator, which was counted
+        }
+        if (event.dwDebugEventCode == EXCEPTION_DEBUG_EVENT &&
+            event.u.Exception.ExceptionRecord.ExceptionCode != static_cast<DWORD>(EXCEPTION_BREAKPOINT))
+            how = DBG_EXCEPTION_NOT_HANDLED;
+        if (event.dwDebugEventCode == EXIT_PROCESS_DEBUG_EVENT)
+            exitCode = static_cast<int>(event.u.ExitProcess.dwExitCode);
+        ContinueDebugEvent(event.dwProcessId, event.dwThreadId, how);
+    }
     CloseHandle(child.hThread);
     CloseHandle(child.hProcess);
     return text;

@@ -9,10 +9,7 @@ namespace {
 
 std::vector<wchar_t> Widen(const std::string& text) {
     std::vector<wchar_t> wide(text.size() + 1);
-    const int units = MultiByteToWideChar(CP_UTF8, 0, text.data(), static_cast<int>(text.size()), wide.data(),
-                                          static_cast<int>(wide.size()));
-    wide.resize(static_cast<std::size_t>(units) + 1);
-    wide.back() = 0;
+    MultiByteToWideChar(CP_UTF8, 0, text.c_str(), -1, wide.data(), static_cast<int>(wide.size()));
     return wide;
 }
 
@@ -30,8 +27,7 @@ std::string Quote(const std::string& argument) {
 
 // An open file that other processes inherit, and that goes when it is closed.
 HANDLE MakeStream() {
-    wchar_t folder[MAX_PATH];
-    wchar_t path[MAX_PATH];
+    wchar_t folder[MAX_PATH], path[MAX_PATH];
     GetTempPathW(MAX_PATH, folder);
     GetTempFileNameW(folder, L"tav", 0, path);
     SECURITY_ATTRIBUTES inherited = {sizeof(inherited), nullptr, TRUE};
@@ -69,11 +65,8 @@ Finished RunTool(const std::vector<std::string>& arguments, const std::string& i
 
     Finished finished;
     PROCESS_INFORMATION process = {};
-    const bool started =
-        CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &start, &process) != 0;
-    EXPECT_TRUE(started);
-    if (started) {
-        DWORD code = 0;
+    DWORD code = 0;
+    if (CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &start, &process)) {
         WaitForSingleObject(process.hProcess, INFINITE);
         if (GetExitCodeProcess(process.hProcess, &code)) finished.code = static_cast<int>(code);
         CloseHandle(process.hThread);
