@@ -4,13 +4,10 @@
 #include "support/heapwatch.h"
 
 #include <atomic>
-#include <cstdlib>
 #include <functional>
-#include <random>
 #include <stdexcept>
 #include <TAVO/maintenance.h>
 #include <TAVO/string.h>
-#include <TAVO/xml.h>
 #include <thread>
 #include <vector>
 
@@ -189,37 +186,6 @@ TEST(Maintenance, StartsStopsAndRegistersOnManyThreadsAndAStopIsQuick) {
         AppExit();
         EXPECT_FALSE(IsRunning());
     });
-}
-
-// Strings, documents and requests on every processor, while the pool is swept. For a soak: TAVO_SOAK_SECONDS.
-TEST(Maintenance, SweepsUnderABusyHost) {
-    const char* const wanted = std::getenv("TAVO_SOAK_SECONDS");
-    const auto end = Clock::now() + std::chrono::milliseconds(wanted ? 1000 * std::atoi(wanted) : 500);
-    const Running services;
-    const auto entries = CStringPool::GetNItems();
-    const auto host = [&](unsigned seed) {
-        std::mt19937 random(seed);
-        std::vector<CPPoolString> held(5000);
-        while (Clock::now() < end) {
-            std::string text = "<timeline>";
-            for (int i = 0; i < 5000; ++i) { // some are met again and again and some seldom
-                const std::string name = "Clip " + std::to_string(random() % (1u << random() % 17));
-                held[random() % held.size()] = CPPoolString(name.c_str());
-                if (i % 100 == 0) text += "<clip name='" + name + "'><in>01:00:00:00</in></clip>";
-            }
-            text += "</timeline>";
-            XML::CXMLDoc document;
-            EXPECT_TRUE(document.OpenDocText(text.data(), text.size()));
-            const CPWork work;
-            EXPECT_TRUE(RegisterRequest(work) && UnregisterRequest(work));
-            if (seed == 0) CStringPool::Collect(1);
-        }
-    };
-    std::vector<std::thread> threads;
-    for (unsigned seed = 0; seed < 3; ++seed) threads.emplace_back(host, seed);
-    for (auto& thread : threads) thread.join();
-    EXPECT_TRUE(CStringPool::Verify() && CStringPool::Collect(60000) && CStringPool::Collect(60000));
-    EXPECT_LE(CStringPool::GetNItems(), entries) << "nothing is left, nor lost";
 }
 
 TEST(Maintenance, PoolSweepsStartOnce) {

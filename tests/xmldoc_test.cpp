@@ -177,7 +177,24 @@ TEST(XmlReader, CutAnywhere) {
     }
 }
 
-// Tokens anywhere in a document, or nothing but tokens. Damage to bytes is the business of the fuzz target's replay.
+TEST(XmlReader, AnyByteAtAnyPlace) {
+    const std::string text = "<?xml?><a b='1 &lt;'>\n<c>&#65; x<![CDATA[y]]></c><!----></a>";
+    const std::u16string units = Wide(text);
+    for (std::size_t at = 0; at < text.size(); ++at)
+        for (int value = 0; value < 256; ++value) {
+            std::string damaged = text;
+            damaged[at] = static_cast<char>(value);
+            Compare(damaged);
+            std::u16string wide = units;
+            wide[at] = static_cast<char16_t>(value << 8 | (value & 1 ? units[at] : 0));
+            Compare(wide);
+            wide[at] = static_cast<char16_t>(value);
+            if (value >= 0x80) Compare(wide); // others as above
+            if (HasFatalFailure()) return;
+        }
+}
+
+// Tokens anywhere in a document, or nothing but tokens.
 TEST(XmlReader, RandomTokens) {
     std::vector<std::string> tokens(1);
     for (std::istringstream texts(kTokens); std::getline(texts, tokens.back(), '|');) tokens.emplace_back();

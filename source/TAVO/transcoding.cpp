@@ -581,9 +581,8 @@ std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target*
     if (!convert(source, extent, target)) return 0;
     // Intended (cut-or-fail): as many characters are read as there are target units, so that behind a character that
     // took more than one an invalid sequence is met and fails the whole, while it ends other texts silently. One that
-    // the terminator cuts is invalid; of one that the source length cuts nobody can tell.
-    const bool invalid = extent.ending == Ending::Invalid || (extent.ending == Ending::Cut && length < sourceLength);
-    if (invalid && extent.target > extent.characters) return 0;
+    // the text's end cuts, be it the terminator or the source length, is not read.
+    if (extent.ending == Ending::Invalid && extent.target > extent.characters) return 0;
     *target = 0;
     return need;
 }

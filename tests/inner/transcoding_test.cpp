@@ -37,9 +37,8 @@ std::pair<std::size_t, Target> Convert(const Text& text, std::size_t n, Encode e
     Target written;
     std::size_t i = 0;
     for (std::size_t iteration = 1; iteration < need; ++iteration) {
-        const Character c = LookAt(text, i, n);
-        const bool isCut = i < text.size() - 1 && n >= text.size(); // by the terminator, should it end here
-        if (c.look == Look::Ended && !isCut) break;
+        const Character c = LookAt(text, i, std::min(n, text.size() - 1)); // the terminator cuts as n does
+        if (c.look == Look::Ended) break;
         if (c.look != Look::Good || c.value > 0x10FFFF) return {0, written};
         i += c.units;
         for (auto unit : encode(c.value)) written.push_back(unit);
