@@ -54,7 +54,9 @@ CBaseHashTable::Place CBaseHashTable::Locate(unsigned long long hash, const CPOb
         return compared < 0 ? -1 : compared > 0 ? 1 : 0;
     };
     try {
-        return TableAccess::Locate(*this, hash, order);
+        Place place;
+        TableAccess::Locate(*this, hash, order, place);
+        return place;
     } catch (...) {
         // Nothing is found there, and nothing can be inserted.
         return {static_cast<std::size_t>(hash & m_mask), Buffers::NotFound, false};

@@ -14,7 +14,7 @@ public:
     bool Put(unsigned long long hash, Buffers::CPObjectMemory&& item, std::size_t index) noexcept {
         const std::size_t count = GetNItems();
         HASHENTRY entry{hash, std::move(item)};
-        if (InsertMoved(std::move(entry), index, count < 4 ? 4 : count + count / 2)) return true;
+        if (InsertMoved(std::move(entry), index, count < 4 ? 4 : count + (count < 16 ? 8 : count / 2))) return true;
         item = std::move(entry.item);
         return false;
     }
@@ -60,37 +60,41 @@ public:
         }
     }
 
-    // Where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would be inserted.
-    // `order` tells how what is sought compares with an item: below 0, 0, above 0.
-    template <class Order> static Place Locate(const CBaseHashTable& table, unsigned long long hash, Order order) {
-        Place place{static_cast<std::size_t>(hash & table.m_mask), 0, false};
+    // Sets `place` to where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would
+    // be inserted, and tells whether it is there. `order` tells how what is sought compares with an item: below 0, 0,
+    // above 0.
+    template <class Order>
+    static bool Locate(const CBaseHashTable& table, unsigned long long hash, Order order, Place& place) {
+        place.bucket = static_cast<std::size_t>(hash & table.m_mask);
+        place.index = 0;
+        place.found = false;
         const Bucket* buckets = Buckets(table);
-        if (!buckets) return place;
+        if (!buckets) return false;
         const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
-        if (!bucket) return place;
+        if (!bucket) return false;
         const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
         const std::size_t count = bucket->sUsed / sizeof(Entry);
-        place.index = LowerBound(entries, count, hash);
-        if (place.index < count) {
-            const auto* block = reinterpret_cast<const char*>(Buffers::Block::Of(entries[place.index].item));
+        std::size_t index = LowerBound(entries, count, hash), end = index;
+        if (index < count && entries[index].hash == hash) {
+            const auto* block = reinterpret_cast<const char*>(Buffers::Block::Of(entries[index].item));
             Simd::Prefetch(block);
             Simd::Prefetch(block + 64);
         }
         // Entries of equal hash stand in the order of their items; nearly always there is one. Bisect the run.
-        std::size_t end = place.index;
         for (std::size_t step = 1; end < count && entries[end].hash == hash; step *= 2) end += step;
         if (end > count) end = count;
-        while (place.index < end) {
-            const std::size_t middle = place.index + (end - place.index) / 2;
+        while (index < end) {
+            const std::size_t middle = index + (end - index) / 2;
             const int compared = entries[middle].hash == hash ? order(entries[middle].item) : -1;
             if (compared > 0) {
-                place.index = middle + 1;
+                index = middle + 1;
             } else {
                 end = middle;
                 place.found = compared == 0;
             }
         }
-        return place;
+        place.index = index;
+        return place.found;
     }
 
     static Buffers::CPObjectMemory& Item(const CBaseHashTable& table, const Place& place) {

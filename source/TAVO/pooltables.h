@@ -32,13 +32,7 @@ public:
 
     // The same, but nothing is remembered.
     template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) const {
-        place = Lookup::TableAccess::Locate(*this, text.key.hash, [&](const Buffers::CPObjectMemory& item) {
-            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
-            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
-            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-            return text.Compare(entry.text);
-        });
-        return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
+        return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hash, OrderOf<false>(text), place), place);
     }
 
     // Starts to fetch what a search for that text and adding it will look at, in both tables.
@@ -46,13 +40,8 @@ public:
 
     // The entry that is the lower case of the text.
     template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) const {
-        const auto place = Lookup::TableAccess::Locate(*this, text.key.hashi, [&](const Buffers::CPObjectMemory& item) {
-            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
-            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
-            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-            return text.CompareFolded(entry.text);
-        });
-        return place.found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
+        Place place;
+        return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hashi, OrderOf<true>(text), place), place);
     }
 
     // Enters both tables or none, taking over the reference; false without memory.
@@ -66,6 +55,18 @@ public:
 private:
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
     bool IsDisposable(Buffers::CPObjectMemory item) override;
+    // How the text compares with an entry of the same case-sensitive hash; folded, its lower case does.
+    template <bool folded, class Text> static auto OrderOf(const Text& text) {
+        return [&text](const Buffers::CPObjectMemory& item) {
+            const PoolEntry& entry = *Buffers::Block::PayloadOf<PoolEntry>(item);
+            if (text.key.hashi != entry.hashi) return text.key.hashi < entry.hashi ? -1 : 1;
+            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+            return folded ? text.CompareFolded(entry.text) : text.Compare(entry.text);
+        };
+    }
+    Buffers::tagCPOMEMHEADER* BlockAt(bool found, const Place& place) const {
+        return found ? Buffers::Block::Of(Lookup::TableAccess::Item(*this, place)) : nullptr;
+    }
     void OnDispose(const Buffers::CPObjectMemory& item) override;
 
     CCaseInsensitiveHash& m_groups;
@@ -107,13 +108,18 @@ public:
 
 private:
     template <class Text> Place LocateGroup(const Text& text) const {
-        return Lookup::TableAccess::Locate(*this, text.key.hashi, [&](const Buffers::CPObjectMemory& item) {
-            const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
-            if (!block) return 0;
-            const PoolEntry& entry = EntryOf(const_cast<Buffers::tagCPOMEMHEADER*>(block));
-            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-            return text.CompareFolded(entry.text);
-        });
+        Place place;
+        Lookup::TableAccess::Locate(
+            *this, text.key.hashi,
+            [&](const Buffers::CPObjectMemory& item) {
+                const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
+                if (!block) return 0;
+                const PoolEntry& entry = EntryOf(const_cast<Buffers::tagCPOMEMHEADER*>(block));
+                if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+                return text.CompareFolded(entry.text);
+            },
+            place);
+        return place;
     }
     static Buffers::tagCPOMEMHEADER* RepresentativeOf(const Buffers::CPObjectMemory& item);
     // Replaces what stands at a place by a record of two variants.
