@@ -55,15 +55,30 @@ public:
 
     TAVO_MULTIPLIES std::uint64_t Checksum() const {
         using namespace Simd;
-        // Times x^64, which is the room for the checksum; then the remainder, by Barrett's method. The high words
-        // matter, which stay where they are: moving them to other registers takes as long as a multiplication.
-        constexpr std::uint64_t kPower = PowerOfX(128), kReciprocal = Reciprocal();
-        const Block shifted = Xor(MultiplyHigh(m_state, Pair(0, kPower)), LowToHigh(m_state));
+        constexpr std::uint64_t kPower = PowerOfX(128);
+        // The high words matter, which stay where they are: moving them to other registers takes as long as a
+        // multiplication.
+        return Reduce(Xor(MultiplyHigh(m_state, Pair(0, kPower)), LowToHigh(m_state)));
+    }
+
+    // Of thirty-two bytes, without a multiplication that waits for another before the last two.
+    TAVO_MULTIPLIES static std::uint64_t ChecksumOf(Simd::Block first, Simd::Block second) {
+        using namespace Simd;
+        constexpr std::uint64_t kLow = PowerOfX(192), kHigh = PowerOfX(256), kSecond = PowerOfX(128);
+        const Block by = Pair(kLow, kHigh);
+        return Reduce(Xor(Xor(MultiplyHigh(first, by), MultiplyLow(first, by)),
+                          Xor(MultiplyHigh(second, Pair(0, kSecond)), LowToHigh(second))));
+    }
+
+private:
+    // The remainder, by Barrett's method, of what was multiplied by x^64, which is the room for the checksum.
+    TAVO_MULTIPLIES static std::uint64_t Reduce(Simd::Block shifted) {
+        using namespace Simd;
+        constexpr std::uint64_t kReciprocal = Reciprocal();
         const Block quotient = Xor(shifted, MultiplyHigh(shifted, Pair(0, kReciprocal)));
         return LowWord(Xor(shifted, MultiplyHigh(quotient, Pair(0, kPolynomial))));
     }
 
-private:
     // Times x^bits: the low half by that, the high half by x^64 more.
     template <int bits> TAVO_MULTIPLIES static Simd::Block Moved(Simd::Block state) {
         constexpr std::uint64_t kLow = PowerOfX(bits), kHigh = PowerOfX(bits + 64);

@@ -147,10 +147,8 @@ TAVO_MULTIPLIES inline Simd::Block Lowered(Simd::Block bytes, Simd::Block capita
 
 // The checksum of bytes as units; the last one lowest, none behind the first.
 TAVO_MULTIPLIES inline std::uint64_t ChecksumOfReversed(Simd::Block reversed) {
-    crc64::Fold fold;
-    fold.Start(Simd::Interleave<1, true>(Simd::All8(0), reversed));
-    fold.Add(Simd::Interleave<1, false>(Simd::All8(0), reversed));
-    return fold.Checksum();
+    using namespace Simd;
+    return crc64::Fold::ChecksumOf(Interleave<1, true>(All8(0), reversed), Interleave<1, false>(All8(0), reversed));
 }
 
 // The same for `count` ASCII bytes at the low end of one block, the most usual text: no branch but for capitals.
