@@ -113,6 +113,14 @@ TEST(PoolKeys, FollowTheRulesForEveryText) {
     for (const std::string text : {"x\xC0\x80y", "\xEF\xBF\xBF\xF0\x90\x80\x80", "\xF4\x90\x80\x80", "ab\xE4\xB8",
                                    "\xF0\x9F\x61\x80", "\xE4\xFF\x80"})
         ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, Bytes(text.begin(), text.end()), true)) << text;
+    // ASCII by blocks and lines, with a capital in each of their places.
+    for (const std::size_t length : {8, 15, 16, 17, 31, 263, 264, 272, 335, 400, 1000})
+        for (const std::size_t capital : {std::size_t{0}, length / 3, length / 2, length - 1, length}) {
+            Bytes text(length);
+            for (std::size_t i = 0; i < length; ++i)
+                text[i] = static_cast<unsigned char>(i == capital ? 'K' : '`' + i % 29);
+            ASSERT_NO_FATAL_FAILURE(CheckText<unsigned char>(memory, text, false)) << length << " " << capital;
+        }
     EXPECT_EQ(assertions.Take(), Texts());
 }
 

@@ -118,6 +118,32 @@ public:
         m_folded = capitals;
         if (capitals) m_lower.Start(lower);
     }
+#if defined(TAVO_LINES)
+    // Adds ASCII bytes as units, sixty-four at a step, and returns how many.
+    TAVO_LINE_MULTIPLIES std::size_t AddLines(const unsigned char* text, std::size_t count, Simd::Block order) {
+        using namespace Simd;
+        constexpr std::size_t kLine = sizeof(Line);
+        const Line orders = FourTimes(order);
+        crc64::LineFold exact(m_exact), lower(m_lower);
+        const auto add = [&](crc64::LineFold& fold, Line bytes) TAVO_LINE_MULTIPLIES {
+            fold.Add(ShuffleBlocks(SpreadWords<false>(bytes), orders), ShuffleBlocks(SpreadWords<true>(bytes), orders));
+        };
+        std::size_t i = 0;
+        for (; count - i >= kLine; i += kLine) {
+            const Line bytes = LoadLine(text + i);
+            const std::uint64_t capitals = IsAtLeast8(bytes, 'A') & ~IsAtLeast8(bytes, 'Z' + 1);
+            if (capitals && !m_folded) {
+                m_folded = true;
+                lower = exact;
+            }
+            add(exact, bytes);
+            if (m_folded) add(lower, AddWhere8(capitals, bytes, 'a' - 'A'));
+        }
+        m_exact = exact.Sum();
+        if (m_folded) m_lower = lower.Sum();
+        return i;
+    }
+#endif
     TAVO_MULTIPLIES void Store(Key& key) const {
         key.hash = m_exact.Checksum();
         key.hashi = m_folded ? m_lower.Checksum() : key.hash;
@@ -190,6 +216,10 @@ TAVO_MULTIPLIES void FoldAscii(const unsigned char* text, std::size_t count, Key
         folder.AddLower(Shuffle(Lowered(next, capitals), low));
         i += 8;
     }
+#if defined(TAVO_LINES)
+    constexpr std::size_t kMany = 256; // summing up takes as long as some lines
+    if (count - i >= kMany && HasLineMultiply()) i += folder.AddLines(text + i, count - i, low);
+#endif
     for (; count - i >= 2 * kBlock; i += 2 * kBlock) {
         const Block a = Load(text + i), b = Load(text + i + kBlock);
         const Block capitalsA = CapitalsIn(a), capitalsB = CapitalsIn(b);

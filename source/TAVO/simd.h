@@ -493,6 +493,31 @@ TAVO_LINE_INLINE std::uint32_t IsBelow16(Line a, int b) { return _mm512_cmplt_ep
 TAVO_LINE_INLINE std::uint32_t IsEqual16(Line a, int b) { return _mm512_cmpeq_epi16_mask(a, Line16(b)); }
 TAVO_LINE_INLINE std::uint16_t IsBelow32(Line a, int b) { return _mm512_cmplt_epu32_mask(a, Line32(b)); }
 
+// What Multiply does, in the four blocks of a line side by side: functions marked TAVO_LINE_MULTIPLIES may call what
+// those of lines and of multiplication may, and may be called when HasLineMultiply() is true.
+#define TAVO_LINE_MULTIPLIES                                                                                           \
+    __attribute__((target("avx512f,avx512bw,avx512vl,avx512vbmi,avx512vbmi2,bmi,bmi2,lzcnt,popcnt,ssse3,pclmul,"       \
+                          "vpclmulqdq")))
+inline bool HasLineMultiply() { return HasLines() && HasMultiply() && __builtin_cpu_supports("vpclmulqdq"); }
+TAVO_LINE_MULTIPLIES inline Line MultiplyLow(Line a, Line b) { return _mm512_clmulepi64_epi128(a, b, 0x00); }
+TAVO_LINE_MULTIPLIES inline Line MultiplyHigh(Line a, Line b) { return _mm512_clmulepi64_epi128(a, b, 0x11); }
+TAVO_LINE_INLINE Line Xor3(Line a, Line b, Line c) { return _mm512_ternarylogic_epi64(a, b, c, 0x96); }
+// With masks of all lanes: GCC warns of what the plain forms leave undefined.
+TAVO_LINE_INLINE Line FourTimes(Block a) { return _mm512_maskz_broadcast_i32x4(0xFFFF, a); }
+TAVO_LINE_INLINE Line LastBlock(Block a) { return _mm512_inserti32x4(_mm512_setzero_si512(), a, 3); }
+template <int block> TAVO_LINE_INLINE Block BlockOf(Line a) { return _mm512_maskz_extracti32x4_epi32(0xF, a, block); }
+// Words 0 to 3, or 4 to 7, each in the low half of a block; anything in the high halves.
+template <bool high> TAVO_LINE_INLINE Line SpreadWords(Line a) {
+    constexpr int first = high ? 4 : 0;
+    return _mm512_maskz_permutexvar_epi64(0xFF, _mm512_set_epi64(0, first + 3, 0, first + 2, 0, first + 1, 0, first),
+                                          a);
+}
+// Shuffle in each block.
+TAVO_LINE_INLINE Line ShuffleBlocks(Line a, Line index) { return _mm512_shuffle_epi8(a, index); }
+TAVO_LINE_INLINE Line AddWhere8(std::uint64_t mask, Line a, int value) {
+    return _mm512_mask_add_epi8(a, mask, a, _mm512_set1_epi8(static_cast<char>(value)));
+}
+
 #else
 
 #define TAVO_LINE
