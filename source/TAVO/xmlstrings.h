@@ -67,42 +67,6 @@ inline CPPoolString Intern(const wchar_t* text, std::size_t count) { return Stri
 // in a row at a place moves in: values that occur once leave the others alone. Texts are those of the document and must
 // stay where they are, 1 to 7F all of their units: what is met again is compared with where it stood before.
 template <class Unit, std::size_t Slots> class StringCache {
-public:
-    // Interns `count` units, 1 at least.
-    CPPoolString Get(const Unit* text, std::size_t count) {
-        const Text key(text, count);
-        Slot& slot = m_slots[key.Place()];
-        if (TAVO_LIKELY(slot.Holds(key))) return slot.credit.Take();
-        CPPoolString made = Intern(text, count);
-        slot.Meet(key, made);
-        return made;
-    }
-
-    // The same in two steps, the second of which is quicker when something else is done meanwhile.
-    class Later {
-    public:
-        // The null string when Finish gives it.
-        CPPoolString Begin(StringCache& cache, const Unit* text, std::size_t count) {
-            m_text = Text(text, count);
-            m_slot = &cache.m_slots[m_text.Place()];
-            if (m_slot->Holds(m_text)) return m_slot->credit.Take();
-            CPPoolString known = m_announced.Begin(text, count);
-            if (known.isdef()) m_slot->Meet(m_text, known);
-            return known;
-        }
-        CPPoolString Finish() const {
-            CPPoolString made = m_announced.Finish();
-            m_slot->Meet(m_text, made);
-            return made;
-        }
-
-    private:
-        String::pool::Announced<Unit> m_announced;
-        typename StringCache::Text m_text;
-        typename StringCache::Slot* m_slot = nullptr;
-    };
-
-private:
     // A text and a mix of all its bytes, which no other text of that length has when there are eight or fewer.
     struct Text {
         std::uint64_t mix = 0;
@@ -161,6 +125,42 @@ private:
         }
     };
 
+public:
+    // Interns `count` units, 1 at least.
+    CPPoolString Get(const Unit* text, std::size_t count) {
+        const Text key(text, count);
+        Slot& slot = m_slots[key.Place()];
+        if (TAVO_LIKELY(slot.Holds(key))) return slot.credit.Take();
+        CPPoolString made = Intern(text, count);
+        slot.Meet(key, made);
+        return made;
+    }
+
+    // The same in two steps, the second of which is quicker when something else is done meanwhile.
+    class Later {
+    public:
+        // The null string when Finish gives it.
+        CPPoolString Begin(StringCache& cache, const Unit* text, std::size_t count) {
+            m_text = Text(text, count);
+            m_slot = &cache.m_slots[m_text.Place()];
+            if (m_slot->Holds(m_text)) return m_slot->credit.Take();
+            CPPoolString known = m_announced.Begin(text, count);
+            if (known.isdef()) m_slot->Meet(m_text, known);
+            return known;
+        }
+        CPPoolString Finish() const {
+            CPPoolString made = m_announced.Finish();
+            m_slot->Meet(m_text, made);
+            return made;
+        }
+
+    private:
+        String::pool::Announced<Unit> m_announced;
+        Text m_text;
+        Slot* m_slot = nullptr;
+    };
+
+private:
     Slot m_slots[Slots];
 };
 
