@@ -8,7 +8,8 @@
 
 namespace TAVO::Lookup {
 
-// A bucket's entries. It grows by half again instead of by 16: most buckets hold few entries or very many.
+// A bucket's entries. It grows by four entries, by eight, then by half again, instead of by 16: most buckets hold few
+// entries or very many.
 class CBaseHashTable::Bucket : public Buffers::CPObjectVector<HASHENTRY> {
 public:
     bool Put(unsigned long long hash, Buffers::CPObjectMemory&& item, std::size_t index) noexcept {

@@ -75,7 +75,7 @@ private:
 
     struct alignas(64) Line {
         std::atomic<std::uint64_t> tags{0};     // a byte for each of the first eight ways, lowest first; 0: free
-        std::atomic<std::uint64_t> moreTags{0}; // and of the others; those of no way are never equal to a tag or free
+        std::atomic<std::uint64_t> moreTags{0}; // and of the others; the upper four are never looked at
         std::atomic<Place> places[kWays] = {};
 
         // A bit for each way with that tag, as WayOf knows them. Bits above one may be set in vain.
