@@ -325,6 +325,7 @@ bool CStringPool::Collect(ulong32 budget) noexcept {
         complaint = std::exchange(pool.groups.complaint, nullptr);
     }
     RaiseComplaint(complaint);
+    Platform::HeapTrim();
     return finished;
 }
 

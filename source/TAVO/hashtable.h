@@ -47,9 +47,9 @@ public:
         if (!bucket) return;
         Simd::Prefetch(bucket);
         // From the line before the place that the hash's value suggests; an insertion moves what stands behind.
-        constexpr std::size_t kLine = 64, kLines = 5;
+        constexpr std::size_t kLine = 64, kLines = 9;
         const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, typicalCount) * sizeof(Entry);
-        for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLine);
+        for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - 2 * kLine);
     }
 
     // Starts to fetch the beginnings of all items of a bucket.
@@ -108,40 +108,56 @@ private:
         return static_cast<std::size_t>(((hash >> 32) * count) >> 32);
     }
 
+    // How many of the `count` entries, 1 at least, have a hash below `hash`. Without a branch on what it reads: where
+    // the hash belongs among its neighbours is chance, and a wrong guess of the processor's costs more than a step.
+    static std::size_t CountBelow(const Entry* entries, std::size_t count, unsigned long long hash) {
+        std::size_t below = 0;
+        for (std::size_t left = count; left > 1;) {
+            const std::size_t half = left / 2;
+            below += half & (0 - static_cast<std::size_t>(entries[below + half - 1].hash < hash));
+            left -= half;
+        }
+        return below + (entries[below].hash < hash);
+    }
+
     // First entry whose hash is not below `hash`. Hashes are spread over their whole range, so the place is guessed
-    // from the value and the search widens from there: one or two cache lines instead of a line per halving. Hashes
-    // that are not spread cost twice a bisection.
+    // from the value and sought among the entries around it, which are nearer by far than those that a bisection of all
+    // would look at. Hashes that are not spread cost twice a bisection.
     static std::size_t LowerBound(const Entry* entries, std::size_t count, unsigned long long hash) {
-        if (count == 0) return 0;
-        std::size_t low = 0, high = count; // entries before low are below, entries from high on are not
+        if (count <= kNear) return count ? CountBelow(entries, count, hash) : 0;
+        // The guess is wrong by the square root of the count.
+        return count <= 64 ? SearchAround<kNear>(entries, count, hash) : SearchAround<2 * kNear>(entries, count, hash);
+    }
+
+    static constexpr std::size_t kNear = 16;
+
+    template <std::size_t near>
+    static std::size_t SearchAround(const Entry* entries, std::size_t count, unsigned long long hash) {
         const std::size_t guess = Guess(hash, count);
-        if (entries[guess].hash < hash) {
-            low = guess + 1;
-            for (std::size_t step = 1; low + step <= high; step *= 2) {
-                if (entries[low + step - 1].hash >= hash) {
-                    high = low + step - 1;
-                    break;
-                }
-                low += step;
-            }
-        } else {
-            high = guess;
-            for (std::size_t step = 1; step <= high - low; step *= 2) {
-                if (entries[high - step].hash < hash) {
-                    low = high - step + 1;
-                    break;
-                }
-                high -= step;
-            }
-        }
-        while (low < high) {
-            const std::size_t middle = low + (high - low) / 2;
-            if (entries[middle].hash < hash)
-                low = middle + 1;
-            else
-                high = middle;
-        }
-        return low;
+        std::size_t first = guess < near / 2 ? 0 : guess - near / 2;
+        if (first > count - near) first = count - near;
+        const std::size_t index = first + CountBelow(entries + first, near, hash);
+        if (index == first && first > 0 && entries[first - 1].hash >= hash) return SearchDown(entries, first - 1, hash);
+        if (index == first + near && index < count && entries[index].hash < hash)
+            return SearchUp(entries, index, count, hash);
+        return index;
+    }
+
+    // The entry at `from` is not below `hash`; so are those behind it.
+    TAVO_NOINLINE static std::size_t SearchDown(const Entry* entries, std::size_t from, unsigned long long hash) {
+        std::size_t high = from, step = 1;
+        while (step <= high && entries[high - step].hash >= hash) high -= step, step *= 2;
+        const std::size_t low = step <= high ? high - step : 0;
+        return low + (high > low ? CountBelow(entries + low, high - low, hash) : 0);
+    }
+
+    // The entry at `from` is below `hash`, as those before it are.
+    TAVO_NOINLINE static std::size_t SearchUp(const Entry* entries, std::size_t from, std::size_t count,
+                                              unsigned long long hash) {
+        std::size_t low = from + 1, step = 1;
+        while (step <= count - low && entries[low + step - 1].hash < hash) low += step, step *= 2;
+        const std::size_t left = step <= count - low ? step - 1 : count - low;
+        return low + (left ? CountBelow(entries + low, left, hash) : 0);
     }
 };
 

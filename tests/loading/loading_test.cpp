@@ -5,6 +5,7 @@
 #include "plugin/pool.h"
 #include "support/gate.h"
 
+#include <chrono>
 #include <cstdlib>
 #include <gtest/gtest.h>
 #include <initializer_list>
@@ -50,6 +51,19 @@ TEST(Loading, CyclesDoNotGrowAndGiveTheSlotsOfThreadsBack) {
     EXPECT_LE(loading::PrivateBytes(), before + kMostGrowth);
     EXPECT_EQ(loading::FirstFreeSlot(), slot) << "of threads; there are few";
 }
+
+#if defined(TAVO_TEST_TRIMS)
+TEST(Loading, SweepsGiveThePoolsMemoryBackToTheSystem) {
+    const Loaded plugin({Use});
+    const std::size_t before = loading::PrivateBytes();
+    plugin.Do(Fill);
+    const std::size_t filled = loading::PrivateBytes() - before;
+    plugin.Do(Sweep);
+    std::this_thread::sleep_for(std::chrono::milliseconds(600)); // the heap waits whether it is needed again
+    plugin.Do(Sweep);
+    EXPECT_LT(loading::PrivateBytes(), before + filled / 2);
+}
+#endif
 
 TEST(Loading, ForgottenServicesKeepTheLibrary) {
     { const Loaded plugin({Start, Use}); }

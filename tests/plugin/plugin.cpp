@@ -5,6 +5,7 @@
 #include "pool.h"
 
 #include <new>
+#include <vector>
 
 using namespace TAVO;
 
@@ -54,6 +55,10 @@ TAVO_EXPORT void TavoTestService(plugin::Deed deed, void** kept) {
         thread.Wait(Threading::WaitForever);
     }
     if (deed == plugin::KeepHandles) ::new (static_cast<void*>(kept)) String::CPPoolString(L"Never let go");
+    if (deed == plugin::Fill)
+        for (std::vector<String::CPPoolString> held; held.size() < 2500000;) held.emplace_back(held.size() + 1000);
+    if (deed == plugin::Sweep)
+        for (int round = 0; round < 2; ++round) String::CStringPool::Collect(60000);
     if (deed == plugin::Stop) AppExit();
 }
 }

@@ -9,6 +9,6 @@ constexpr const char* kHeldEntry = "TavoTestHeldEntry";
 constexpr const wchar_t* kHeldText = L"Held by a plug-in's static object";
 constexpr const wchar_t* kLateText = L"interned by a plug-in's static destructor";
 
-enum Deed { Start, Use, RunAThread, KeepHandles, Stop };
+enum Deed { Start, Use, RunAThread, KeepHandles, Fill, Sweep, Stop };
 
 } // namespace plugin

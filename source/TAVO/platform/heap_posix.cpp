@@ -36,4 +36,10 @@ void* HeapResize(void* block, std::size_t size) noexcept {
 
 void HeapRelease(void* block) noexcept { mi_free(block); }
 
+void HeapTrim() noexcept {
+#if defined(TAVO_MIMALLOC)
+    mi_collect(false);
+#endif
+}
+
 } // namespace TAVO::Platform

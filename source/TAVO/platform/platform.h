@@ -18,6 +18,9 @@ void* HeapAllocate(std::size_t size) noexcept;
 void* HeapResize(void* block, std::size_t size) noexcept;
 // Null is ignored.
 void HeapRelease(void* block) noexcept;
+// Gives back to the system what the calling thread allocated and nobody needs any more, where the heap does not do so
+// by itself. For now and then: it looks at every page of the thread's.
+void HeapTrim() noexcept;
 
 // --- modules and configuration -------------------------------------------------------------------------------------
 
