@@ -241,9 +241,7 @@ protected:
     T* Elements() const noexcept;
     bool GrowTo(std::size_t capacity) noexcept;
     bool LeaveStatic() noexcept;
-    // Insert with a capacity of its own choice and without counting. False leaves the element where it is.
-    bool InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept;
-    // Takes the element out, uncounted, and closes the gap. Requires: an index below the count, a block that may change.
+    // Takes the element out, uncounted, and closes the gap. Requires: index below the count, a block that may change.
     T Extract(std::size_t index, bool releaseWhenEmpty) noexcept;
 };
 

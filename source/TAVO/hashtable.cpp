@@ -69,7 +69,7 @@ CBaseHashTable::HASHENTRY& CBaseHashTable::At(const Place& place) noexcept {
 
 bool CBaseHashTable::InsertAt(const Place& place, unsigned long long hash, CPObjectMemory&& item) noexcept {
     if (place.index == Buffers::NotFound) return false; // the comparison threw
-    if (m_index.isEmpty() && !m_index.Alloc(m_buckets)) return false;
+    if (!Buckets() && !m_index.Alloc(m_buckets)) return false;
     return Buckets()[place.bucket].Put(hash, std::move(item), place.index);
 }
 

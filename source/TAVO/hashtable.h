@@ -4,6 +4,8 @@
 #include "blocks.h"
 #include "simd.h"
 
+#include <cstring>
+#include <new>
 #include <TAVO/lookup.h>
 
 namespace TAVO::Lookup {
@@ -12,13 +14,18 @@ namespace TAVO::Lookup {
 // entries or very many.
 class CBaseHashTable::Bucket : public Buffers::CPObjectVector<HASHENTRY> {
 public:
+    // At an index up to the count. False without memory; the item stays where it is.
     bool Put(unsigned long long hash, Buffers::CPObjectMemory&& item, std::size_t index) noexcept {
-        const std::size_t count = GetNItems();
-        HASHENTRY entry{hash, std::move(item)};
-        if (InsertMoved(std::move(entry), index, count < 4 ? 4 : count + (count < 16 ? 8 : count / 2))) return true;
-        item = std::move(entry.item);
-        return false;
+        const std::size_t count = Count();
+        const bool hasRoom = m_pMH && m_pMH->sUsed + sizeof(HASHENTRY) <= m_pMH->sAllocated;
+        if (!hasRoom && !GrowTo(count < 4 ? 4 : count + (count < 16 ? 8 : count / 2))) return false;
+        HASHENTRY* slot = reinterpret_cast<HASHENTRY*>(m_pMH + 1) + index;
+        std::memmove(static_cast<void*>(slot + 1), static_cast<const void*>(slot), (count - index) * sizeof(*slot));
+        ::new (static_cast<void*>(slot)) HASHENTRY{hash, std::move(item)};
+        m_pMH->sUsed += sizeof(*slot);
+        return true;
     }
+    std::size_t Count() const noexcept { return m_pMH ? m_pMH->sUsed / sizeof(HASHENTRY) : 0; }
     // Closes the gap before anything is released; the block goes with the last entry.
     Buffers::CPObjectMemory Take(std::size_t index, bool releaseWhenEmpty = true) noexcept {
         return std::move(Extract(index, releaseWhenEmpty).item);
@@ -54,7 +61,7 @@ public:
 
     // Starts to fetch the beginnings of all items of a bucket.
     static void FetchItems(const Bucket& bucket) {
-        for (std::size_t i = 0; i < bucket.GetNItems(); ++i) {
+        for (std::size_t i = 0; i < bucket.Count(); ++i) {
             const auto* item = reinterpret_cast<const char*>(Buffers::Block::Of(bucket[i].item));
             Simd::Prefetch(item);
             Simd::Prefetch(item + 64);

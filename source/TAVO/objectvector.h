@@ -112,20 +112,15 @@ template <class T> bool CPObjectVector<T>::Insert(const T& element, std::size_t 
     T inserted(element); // counted before anything moves: the argument may live in this very vector
     // Intended (vector-growth): by 16 elements, where a textbook grows by a factor. Most vectors are short, and long
     // ones are reserved by their builders, who read the capacities.
-    return InsertMoved(std::move(inserted), position, GetNItems() + 16);
-}
-
-template <class T>
-bool CPObjectVector<T>::InsertMoved(T&& element, std::size_t position, std::size_t capacityWhenFull) noexcept {
     // Intended (vector-shared): with room the block changes in place also when it is shared, and every holder sees it.
     // A textbook would copy first; holders pass lists on that way, and clone() where they must not.
     const std::size_t count = GetNItems();
-    if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(capacityWhenFull)) return false;
+    if ((IsStatic() || GetSize() + sizeof(T) > GetAllocSize()) && !GrowTo(count + 16)) return false;
     m_pMH->sUsed = (count + 1) * sizeof(T);
     if (position > count) position = count;
     T* slot = Elements() + position;
     std::memmove(static_cast<void*>(slot + 1), static_cast<const void*>(slot), (count - position) * sizeof(T));
-    ::new (static_cast<void*>(slot)) T(std::move(element));
+    ::new (static_cast<void*>(slot)) T(std::move(inserted));
     return true;
 }
 

@@ -123,7 +123,7 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
         LetGo(std::move(item));
         return false;
     }
-    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].GetNItems();
+    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].Count();
     return true;
 }
 
@@ -144,7 +144,7 @@ bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
 void CCaseInsensitiveHash::Clear() noexcept {
     TableAccess::Bucket* buckets = TableAccess::Buckets(*this);
     for (std::size_t i = 0; buckets && i <= 0xFFF; ++i)
-        while (!buckets[i].isEmpty()) LetGo(buckets[i].Take(buckets[i].GetNItems() - 1));
+        while (!buckets[i].isEmpty()) LetGo(buckets[i].Take(buckets[i].Count() - 1));
     ClearTable();
 }
 
@@ -174,7 +174,7 @@ bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry) noexcep
         m_groups.Remove(block);
         return false;
     }
-    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].GetNItems();
+    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].Count();
     return true;
 }
 
