@@ -53,10 +53,22 @@ public:
         const auto* bucket = reinterpret_cast<const char*>(Buffers::Block::Of(buckets[hash & table.m_mask]));
         if (!bucket) return;
         Simd::Prefetch(bucket);
-        // From the line before the place that the hash's value suggests; an insertion moves what stands behind.
+        // Around the place that the hash's value suggests, and on: an insertion moves what stands behind.
         constexpr std::size_t kLine = 64, kLines = 9;
         const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, typicalCount) * sizeof(Entry);
         for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - 2 * kLine);
+    }
+
+    // Starts to fetch what an insertion at that place will move, from the end, where the moving begins.
+    static void FetchMoved(const CBaseHashTable& table, const Place& place) {
+        const Bucket* buckets = Buckets(table);
+        const Buffers::tagCPOMEMHEADER* bucket = buckets ? Buffers::Block::Of(buckets[place.bucket]) : nullptr;
+        if (!bucket) return;
+        constexpr std::size_t kLine = 64, kMostLines = 32;
+        const auto* entries = reinterpret_cast<const char*>(bucket + 1);
+        const std::size_t end = bucket->sUsed, near = place.index * sizeof(Entry) + 5 * kLine; // Fetch went so far
+        for (std::size_t line = 0; line < kMostLines && near + line * kLine < end; ++line)
+            Simd::Prefetch(entries + end - 1 - line * kLine);
     }
 
     // Starts to fetch the beginnings of all items of a bucket.

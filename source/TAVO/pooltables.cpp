@@ -113,6 +113,7 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
         return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
     }
     if (IsCaseless(text)) return true; // alone, and found by its own hash
+    TableAccess::FetchMoved(*this, place);
     CPObjectMemory item;
     if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
         if (!MakeRecord(item, lower, entry)) return false;

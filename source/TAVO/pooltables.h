@@ -26,7 +26,10 @@ public:
             if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
         }
         Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
-        if (found) m_front.Remember(found);
+        if (found)
+            m_front.Remember(found);
+        else
+            Lookup::TableAccess::FetchMoved(*this, place);
         return found;
     }
 
