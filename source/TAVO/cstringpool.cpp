@@ -32,7 +32,8 @@ struct Pool {
         for (Static which : {Static::True, Static::False}) {
             tagCPOMEMHEADER* block = StaticEntry(which);
             CCaseSensitiveHash::Place place;
-            if (!entries.Find(pool::StoredText(EntryOf(block)), place)) entries.Add(place, Block::Adopt(block));
+            const pool::StoredText text(EntryOf(block));
+            if (!entries.Find(text, place)) entries.Add(place, Block::Adopt(block), text, true);
         }
     }
 };
@@ -88,7 +89,9 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
     if (!block) return nullptr;
     CPObjectMemory entry(Block::Adopt(block));
-    if (!text.Write(out) || !pool.entries.Add(place, std::move(entry))) return nullptr;
+    if (!text.Write(out)) return nullptr;
+    const pool::StoredText stored(text.key, out);
+    if (!pool.entries.Add(place, std::move(entry), stored, text.IsCaseless(out))) return nullptr;
     block->lRefCnt = 2; // the table's and the caller's; nobody else knows the block before the lock is left
     return block;
 }
@@ -141,9 +144,10 @@ CPPoolString InternBlock(tagCPOMEMHEADER* block) noexcept {
     Pool& pool = ThePool();
     pool::Guard guard(pool.lock);
     CCaseSensitiveHash::Place place;
-    if (tagCPOMEMHEADER* found = pool.entries.Find(pool::StoredText(EntryOf(block)), place, false))
-        return PoolAccess::Share(found);
-    return pool.entries.Add(place, std::move(entry)) ? PoolAccess::Share(block) : CPPoolString();
+    const pool::StoredText text(EntryOf(block));
+    if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, false)) return PoolAccess::Share(found);
+    return pool.entries.Add(place, std::move(entry), text, text.IsCaseless()) ? PoolAccess::Share(block)
+                                                                              : CPPoolString();
 }
 
 // --- visitors ------------------------------------------------------------------------------------------------------

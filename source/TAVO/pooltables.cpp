@@ -37,16 +37,6 @@ constexpr Buffers::tagCPOVTABL kGroupTable = {CreateNothing, nullptr, FinalizeGr
 bool IsRecord(const CPObjectMemory& item) { return Block::Of(item)->pVTbl == &kGroupTable; }
 Group& GroupOf(const CPObjectMemory& record) { return *Block::PayloadOf<Group>(record); }
 
-// Whether a text is its own lower case, as far as tables look. Texts can be made whose capitals cancel out in the hash,
-// so the units that are compared are asked too.
-bool IsCaseless(const StoredText& text) {
-    if (text.key.hash != text.key.hashi) return false;
-    if (text.key.length >= pool::kComparedUnits) return !pool::HoldsCapitals(text.text);
-    for (std::size_t i = 0; i < pool::kComparedUnits && text.text[i]; ++i)
-        if (detail::FoldUnit(text.text[i]) != text.text[i]) return false;
-    return true;
-}
-
 // Lets go of an item that may be an uncounted entry.
 void LetGo(CPObjectMemory&& item) {
     if (!IsRecord(item)) Block::RefOf(item) = nullptr;
@@ -105,14 +95,14 @@ bool CCaseInsensitiveHash::MakeRecord(CPObjectMemory& item, tagCPOMEMHEADER* fir
     return true;
 }
 
-bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash& entries) noexcept {
-    const StoredText text(EntryOf(entry));
+bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const StoredText& text, bool caseless,
+                               const CCaseSensitiveHash& entries) noexcept {
     const Place place = LocateGroup(text);
     if (place.found) {
         CPObjectMemory& item = TableAccess::Item(*this, place);
         return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
     }
-    if (IsCaseless(text)) return true; // alone, and found by its own hash
+    if (caseless) return true; // alone, and found by its own hash
     TableAccess::FetchMoved(*this, place);
     CPObjectMemory item;
     if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
@@ -131,7 +121,7 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const CCaseSensitiveHash&
 bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
     const StoredText text(EntryOf(entry));
     const Place place = LocateGroup(text);
-    if (!place.found) return IsCaseless(text);
+    if (!place.found) return text.IsCaseless();
     CPObjectMemory& item = TableAccess::Item(*this, place);
     if (!IsRecord(item)) {
         if (Block::Of(item) != entry) return false;
@@ -167,11 +157,12 @@ void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
     if (key.hash != key.hashi) TableAccess::Fetch(*this, key.hashi, m_typicalCount); // its lower case
 }
 
-bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry) noexcept {
+bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry, const StoredText& text,
+                             bool caseless) noexcept {
     tagCPOMEMHEADER* block = Block::Of(entry);
     // The group first: it looks for a lower-case variant, which must not be the entry itself.
-    if (!m_groups.Add(block, *this)) return false;
-    if (!InsertAt(place, EntryOf(block).hash, std::move(entry))) {
+    if (!m_groups.Add(block, text, caseless, *this)) return false;
+    if (!InsertAt(place, text.key.hash, std::move(entry))) {
         m_groups.Remove(block);
         return false;
     }

@@ -47,8 +47,9 @@ public:
         return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hashi, OrderOf<true>(text), place), place);
     }
 
-    // Enters both tables or none, taking over the reference; false without memory.
-    bool Add(const Place& place, Buffers::CPObjectMemory&& entry) noexcept;
+    // Enters both tables or none, taking over the reference; false without memory. The caller tells what it knows of
+    // the entry's text: reading what was written a moment ago would wait until it has reached memory.
+    bool Add(const Place& place, Buffers::CPObjectMemory&& entry, const pool::StoredText& text, bool caseless) noexcept;
     // Drops entries that nobody has held for two sweeps. False when the time was too short, or a thread was stopped in
     // the middle of a look-up.
     bool Dispose(std::uint32_t budget) noexcept;
@@ -99,8 +100,9 @@ public:
     // Starts to fetch what adding an entry of that key will look at.
     void Fetch(const pool::Key& key) const noexcept { Lookup::TableAccess::Fetch(*this, key.hashi, m_typicalCount); }
 
-    // Puts an entry into its group. False without memory; nothing has changed then.
-    bool Add(Buffers::tagCPOMEMHEADER* entry, const CCaseSensitiveHash& entries) noexcept;
+    // Puts an entry, which has that text, into its group. False without memory; nothing has changed then.
+    bool Add(Buffers::tagCPOMEMHEADER* entry, const pool::StoredText& text, bool caseless,
+             const CCaseSensitiveHash& entries) noexcept;
     // Takes an entry out of its group. False when it should have one and has not.
     bool Remove(Buffers::tagCPOMEMHEADER* entry) noexcept;
     // Lets everything go.

@@ -5,6 +5,7 @@
 //   CompareFolded(stored)     the same regardless of case
 //   Units()                   units of the whole text
 //   Write(out)                the whole text; false when it has no wide form
+//   IsCaseless(stored)        whether it is its own lower case; it has been written to `stored`
 // so that a text becomes a stored string only when it is missing.
 
 #include "poolentry.h"
@@ -17,15 +18,13 @@ namespace TAVO::String::pool {
 // cache lines.
 constexpr std::size_t kComparedUnits = 10;
 
-// Whether one of the units that are compared is A to Z; there are as many. They were written a moment ago, eight at
-// once and the others behind: loads that span two stores would wait for both.
-inline bool HoldsCapitals(const wchar_t* text) {
-    using namespace Simd;
-    const Block units = Load(text);
-    if (Mask(And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units)))) return true;
-    for (std::size_t i = 8; i < kComparedUnits; ++i)
-        if (detail::FoldUnit(text[i]) != text[i]) return true;
-    return false;
+// Whether a text of up to `units` units is its own lower case, as far as tables look. Texts can be made whose capitals
+// cancel out in the hash, so the units that are compared are asked too.
+template <class Unit> bool IsCaseless(const Key& key, const Unit* text, std::size_t units) {
+    if (key.hash != key.hashi) return false;
+    for (std::size_t i = 0; i < kComparedUnits && i < units && text[i]; ++i)
+        if (text[i] >= 'A' && text[i] <= 'Z') return false;
+    return true;
 }
 
 template <bool folded, class Unit> int CompareFirstUnits(const Unit* text, std::size_t units, const wchar_t* stored) {
@@ -50,6 +49,8 @@ template <class Unit> struct PlainText {
         return CompareFirstUnits<false>(text, units, stored);
     }
     int CompareFolded(const wchar_t* stored) const { return CompareFirstUnits<true>(text, units, stored); }
+    // Not from the stored text, which was written a moment ago: reading it would wait until it has reached memory.
+    bool IsCaseless(const wchar_t*) const { return pool::IsCaseless(key, text, units); }
     std::size_t Units() const { return units; }
     bool Write(wchar_t* out) const {
         if constexpr (sizeof(Unit) == sizeof(wchar_t)) {
@@ -98,6 +99,7 @@ struct Utf8Text {
 
     int Compare(const wchar_t* stored) const { return CompareAs<false>(stored); }
     int CompareFolded(const wchar_t* stored) const { return CompareAs<true>(stored); }
+    bool IsCaseless(const wchar_t* stored) const { return pool::IsCaseless(key, stored, kComparedUnits); }
     std::size_t Units() const { return key.length; } // a character above FFFF counts 2
     bool Write(wchar_t* out) const { return detail::ConvertUtf8(text, detail::MeasureUtf8(text, bytes), out); }
 
@@ -118,8 +120,10 @@ struct StoredText {
     Key key;
     const wchar_t* text;
 
+    StoredText(const Key& known, const wchar_t* stored) : key(known), text(stored) {}
     explicit StoredText(const PoolEntry& entry)
         : key{entry.length, entry.utf8Size, entry.hash, entry.hashi}, text(entry.text) {}
+    bool IsCaseless() const { return pool::IsCaseless(key, text, kComparedUnits); }
     int Compare(const wchar_t* stored) const { return CompareFirstUnits<false>(text, kComparedUnits, stored); }
     int CompareFolded(const wchar_t* stored) const { return CompareFirstUnits<true>(text, kComparedUnits, stored); }
 };

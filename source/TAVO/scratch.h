@@ -27,10 +27,13 @@ public:
 
     // False without memory; the run is then as it was.
     bool Push(const T& element) {
-        if (TAVO_UNLIKELY(m_count == m_capacity) && !Grow(1)) return false;
-        m_first[m_count++] = element;
-        return true;
+        T* place = Add();
+        if (place) *place = element;
+        return place != nullptr;
     }
+    // The same, but the caller writes the element, all of it: one that was just put together elsewhere would have to
+    // reach memory before a copy of it in larger pieces could begin.
+    T* Add() { return TAVO_UNLIKELY(m_count == m_capacity) && !Grow(1) ? nullptr : m_first + m_count++; }
     // Room for `more` elements behind the last.
     bool Reserve(std::size_t more) { return m_capacity - m_count >= more || Grow(more); }
     void Cut(std::size_t count) { m_count = count; }

@@ -96,7 +96,7 @@ private:
     bool OutOfMemory() { return Fail(kDomError, m_at); }
 
     // --- looking ahead
-    // -------------------------------------------------------------------------------------------------
+    // --------------------------------------------------------------------------------------------------
 
     bool AtEnd() const { return m_at == m_end; }
 
@@ -120,7 +120,7 @@ private:
     }
 
     // --- the document
-    // --------------------------------------------------------------------------------------------------
+    // ---------------------------------------------------------------------------------------------------
 
     bool Document() {
         if (Stands(m_at, "\xEF\xBB\xBF") && kUtf8) m_at += 3;
@@ -263,7 +263,7 @@ private:
     bool MixedContent(const Unit* at) { return Fail(kMixedContent, at); }
 
     // --- names
-    // ---------------------------------------------------------------------------------------------------------
+    // ----------------------------------------------------------------------------------------------------------
 
     // Moves behind the name at m_at.
     bool Name(Spelling& name) {
@@ -315,7 +315,7 @@ private:
     }
 
     // --- tags
-    // ----------------------------------------------------------------------------------------------------------
+    // -----------------------------------------------------------------------------------------------------------
 
     // Reads attributes of the node up to the end of a start tag or, with TagEnd::Instruction and no node, of an
     // instruction, and moves behind it.
@@ -369,10 +369,9 @@ private:
     Attribute& AttributeAt(std::size_t index) { return reinterpret_cast<Attribute&>(m_attributes[index]); }
 
     bool Keep(Attribute&& attribute) {
-        if (!m_attributes.Reserve(1)) return false;
-        RawAttribute raw;
-        ::new (static_cast<void*>(&raw)) Attribute(std::move(attribute));
-        m_attributes.Push(raw);
+        RawAttribute* place = m_attributes.Add();
+        if (!place) return false;
+        ::new (static_cast<void*>(place)) Attribute(std::move(attribute));
         return m_attributes.Count() <= kFewAttributes || See(m_attributes.Count() - 1);
     }
 
@@ -419,7 +418,7 @@ private:
     }
 
     // --- elements
-    // ------------------------------------------------------------------------------------------------------
+    // -------------------------------------------------------------------------------------------------------
 
     // The element at m_at with everything below it.
     bool Element() {
@@ -431,18 +430,18 @@ private:
 
     bool StartTag() {
         ++m_at;
-        Spelling name;
-        if (!Name(name)) return false;
-        tagCPOMEMHEADER* node = NewNode();
-        if (!node) return OutOfMemory();
-        if (!m_open.Push({node, name, m_children.Count(), Content::Open})) {
-            Buffers::Block::Free(node);
-            return OutOfMemory();
-        }
+        OpenElement* open = m_open.Add();
+        if (!open) return OutOfMemory();
+        open->node = nullptr;
+        open->firstChild = m_children.Count();
+        open->content = Content::Open;
+        if (!Name(open->name)) return false;
+        open->node = NewNode();
+        if (!open->node) return OutOfMemory();
         TagEnd end;
-        if (!AttributesOf(node, TagEnd::Open, end)) return false;
-        Node& element = NodeOf(node);
-        element.name = InternName(name);
+        if (!AttributesOf(open->node, TagEnd::Open, end)) return false;
+        Node& element = NodeOf(open->node);
+        element.name = InternName(open->name);
         if (element.name.isnull()) return OutOfMemory();
         if (!m_attributes.Empty()) {
             if (!Attributes::Build(element.attributes, &AttributeAt(0), m_attributes.Count())) return OutOfMemory();
@@ -453,7 +452,7 @@ private:
 
     // The innermost open element is complete: it gets its children and becomes a child of the next one, or the root.
     bool FinishElement() {
-        const OpenElement element = m_open.Last();
+        const OpenElement& element = m_open.Last();
         const std::size_t children = m_children.Count() - element.firstChild;
         if (children) {
             Node& node = NodeOf(element.node);
@@ -463,12 +462,10 @@ private:
             node.contentKind = kElements;
             m_children.Cut(element.firstChild); // moved
         }
-        if (m_open.Count() == 1) {
-            m_open.Cut(0);
+        if (m_open.Count() == 1)
             m_root = NodeAccess::Adopt(element.node);
-            return true;
-        }
-        if (!m_children.Push(element.node)) return OutOfMemory();
+        else if (!m_children.Push(element.node))
+            return OutOfMemory();
         m_open.Cut(m_open.Count() - 1);
         return true;
     }
@@ -531,7 +528,7 @@ private:
     }
 
     // --- text
-    // ----------------------------------------------------------------------------------------------------------
+    // -----------------------------------------------------------------------------------------------------------
 
     // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone among other
     // units, a control, a character above 7F, '&', or one of the two stops; the end when there is none.
@@ -766,7 +763,7 @@ private:
     }
 
     // --- state
-    // ---------------------------------------------------------------------------------------------------------
+    // ----------------------------------------------------------------------------------------------------------
 
     // Room for an Attribute that is moved bitwise.
     struct RawAttribute {
