@@ -66,7 +66,9 @@ Finished RunTool(const std::vector<std::string>& arguments, const std::string& i
     Finished finished;
     PROCESS_INFORMATION process = {};
     DWORD code = 0;
-    if (CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &start, &process)) {
+    if (!CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &start, &process)) {
+        ADD_FAILURE() << "not started: error " << GetLastError();
+    } else {
         WaitForSingleObject(process.hProcess, INFINITE);
         if (GetExitCodeProcess(process.hProcess, &code)) finished.code = static_cast<int>(code);
         CloseHandle(process.hThread);
