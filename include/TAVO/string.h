@@ -425,9 +425,9 @@ public:
     /// Sweeps the pool for at most @p budget milliseconds, going on where the last sweep ended: an entry found
     /// unreferenced loses its UTF-8 form, and goes when the next sweep finds it so again. Looking a text up does not
     /// prolong its life.
+    /// Then the heap is asked to give free memory of the calling thread's back to the system.
     /// @return true when a whole round finished in time. False, and nothing is done, unless the calling thread has
-    /// normal
-    ///         priority.
+    ///         normal priority.
     static bool Collect(ulong32 budget) noexcept;
     /// Recomputes the keys of all entries; false at the first damaged one, and an assertion.
     static bool Verify() noexcept;
