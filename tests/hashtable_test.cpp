@@ -101,8 +101,8 @@ TEST(HashTable, BehavesLikeTheModel) {
         for (int step = 0; step < 3000; ++step) {
             // Few hashes and few buckets; many hashes in few buckets, near either end of their range; or hashes all
             // over.
-            const Hash near = (random() % 300 << 4 | 7) ^ (round < 3 ? 0 : ~Hash{0} << 4);
-            const Hash hashes[] = {random() % 5 << 60 | random() % 3, near, random()};
+            const Hash end = (random() % 300 << 4 | 7) ^ (round < 3 ? 0 : ~Hash{0} << 4);
+            const Hash hashes[] = {random() % 5 << 60 | random() % 3, end, random()};
             const Hash hash = random() % 2 ? used[random() % used.size()] : hashes[round % 3];
             used.push_back(hash);
             const Item item(static_cast<int>(random() % 4), step);

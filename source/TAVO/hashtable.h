@@ -66,8 +66,8 @@ public:
         if (!bucket) return;
         constexpr std::size_t kLine = 64, kMostLines = 32;
         const auto* entries = reinterpret_cast<const char*>(bucket + 1);
-        const std::size_t end = bucket->sUsed, near = place.index * sizeof(Entry) + 5 * kLine; // Fetch went so far
-        for (std::size_t line = 0; line < kMostLines && near + line * kLine < end; ++line)
+        const std::size_t end = bucket->sUsed, fetched = place.index * sizeof(Entry) + 5 * kLine;
+        for (std::size_t line = 0; line < kMostLines && fetched + line * kLine < end; ++line)
             Simd::Prefetch(entries + end - 1 - line * kLine);
     }
 
@@ -150,14 +150,14 @@ private:
 
     static constexpr std::size_t kNear = 16;
 
-    template <std::size_t near>
+    template <std::size_t width>
     static std::size_t SearchAround(const Entry* entries, std::size_t count, unsigned long long hash) {
         const std::size_t guess = Guess(hash, count);
-        std::size_t first = guess < near / 2 ? 0 : guess - near / 2;
-        if (first > count - near) first = count - near;
-        const std::size_t index = first + CountBelow(entries + first, near, hash);
+        std::size_t first = guess < width / 2 ? 0 : guess - width / 2;
+        if (first > count - width) first = count - width;
+        const std::size_t index = first + CountBelow(entries + first, width, hash);
         if (index == first && first > 0 && entries[first - 1].hash >= hash) return SearchDown(entries, first - 1, hash);
-        if (index == first + near && index < count && entries[index].hash < hash)
+        if (index == first + width && index < count && entries[index].hash < hash)
             return SearchUp(entries, index, count, hash);
         return index;
     }
