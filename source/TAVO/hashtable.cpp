@@ -33,7 +33,7 @@ CBaseHashTable::CBaseHashTable(std::uint32_t uDirectIndexLength) noexcept : m_cu
 
 CBaseHashTable::~CBaseHashTable() = default;
 
-bool CBaseHashTable::IsDisposable(CPObjectMemory) { return false; }
+bool CBaseHashTable::IsDisposable(CPObjectMemory) { return false; } // NOLINT(performance-unnecessary-value-param)
 void CBaseHashTable::OnDispose(const CPObjectMemory&) {}
 
 void CBaseHashTable::ClearTable() noexcept { m_index.free(); }
@@ -95,7 +95,8 @@ CPObjectMemory CBaseHashTable::AddItem(unsigned long long hash, const CPObjectMe
     case eHashReplaceByHash: {
         // The new item may belong elsewhere among the entries of its hash: out with the old one, in at the right place.
         // Taking out keeps the room, so the insertion cannot fail.
-        const CPObjectMemory added(item), old(Buckets()[place.bucket].Take(place.index, false));
+        CPObjectMemory added(item);
+        const CPObjectMemory old(Buckets()[place.bucket].Take(place.index, false));
         const Place ordered = Locate(hash, added);
         InsertAt(ordered.index == Buffers::NotFound ? place : ordered, hash, CPObjectMemory(added));
         return added;

@@ -313,6 +313,7 @@ bool _CMemOut::Flush() {
             std::max(std::max(needed, used * 2), static_cast<std::size_t>(std::min(expected, most)));
         if (!Grow(capacity) && !Grow(needed)) return false;
     }
+    // NOLINTNEXTLINE(clang-analyzer-core.NonNullParamChecker): growing has made a block
     std::memcpy(reinterpret_cast<unsigned char*>(block + 1) + used, Buffered(), size);
     block->sUsed = needed;
     EmptyBuffer();

@@ -230,7 +230,7 @@ private:
     bool PredefinedReference(ulong32& value) {
         const Unit* body = m_at + 1;
         constexpr std::ptrdiff_t kSkipped = 3; // "lt;" and "gt;"
-        value = Stands(body, "lt;") ? '>' : '<';
+        value = Stands(body, "lt;") ? ulong32{'>'} : ulong32{'<'};
         if (m_end - body < kSkipped) return Fail(kEndOfFile, m_end);
         // The skip counts units and may end inside a character.
         const Unit* at = body;
@@ -614,6 +614,7 @@ private:
     CPPoolString& TextAt(const Place& place) {
         if (place.attribute == kDataPlace) return NodeOf(place.node).data;
         const bool built = place.node && NodeOf(place.node).attributes.key();
+        // NOLINTNEXTLINE(clang-analyzer-core.uninitialized.UndefReturn): who gave the place has put an attribute there
         return (built ? Attributes::First(NodeOf(place.node).attributes)[place.attribute]
                       : AttributeAt(place.attribute))
             .value;

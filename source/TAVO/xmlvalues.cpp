@@ -369,7 +369,7 @@ CPPoolString CPXMLObject::TextOf(const unsigned char* bytes, unsigned long long 
         *at++ = "0123456789ABCDEF"[*bytes & 15];
         *at++ = "0123456789ABCDEF"[*bytes >> 4];
     }
-    const CPPoolString stored = Interned(text, at);
+    CPPoolString stored = Interned(text, at);
     Platform::Release(text);
     return stored;
 }
