@@ -85,6 +85,7 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
     CCaseSensitiveHash::Place place;
     if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, before.searched)) return Block::Acquire(found);
     if (missing == Missing::Leave) return nullptr;
+    pool.entries.FetchMoved(place); // while the entry is made
     wchar_t* out;
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
     if (!block) return nullptr;

@@ -26,10 +26,7 @@ public:
             if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
         }
         Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
-        if (found)
-            m_front.Remember(found);
-        else
-            Lookup::TableAccess::FetchMoved(*this, place);
+        if (found) m_front.Remember(found);
         return found;
     }
 
@@ -46,6 +43,9 @@ public:
         Place place;
         return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hashi, OrderOf<true>(text), place), place);
     }
+
+    // Starts to fetch what adding at that place will move.
+    void FetchMoved(const Place& place) const noexcept { Lookup::TableAccess::FetchMoved(*this, place); }
 
     // Enters both tables or none, taking over the reference; false without memory. The caller tells what it knows of
     // the entry's text: reading what was written a moment ago would wait until it has reached memory.

@@ -16,6 +16,6 @@ void HeapRelease(void* block) noexcept {
     if (block) HeapFree(GetProcessHeap(), 0, block);
 }
 
-void HeapTrim() noexcept {} // the process heap does so by itself
+void HeapTrim() noexcept {} // left to the process heap
 
 } // namespace TAVO::Platform

@@ -18,8 +18,8 @@ void* HeapAllocate(std::size_t size) noexcept;
 void* HeapResize(void* block, std::size_t size) noexcept;
 // Null is ignored.
 void HeapRelease(void* block) noexcept;
-// Gives back to the system what the calling thread allocated and nobody needs any more, where the heap does not do so
-// by itself. For now and then: it looks at every page of the thread's.
+// Asks a heap that can be asked to give back to the system what the calling thread allocated and nobody needs any more.
+// For now and then: it looks at every page of the thread's.
 void HeapTrim() noexcept;
 
 // --- modules and configuration -------------------------------------------------------------------------------------
