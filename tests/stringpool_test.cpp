@@ -11,6 +11,7 @@
 #include <atomic>
 #include <chrono>
 #include <optional>
+#include <random>
 #include <thread>
 
 using namespace TAVO::String;
@@ -227,6 +228,45 @@ TEST(PoolSweep, InInstalmentsForgetsWhatWasAskedForOften) {
     }
     texts.clear();
     EXPECT_TRUE(Sweep() && CStringPool::Verify() && CStringPool::GetNItems() == items);
+}
+
+// So many that the pool puts off what it can: it must find each, and give back what it took.
+TEST(PoolSweep, ManyTextsAndTheirVariantsLeaveNothing) {
+    Sweep();
+    const auto items = CStringPool::GetNItems();
+    const auto blocks = LiveBlocks();
+    std::mt19937 random(5);
+    struct Variants {
+        CPPoolString texts[3]; // null until it is interned
+        int first = -1;
+    };
+    std::vector<Variants> groups(15000);
+    const wchar_t* const prefixes[] = {L"take ", L"Take ", L"TAKE "};
+    for (int step = 0; step < 100000; ++step) {
+        const std::size_t number = random() % groups.size();
+        const int which = static_cast<int>(random() % 3);
+        wchar_t text[16];
+        const std::size_t end = std::copy(prefixes[which], prefixes[which] + 5, text) - text;
+        for (std::size_t digit = 0, rest = number; digit < 6; ++digit, rest /= 10) text[end + digit] = L'0' + rest % 10;
+        text[end + 6] = 0;
+        Variants& group = groups[number];
+        CPPoolString& known = group.texts[which];
+        if (random() % 8 == 0) {
+            const CPPoolString any = CStringPool::QueryStringRefi(text);
+            ASSERT_TRUE(group.first < 0 ? any.isnull() : Entry(any) == Entry(group.texts[group.first])) << number;
+            continue;
+        }
+        const CPPoolString found = CStringPool::QueryStringRef(text);
+        ASSERT_EQ(Entry(found), Entry(known)) << number;
+        const CPPoolString made(text);
+        ASSERT_TRUE(made.Verify() && !made.isnull() && (known.isnull() || Entry(made) == Entry(known))) << number;
+        known = made;
+        if (group.first < 0) group.first = which;
+    }
+    EXPECT_TRUE(CStringPool::Verify() && CStringPool::GetNItems() > items + 30000);
+    groups.clear();
+    EXPECT_TRUE(Sweep() && CStringPool::GetNItems() == items);
+    EXPECT_EQ(LiveBlocks(), blocks);
 }
 
 struct Submitter : IStringSubmitter {

@@ -85,7 +85,6 @@ tagCPOMEMHEADER* InternLocked(Pool& pool, const Text& text, Missing missing, Mat
     CCaseSensitiveHash::Place place;
     if (tagCPOMEMHEADER* found = pool.entries.Find(text, place, before.searched)) return Block::Acquire(found);
     if (missing == Missing::Leave) return nullptr;
-    pool.entries.FetchMoved(place); // while the entry is made
     wchar_t* out;
     tagCPOMEMHEADER* block = NewEntry(text.Units(), text.key, out);
     if (!block) return nullptr;
@@ -190,7 +189,7 @@ private:
 void ClearTables(Pool& pool) noexcept {
     CEnumDisposal diagnosis;
     Develop::_logWrite(acfDebugTrace, L"TAVO", kSource, 0, L"SPool ClearTable: Diagnosis started");
-    pool.entries.EnumTableBy(&diagnosis, 0, false);
+    pool.entries.Visit(diagnosis);
     Develop::_logWrite(acfDebugTrace, L"TAVO", kSource, 0,
                        L"SPool ClearTable: diagnosis done, %u items still referenced", diagnosis.referenced);
     pool.entries.Clear();
@@ -340,7 +339,7 @@ bool CStringPool::Verify() noexcept {
     {
         pool::Guard guard(pool.lock);
         CEnumVerify check;
-        pool.entries.EnumTableBy(&check, 0, false);
+        pool.entries.Visit(check);
         sound = check.sound;
     }
     if (!sound) diagnostics::IllegalCodePoint("String pool integrity violation");
@@ -351,7 +350,7 @@ unsigned long long CStringPool::GetSize() noexcept {
     Pool& pool = ThePool();
     pool::Guard guard(pool.lock);
     CEnumForSize size;
-    pool.entries.EnumTableBy(&size, 0, false);
+    pool.entries.Visit(size);
     return size.bytes;
 }
 

@@ -176,20 +176,7 @@ bool CBaseHashTable::PurgeTable(IBaseHashTableEnum* visitor) noexcept {
 }
 
 bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
-    const unsigned long long start = Core::OS::GetTimeNow();
-    try {
-        for (unsigned long long round = 0; round < m_buckets && Buckets(); ++round) {
-            const auto bucket = static_cast<std::size_t>(m_cursor);
-            m_cursor = (m_cursor + 1) & m_mask;
-            TableAccess::FetchItems(Buckets()[m_cursor]); // those of the next one, while this one's are asked
-            if (Buckets()[bucket].isEmpty()) continue;    // takes no time
-            for (std::size_t index = Buckets()[bucket].GetNItems(); index-- > 0;) DisposeEntry(bucket, index);
-            if (Core::OS::GetTimeNow() - start > budget) return false;
-        }
-        return true;
-    } catch (...) {
-        return false; // the cursor has moved on: one item that always throws must not keep the sweep from all others
-    }
+    return TableAccess::Dispose(*this, budget, [](std::size_t) {});
 }
 
 void CBaseHashTable::DisposeEntry(std::size_t bucket, std::size_t index) {

@@ -45,30 +45,33 @@ public:
         return index ? reinterpret_cast<Bucket*>(index + 1) : nullptr;
     }
 
-    // Starts to fetch from memory what Locate and an insertion will look at, so that the cache misses of a large table
-    // run side by side instead of one after the other. `typicalCount` is how many entries a bucket probably has.
-    static void Fetch(const CBaseHashTable& table, unsigned long long hash, std::size_t typicalCount) {
-        const Bucket* buckets = Buckets(table);
-        if (!buckets) return;
-        const auto* bucket = reinterpret_cast<const char*>(Buffers::Block::Of(buckets[hash & table.m_mask]));
+    // Starts to fetch from memory what adding an entry behind the `count` ones of its bucket will look at, so that the
+    // cache misses of a large table run side by side instead of one after the other.
+    static void FetchEnd(const CBaseHashTable& table, unsigned long long hash, std::size_t count) {
+        const char* bucket = Memory(table, hash);
         if (!bucket) return;
         Simd::Prefetch(bucket);
-        // Around the place that the hash's value suggests, and on: an insertion moves what stands behind.
-        constexpr std::size_t kLine = 64, kLines = 9;
-        const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, typicalCount) * sizeof(Entry);
-        for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - 2 * kLine);
+        Simd::Prefetch(bucket + sizeof(Buffers::tagCPOMEMHEADER) + count * sizeof(Entry));
+    }
+    // And what a search among the first `count` ones will look at: some lines around the place that the hash suggests.
+    static void FetchAround(const CBaseHashTable& table, unsigned long long hash, std::size_t count) {
+        constexpr std::size_t kLine = 64, kLines = 5;
+        const char* bucket = Memory(table, hash);
+        if (!bucket) return;
+        const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, count) * sizeof(Entry);
+        for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLines / 2 * kLine);
     }
 
-    // Starts to fetch what an insertion at that place will move, from the end, where the moving begins.
-    static void FetchMoved(const CBaseHashTable& table, const Place& place) {
+    template <class Visit> static void ForEachHash(const CBaseHashTable& table, Visit visit) {
+        constexpr std::size_t kLine = 64;
         const Bucket* buckets = Buckets(table);
-        const Buffers::tagCPOMEMHEADER* bucket = buckets ? Buffers::Block::Of(buckets[place.bucket]) : nullptr;
-        if (!bucket) return;
-        constexpr std::size_t kLine = 64, kMostLines = 32;
-        const auto* entries = reinterpret_cast<const char*>(bucket + 1);
-        const std::size_t end = bucket->sUsed, fetched = place.index * sizeof(Entry) + 5 * kLine;
-        for (std::size_t line = 0; line < kMostLines && fetched + line * kLine < end; ++line)
-            Simd::Prefetch(entries + end - 1 - line * kLine);
+        for (std::size_t i = 0; buckets && i < table.m_buckets; ++i) {
+            // The next bucket comes from memory meanwhile; it is about as long as this one.
+            const auto* next = reinterpret_cast<const char*>(Buffers::Block::Of(buckets[(i + 1) & table.m_mask]));
+            const std::size_t count = buckets[i].Count();
+            for (std::size_t at = 0; next && at < count * sizeof(Entry); at += kLine) Simd::Prefetch(next + at);
+            for (std::size_t k = 0; k < count; ++k) visit(buckets[i][k].hash);
+        }
     }
 
     // Starts to fetch the beginnings of all items of a bucket.
@@ -117,11 +120,39 @@ public:
         return place.found;
     }
 
+    // DisposeTable; before a bucket is walked, `prepare` is called for it and may reorder it.
+    template <class Prepare>
+    static bool Dispose(CBaseHashTable& table, std::uint32_t budget, Prepare prepare) noexcept {
+        const unsigned long long start = Core::OS::GetTimeNow();
+        try {
+            for (unsigned long long round = 0; round < table.m_buckets && Buckets(table); ++round) {
+                const auto bucket = static_cast<std::size_t>(table.m_cursor);
+                table.m_cursor = (table.m_cursor + 1) & table.m_mask;
+                FetchItems(Buckets(table)[table.m_cursor]);     // those of the next one, while this one's are asked
+                if (Buckets(table)[bucket].isEmpty()) continue; // takes no time
+                prepare(bucket);
+                for (std::size_t index = Buckets(table)[bucket].GetNItems(); index-- > 0;)
+                    table.DisposeEntry(bucket, index);
+                if (Core::OS::GetTimeNow() - start > budget) return false;
+            }
+            return true;
+        } catch (...) {
+            return false; // the cursor has moved on: one item that always throws must not keep the sweep from all
+                          // others
+        }
+    }
+
     static Buffers::CPObjectMemory& Item(const CBaseHashTable& table, const Place& place) {
         return reinterpret_cast<Entry*>(Buffers::Block::Of(Buckets(table)[place.bucket]) + 1)[place.index].item;
     }
 
 private:
+    // The bucket that the hash selects; null when it is empty.
+    static const char* Memory(const CBaseHashTable& table, unsigned long long hash) {
+        const Bucket* buckets = Buckets(table);
+        return buckets ? reinterpret_cast<const char*>(Buffers::Block::Of(buckets[hash & table.m_mask])) : nullptr;
+    }
+
     // Hashes are spread over their whole range, so the value tells the place.
     static std::size_t Guess(unsigned long long hash, std::size_t count) {
         return static_cast<std::size_t>(((hash >> 32) * count) >> 32);

@@ -17,8 +17,6 @@ using pool::StoredText;
 
 namespace {
 
-constexpr std::uint32_t kIndexLength = 12; // 4096 buckets
-
 // The case variants of one text, at least one of them with a capital letter.
 struct Group {
     tagCPOMEMHEADER* representative; // the variant interned first of those present
@@ -78,8 +76,6 @@ bool RemoveVariant(Group& group, const tagCPOMEMHEADER* entry) {
 
 // --- groups ----------------------------------------------------------------------------------------------------------
 
-CCaseInsensitiveHash::CCaseInsensitiveHash() : CBaseHashTable(kIndexLength) {}
-
 tagCPOMEMHEADER* CCaseInsensitiveHash::RepresentativeOf(const CPObjectMemory& item) {
     return IsRecord(item) ? GroupOf(item).representative : Block::Of(item);
 }
@@ -96,26 +92,30 @@ bool CCaseInsensitiveHash::MakeRecord(CPObjectMemory& item, tagCPOMEMHEADER* fir
 }
 
 bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const StoredText& text, bool caseless,
-                               const CCaseSensitiveHash& entries) noexcept {
+                               CCaseSensitiveHash& entries) noexcept {
+    if (!entries.MayHold(text.key.hashi)) {
+        if (caseless) return true;
+        return AddGroup(PlaceOfNew(text.key.hashi), text.key.hashi, Block::Adopt(entry));
+    }
     const Place place = LocateGroup(text);
     if (place.found) {
         CPObjectMemory& item = TableAccess::Item(*this, place);
         return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
     }
     if (caseless) return true; // alone, and found by its own hash
-    TableAccess::FetchMoved(*this, place);
     CPObjectMemory item;
     if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
         if (!MakeRecord(item, lower, entry)) return false;
     } else {
         item = Block::Adopt(entry);
     }
-    if (!InsertAt(place, text.key.hashi, std::move(item))) {
-        LetGo(std::move(item));
-        return false;
-    }
-    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].Count();
-    return true;
+    return AddGroup(place, text.key.hashi, std::move(item));
+}
+
+bool CCaseInsensitiveHash::AddGroup(const Place& place, unsigned long long hashi, CPObjectMemory&& item) noexcept {
+    if (Insert(place, hashi, std::move(item))) return true;
+    LetGo(std::move(item));
+    return false;
 }
 
 bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
@@ -147,14 +147,15 @@ long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPO
 
 // --- entries ---------------------------------------------------------------------------------------------------------
 
-CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : CBaseHashTable(kIndexLength), m_groups(groups) {}
+CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : m_groups(groups) {}
 
 void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
-    constexpr std::size_t kFew = 2; // so small a table lies in the caches
-    if (m_typicalCount <= kFew) return;
-    TableAccess::Fetch(*this, key.hash, m_typicalCount);
-    m_groups.Fetch(key);
-    if (key.hash != key.hashi) TableAccess::Fetch(*this, key.hashi, m_typicalCount); // its lower case
+    m_filter.Fetch(key.hash);
+    FetchForSearch(key.hash); // the filter may have to be waited for, so it is not asked
+    FetchForAdding(key.hash);
+    if (key.hash == key.hashi) return; // a text without capitals that is new stands in this table only
+    m_filter.Fetch(key.hashi);
+    m_groups.FetchForAdding(key.hashi);
 }
 
 bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry, const StoredText& text,
@@ -162,11 +163,13 @@ bool CCaseSensitiveHash::Add(const Place& place, CPObjectMemory&& entry, const S
     tagCPOMEMHEADER* block = Block::Of(entry);
     // The group first: it looks for a lower-case variant, which must not be the entry itself.
     if (!m_groups.Add(block, text, caseless, *this)) return false;
-    if (!InsertAt(place, text.key.hash, std::move(entry))) {
+    if (!Insert(place, text.key.hash, std::move(entry))) {
         m_groups.Remove(block);
         return false;
     }
-    m_typicalCount = TableAccess::Buckets(*this)[place.bucket].Count();
+    m_filter.Add(text.key.hash);
+    if (!caseless) m_filter.Add(text.key.hashi);
+    if (m_filter.IsFull()) FillFilter();
     return true;
 }
 
@@ -196,7 +199,8 @@ bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
 
 bool CCaseSensitiveHash::Dispose(std::uint32_t budget) noexcept {
     if (!m_front.Close()) return false;
-    const bool finished = DisposeTable(budget);
+    const bool finished = LazyTable::Dispose(budget);
+    if (finished && m_filter.IsTooLargeFor(GetNItems() + m_groups.GetNItems())) FillFilter();
     m_front.Open();
     return finished;
 }
@@ -206,7 +210,15 @@ void CCaseSensitiveHash::Clear() noexcept {
     m_front.Clear();
     m_groups.Clear(); // first: it holds entries without counting them
     ClearTable();
+    m_filter.Reset(0);
     m_front.Open();
+}
+
+void CCaseSensitiveHash::FillFilter() noexcept {
+    m_filter.Reset(GetNItems() + m_groups.GetNItems());
+    const auto add = [this](unsigned long long hash) { m_filter.Add(hash); };
+    ForEachHash(add);
+    m_groups.ForEachHash(add);
 }
 
 void CCaseSensitiveHash::OnDispose(const CPObjectMemory& item) {

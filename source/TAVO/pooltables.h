@@ -2,18 +2,18 @@
 // The pool's two tables: entries by their text, and groups of entries that differ only in case.
 // Threads: the pool's lock is held around every call.
 
-#include "hashtable.h"
+#include "lazytable.h"
+#include "poolfilter.h"
 #include "poolfront.h"
 #include "pooltext.h"
 
 namespace TAVO::String {
 
 // Entries by case-sensitive hash; one reference each.
-class CCaseSensitiveHash final : public Lookup::CBaseHashTable {
+class CCaseSensitiveHash final : public Lookup::LazyTable {
 public:
     explicit CCaseSensitiveHash(class CCaseInsensitiveHash& groups);
 
-    using CBaseHashTable::EnumTableBy;
     using CBaseHashTable::Place;
 
     // The entry of that text, counted for the caller, if it can be told without the pool's lock.
@@ -25,27 +25,32 @@ public:
             m_front.Join();
             if (Buffers::tagCPOMEMHEADER* known = m_front.Find(text)) return known;
         }
+        if (!m_filter.MayHold(text.key.hash)) {
+            place = PlaceOfNew(text.key.hash);
+            return nullptr;
+        }
         Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
         if (found) m_front.Remember(found);
         return found;
     }
 
     // The same, but nothing is remembered.
-    template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) const {
-        return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hash, OrderOf<false>(text), place), place);
+    template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) {
+        const auto order = OrderOf<false>(text);
+        return BlockAt(LocateLatest(text.key.hash, order, place) || Locate(text.key.hash, order, place), place);
     }
 
     // Starts to fetch what a search for that text and adding it will look at, in both tables.
     void Fetch(const pool::Key& key) const noexcept;
 
     // The entry that is the lower case of the text.
-    template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) const {
+    template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) {
         Place place;
-        return BlockAt(Lookup::TableAccess::Locate(*this, text.key.hashi, OrderOf<true>(text), place), place);
+        return BlockAt(Locate(text.key.hashi, OrderOf<true>(text), place), place);
     }
 
-    // Starts to fetch what adding at that place will move.
-    void FetchMoved(const Place& place) const noexcept { Lookup::TableAccess::FetchMoved(*this, place); }
+    // False: no entry has that hash, and no group.
+    bool MayHold(unsigned long long hash) const noexcept { return m_filter.MayHold(hash); }
 
     // Enters both tables or none, taking over the reference; false without memory. The caller tells what it knows of
     // the entry's text: reading what was written a moment ago would wait until it has reached memory.
@@ -56,7 +61,12 @@ public:
     // Lets everything go, groups too; nothing when a thread was stopped in the middle of a look-up.
     void Clear() noexcept;
 
+    using LazyTable::Visit;
+
 private:
+    // Makes the filter anew from what the tables hold.
+    void FillFilter() noexcept;
+
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
     bool IsDisposable(Buffers::CPObjectMemory item) override;
     // How the text compares with an entry of the same case-sensitive hash; folded, its lower case does.
@@ -75,7 +85,7 @@ private:
 
     CCaseInsensitiveHash& m_groups;
     PoolFront m_front;
-    std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
+    PoolFilter m_filter; // the hashes in both tables
 };
 
 // Groups by case-insensitive hash.
@@ -84,12 +94,11 @@ private:
 // nothing here. A text with capitals that is alone stands here itself. Only two variants and more have a record.
 // Nothing here counts an entry: otherwise no first variant could ever be swept. An entry that goes leaves its group
 // first.
-class CCaseInsensitiveHash final : public Lookup::CBaseHashTable {
+class CCaseInsensitiveHash final : public Lookup::LazyTable {
 public:
-    CCaseInsensitiveHash();
-
     // The variant interned first of the group that the text belongs to; null when there is none.
-    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, const CCaseSensitiveHash& entries) noexcept {
+    template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, CCaseSensitiveHash& entries) noexcept {
+        if (!entries.MayHold(text.key.hashi)) return nullptr;
         const Place place = LocateGroup(text);
         if (!place.found) return entries.FindLowerCase(text);
         Buffers::tagCPOMEMHEADER* found = RepresentativeOf(Lookup::TableAccess::Item(*this, place));
@@ -97,12 +106,11 @@ public:
         return found;
     }
 
-    // Starts to fetch what adding an entry of that key will look at.
-    void Fetch(const pool::Key& key) const noexcept { Lookup::TableAccess::Fetch(*this, key.hashi, m_typicalCount); }
+    using LazyTable::FetchForAdding;
 
     // Puts an entry, which has that text, into its group. False without memory; nothing has changed then.
     bool Add(Buffers::tagCPOMEMHEADER* entry, const pool::StoredText& text, bool caseless,
-             const CCaseSensitiveHash& entries) noexcept;
+             CCaseSensitiveHash& entries) noexcept;
     // Takes an entry out of its group. False when it should have one and has not.
     bool Remove(Buffers::tagCPOMEMHEADER* entry) noexcept;
     // Lets everything go.
@@ -112,10 +120,10 @@ public:
     const char* complaint = nullptr;
 
 private:
-    template <class Text> Place LocateGroup(const Text& text) const {
+    template <class Text> Place LocateGroup(const Text& text) {
         Place place;
-        Lookup::TableAccess::Locate(
-            *this, text.key.hashi,
+        Locate(
+            text.key.hashi,
             [&](const Buffers::CPObjectMemory& item) {
                 const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
                 if (!block) return 0;
@@ -126,14 +134,14 @@ private:
             place);
         return place;
     }
+    // Takes over what stands for a group; false without memory.
+    bool AddGroup(const Place& place, unsigned long long hashi, Buffers::CPObjectMemory&& item) noexcept;
     static Buffers::tagCPOMEMHEADER* RepresentativeOf(const Buffers::CPObjectMemory& item);
     // Replaces what stands at a place by a record of two variants.
     bool MakeRecord(Buffers::CPObjectMemory& item, Buffers::tagCPOMEMHEADER* first,
                     Buffers::tagCPOMEMHEADER* second) noexcept;
 
     long32 CompareItems(const Buffers::CPObjectMemory& first, const Buffers::CPObjectMemory& second) override;
-
-    std::size_t m_typicalCount = 0; // entries of the bucket that got the latest one
 };
 
 } // namespace TAVO::String

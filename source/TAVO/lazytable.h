@@ -1,0 +1,84 @@
+#pragma once
+// A hash table whose buckets are put in order when somebody looks there.
+//
+// To give each of many thousands of new entries its place in a long bucket would be to move half the bucket, from
+// memory, for each of them. So entries that are known to be new gather unordered behind the others, and the next search
+// or walk puts them in order together. Nobody ever sees a bucket that is not in order.
+
+#include "hashtable.h"
+
+#include <algorithm>
+
+namespace TAVO::Lookup {
+
+// 4096 buckets.
+class LazyTable : public CBaseHashTable {
+public:
+    // Lets everything go.
+    void ClearTable() noexcept;
+    // The hashes of all entries, bucket by bucket.
+    template <class Visit> void ForEachHash(Visit visit) const { TableAccess::ForEachHash(*this, visit); }
+
+protected:
+    LazyTable() : CBaseHashTable(kIndexLength) {}
+
+    // As TableAccess::Locate.
+    template <class Order> bool Locate(unsigned long long hash, Order order, Place& place) {
+        Settle(BucketOf(hash));
+        return TableAccess::Locate(*this, hash, order, place);
+    }
+    // The same among the latest entries of a bucket, which stays as it is, for what is asked for soon after it was
+    // added. False tells nothing. RemoveAt needs a place that Locate told.
+    template <class Order> bool LocateLatest(unsigned long long hash, Order order, Place& place) const {
+        constexpr std::size_t kLatest = 4;
+        const std::size_t bucket = BucketOf(hash);
+        std::size_t left = std::min<std::size_t>(m_states[bucket].unordered, kLatest);
+        if (left == 0) return false;
+        const TableAccess::Bucket& entries = TableAccess::Buckets(*this)[bucket];
+        for (std::size_t index = entries.Count(); left > 0; --left)
+            if (entries[--index].hash == hash && order(entries[index].item) == 0) {
+                place = {bucket, index, true};
+                return true;
+            }
+        return false;
+    }
+    // Where an entry goes that is known to be new.
+    static Place PlaceOfNew(unsigned long long hash) { return {BucketOf(hash), Buffers::NotFound, false}; }
+    // Starts to fetch from memory what adding a new entry of that hash looks at, and what a search would.
+    void FetchForAdding(unsigned long long hash) const {
+        const State& state = m_states[BucketOf(hash)];
+        if (state.entries > kFew) TableAccess::FetchEnd(*this, hash, state.entries);
+    }
+    void FetchForSearch(unsigned long long hash) const {
+        const State& state = m_states[BucketOf(hash)];
+        if (state.entries > kFew) TableAccess::FetchAround(*this, hash, state.entries - state.unordered);
+    }
+    // At a place that Locate told, nothing having changed since, or at that of a new entry. Takes over the reference;
+    // false without memory: item and table are then as they were.
+    bool Insert(const Place& place, unsigned long long hash, Buffers::CPObjectMemory&& item) noexcept;
+
+    // As EnumTableBy for all entries.
+    bool Visit(IBaseHashTableEnum& visitor) noexcept;
+    // As DisposeTable.
+    bool Dispose(std::uint32_t budget) noexcept;
+
+private:
+    static constexpr std::uint32_t kIndexLength = 12;
+    static constexpr std::size_t kBuckets = std::size_t{1} << kIndexLength, kMostUnordered = 256;
+    static constexpr std::size_t kFew = 2; // a bucket so short lies in the caches
+
+    struct State {
+        std::uint16_t entries = 0;   // all of the bucket, when a new one was added last: a hint what to fetch
+        std::uint16_t unordered = 0; // those at its end that are not in order yet
+    };
+
+    static std::size_t BucketOf(unsigned long long hash) { return static_cast<std::size_t>(hash % kBuckets); }
+    void Settle(std::size_t bucket) noexcept {
+        if (TAVO_UNLIKELY(m_states[bucket].unordered != 0)) PutInOrder(bucket);
+    }
+    void PutInOrder(std::size_t bucket) noexcept;
+
+    State m_states[kBuckets];
+};
+
+} // namespace TAVO::Lookup
