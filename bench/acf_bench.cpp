@@ -1,18 +1,13 @@
 // Identifier text beside libuuid, component pointers beside boost::intrusive_ptr.
 
-#include <atomic>
+#include "component.h"
+
 #include <benchmark/benchmark.h>
 #include <boost/smart_ptr/intrusive_ptr.hpp>
 #include <TAVO/acf.h>
 #if defined(TAVO_PEER_UUID)
 #include <uuid.h>
 #endif
-
-// A framework object as small as can be, the same for both pointers.
-struct IBenchmarked : IACFUnknown {};
-template <> struct acfTypeOf<IBenchmarked> {
-    static constexpr _acfUID uid = {0x5A1F11C5, 0x5CC5, 0x4A27, {0x8B, 0xFB, 0x2A, 0xB5, 0x0D, 0xAB, 0x27, 0x7C}};
-};
 
 namespace {
 
@@ -81,8 +76,6 @@ BENCHMARK(ReadIdentifierLibuuid);
 
 // --- pointers --------------------------------------------------------------------------------------------------------
 
-class Benchmarked final : public CComponent<Benchmarked, IBenchmarked> {};
-
 } // namespace
 
 void intrusive_ptr_add_ref(IBenchmarked* object) { object->AddRef(); }
@@ -91,7 +84,7 @@ void intrusive_ptr_release(IBenchmarked* object) { object->Release(); }
 namespace {
 
 template <class Wrapper> void CopyPointerTavo(benchmark::State& state) {
-    const Wrapper held(Benchmarked::Make());
+    const Wrapper held(MakeBenchmarked());
     for (auto _ : state) {
         Wrapper copy(held);
         benchmark::DoNotOptimize(copy);
@@ -101,7 +94,7 @@ BENCHMARK_TEMPLATE(CopyPointerTavo, CPACI<IBenchmarked>);
 BENCHMARK_TEMPLATE(CopyPointerTavo, CPIACFUnknown);
 
 void CopyPointerBoost(benchmark::State& state) {
-    const CPACI<IBenchmarked> made(Benchmarked::Make());
+    const CPACI<IBenchmarked> made = MakeBenchmarked();
     const boost::intrusive_ptr<IBenchmarked> held(made.Get());
     for (auto _ : state) {
         boost::intrusive_ptr<IBenchmarked> copy(held);
