@@ -1,5 +1,6 @@
 // Allocation.
 
+#include <algorithm>
 #include <gtest/gtest.h>
 #include <TAVO/core.h>
 
@@ -25,4 +26,20 @@ TEST(Allocation, RefusesAbsurdSizesAndAlignsTo16) {
         EXPECT_EQ(block[size - 1], 'x') << "the old block stays";
         OS::_ffree(block);
     }
+}
+
+TEST(Allocation, ResizedBlocksKeepWhatTheyHold) {
+    constexpr std::size_t kMega = std::size_t{1} << 20;
+    std::size_t held = 100;
+    auto* block = static_cast<unsigned char*>(OS::_falloc(held));
+    for (std::size_t i = 0; i < held; ++i) block[i] = static_cast<unsigned char>(i % 251);
+    for (const std::size_t size :
+         {kMega, 4 * kMega - 1, 4 * kMega, 9 * kMega, 40 * kMega, 41 * kMega, 5 * kMega, kMega, held}) {
+        block = static_cast<unsigned char*>(OS::_frealloc(block, size));
+        ASSERT_NE(block, nullptr);
+        for (std::size_t i = 0; i < std::min(held, size); ++i) ASSERT_EQ(block[i], i % 251) << size;
+        for (std::size_t i = held; i < size; ++i) block[i] = static_cast<unsigned char>(i % 251);
+        held = size;
+    }
+    OS::_ffree(block);
 }
