@@ -171,7 +171,7 @@ void WritePugixml(benchmark::State& state) {
 #endif
 
 void Sizes(benchmark::internal::Benchmark* benchmark) {
-    for (int tenths : {10, 20, 100, 500}) benchmark->Args({static_cast<int>(Kind::Small), tenths});
+    for (int tenths : {10, 20, 50, 100, 500}) benchmark->Args({static_cast<int>(Kind::Small), tenths});
     for (Kind kind : {Kind::LongText, Kind::Repeated, Kind::Distinct})
         for (int tenths : {50, 100}) benchmark->Args({static_cast<int>(kind), tenths});
     benchmark->Unit(benchmark::kMillisecond);
@@ -188,14 +188,20 @@ void Small(benchmark::internal::Benchmark* benchmark) {
     benchmark->Unit(benchmark::kMillisecond);
 }
 
-BENCHMARK(ParseTavo)->Apply(Sizes)->Apply(Depths);
+// With the other sizes: how time grows when the input doubles.
+void Doublings(benchmark::internal::Benchmark* benchmark) {
+    for (int tenths : {200, 400}) benchmark->Args({static_cast<int>(Kind::Small), tenths});
+    benchmark->Unit(benchmark::kMillisecond);
+}
+
+BENCHMARK(ParseTavo)->Apply(Sizes)->Apply(Depths)->Apply(Doublings);
 BENCHMARK(ParseTavoUtf16)->Apply(Small);
 BENCHMARK(ReleaseTavo)->Apply(Small);
 #if defined(TAVO_PEER_PUGIXML)
 BENCHMARK(ParsePugixml)->Apply(Sizes)->Apply(Depths);
 #endif
 #if defined(TAVO_PEER_TINYXML2)
-BENCHMARK(ParseTinyxml2)->Apply(Sizes);
+BENCHMARK(ParseTinyxml2)->Apply(Sizes)->Apply(Doublings);
 #endif
 #if defined(TAVO_PEER_LIBXML_2_0)
 BENCHMARK(ParseLibxml2)->Apply(Sizes);
@@ -203,9 +209,9 @@ BENCHMARK(ParseLibxml2)->Apply(Sizes);
 #if defined(TAVO_PEER_EXPAT)
 BENCHMARK(ParseExpatSax)->Apply(Sizes)->Apply(Depths);
 #endif
-BENCHMARK(WriteTavo)->Apply(Small);
+BENCHMARK(WriteTavo)->Apply(Small)->Apply(Doublings);
 #if defined(TAVO_PEER_PUGIXML)
-BENCHMARK(WritePugixml)->Apply(Small);
+BENCHMARK(WritePugixml)->Apply(Small)->Apply(Doublings);
 #endif
 
 } // namespace

@@ -444,6 +444,7 @@ private:
         const bool answered[] = {
             (!found && acfIsSame(type, acfTypeOf<Interfaces>::uid) && (found = static_cast<Interfaces*>(this)))...};
         static_cast<void>(answered);
+        if (!found && acfIsSame(type, acfTypeOf<IACFUnknown>::uid)) found = static_cast<_cACFUnknown*>(this);
         return found;
     }
 };

@@ -176,20 +176,22 @@ bool CBaseHashTable::PurgeTable(IBaseHashTableEnum* visitor) noexcept {
 }
 
 bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
-    return TableAccess::Dispose(*this, budget, [](std::size_t) {});
+    return TableAccess::Dispose(*this, budget, [](std::size_t, std::size_t) {});
 }
 
-void CBaseHashTable::DisposeEntry(std::size_t bucket, std::size_t index) {
+bool CBaseHashTable::DisposeEntry(std::size_t bucket, std::size_t index) {
     // The derived class may change the table, so nothing read before a call holds after it.
     const auto stands = [&](const CPObjectMemory* item) {
         return Buckets() && index < Buckets()[bucket].GetNItems() &&
                (!item || SameBlock(Buckets()[bucket][index].item, *item));
     };
-    if (!stands(nullptr)) return;
+    if (!stands(nullptr)) return false;
     const CPObjectMemory item(Buckets()[bucket][index].item);
-    if (!IsDisposable(item)) return;
+    if (!IsDisposable(item)) return false;
     OnDispose(item);
-    if (stands(&item)) Buckets()[bucket].Take(index);
+    if (!stands(&item)) return false;
+    Buckets()[bucket].Take(index);
+    return true;
 }
 
 } // namespace TAVO::Lookup

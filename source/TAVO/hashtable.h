@@ -120,9 +120,9 @@ public:
         return place.found;
     }
 
-    // DisposeTable; before a bucket is walked, `prepare` is called for it and may reorder it.
-    template <class Prepare>
-    static bool Dispose(CBaseHashTable& table, std::uint32_t budget, Prepare prepare) noexcept {
+    // DisposeTable; `dropped` is told the bucket and the place of each entry that was dropped.
+    template <class Dropped>
+    static bool Dispose(CBaseHashTable& table, std::uint32_t budget, Dropped dropped) noexcept {
         const unsigned long long start = Core::OS::GetTimeNow();
         try {
             for (unsigned long long round = 0; round < table.m_buckets && Buckets(table); ++round) {
@@ -130,9 +130,8 @@ public:
                 table.m_cursor = (table.m_cursor + 1) & table.m_mask;
                 FetchItems(Buckets(table)[table.m_cursor]);     // those of the next one, while this one's are asked
                 if (Buckets(table)[bucket].isEmpty()) continue; // takes no time
-                prepare(bucket);
                 for (std::size_t index = Buckets(table)[bucket].GetNItems(); index-- > 0;)
-                    table.DisposeEntry(bucket, index);
+                    if (table.DisposeEntry(bucket, index)) dropped(bucket, index);
                 if (Core::OS::GetTimeNow() - start > budget) return false;
             }
             return true;

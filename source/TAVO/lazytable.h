@@ -3,7 +3,8 @@
 //
 // To give each of many thousands of new entries its place in a long bucket would be to move half the bucket, from
 // memory, for each of them. So entries that are known to be new gather unordered behind the others, and the next search
-// or walk puts them in order together. Nobody ever sees a bucket that is not in order.
+// or walk puts them in order together. Nobody ever sees a bucket that is not in order; a sweep shows entries one by one
+// and takes them as they stand.
 
 #include "hashtable.h"
 
