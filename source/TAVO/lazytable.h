@@ -28,31 +28,21 @@ protected:
         Settle(BucketOf(hash));
         return TableAccess::Locate(*this, hash, order, place);
     }
-    // The same among the latest entries of a bucket, which stays as it is, for what is asked for soon after it was
-    // added. False tells nothing. RemoveAt needs a place that Locate told.
-    template <class Order> bool LocateLatest(unsigned long long hash, Order order, Place& place) const {
-        constexpr std::size_t kLatest = 4;
-        const std::size_t bucket = BucketOf(hash);
-        std::size_t left = std::min<std::size_t>(m_states[bucket].unordered, kLatest);
-        if (left == 0) return false;
-        const TableAccess::Bucket& entries = TableAccess::Buckets(*this)[bucket];
-        for (std::size_t index = entries.Count(); left > 0; --left)
-            if (entries[--index].hash == hash && order(entries[index].item) == 0) {
-                place = {bucket, index, true};
-                return true;
-            }
-        return false;
+    // The same for what is often asked for soon after it was added: it is sought among the latest entries first, and
+    // then the bucket stays as it is. RemoveAt needs a place that Locate told.
+    template <class Order> bool LocateSoon(unsigned long long hash, Order order, Place& place) {
+        if (TAVO_UNLIKELY(m_states[BucketOf(hash)].unordered != 0) && LocateLatest(hash, order, place)) return true;
+        return Locate(hash, order, place);
     }
     // Where an entry goes that is known to be new.
     static Place PlaceOfNew(unsigned long long hash) { return {BucketOf(hash), Buffers::NotFound, false}; }
     // Starts to fetch from memory what adding a new entry of that hash looks at, and what a search would.
     void FetchForAdding(unsigned long long hash) const {
-        const State& state = m_states[BucketOf(hash)];
-        if (state.entries > kFew) TableAccess::FetchEnd(*this, hash, state.entries);
+        TableAccess::FetchEnd(*this, hash, m_states[BucketOf(hash)].entries);
     }
     void FetchForSearch(unsigned long long hash) const {
         const State& state = m_states[BucketOf(hash)];
-        if (state.entries > kFew) TableAccess::FetchAround(*this, hash, state.entries - state.unordered);
+        TableAccess::FetchAround(*this, hash, state.entries - state.unordered);
     }
     // At a place that Locate told, nothing having changed since, or at that of a new entry. Takes over the reference;
     // false without memory: item and table are then as they were.
@@ -66,7 +56,6 @@ protected:
 private:
     static constexpr std::uint32_t kIndexLength = 12;
     static constexpr std::size_t kBuckets = std::size_t{1} << kIndexLength, kMostUnordered = 256;
-    static constexpr std::size_t kFew = 2; // a bucket so short lies in the caches
 
     struct State {
         std::uint16_t entries = 0;   // all of the bucket, when a new one was added last: a hint what to fetch
@@ -74,6 +63,18 @@ private:
     };
 
     static std::size_t BucketOf(unsigned long long hash) { return static_cast<std::size_t>(hash % kBuckets); }
+    template <class Order> bool LocateLatest(unsigned long long hash, Order order, Place& place) const {
+        constexpr std::size_t kLatest = 4;
+        const std::size_t bucket = BucketOf(hash);
+        const TableAccess::Bucket& entries = TableAccess::Buckets(*this)[bucket];
+        std::size_t index = entries.Count();
+        for (std::size_t left = std::min<std::size_t>(m_states[bucket].unordered, kLatest); left > 0; --left)
+            if (entries[--index].hash == hash && order(entries[index].item) == 0) {
+                place = {bucket, index, true};
+                return true;
+            }
+        return false;
+    }
     void Settle(std::size_t bucket) noexcept {
         if (TAVO_UNLIKELY(m_states[bucket].unordered != 0)) PutInOrder(bucket);
     }

@@ -23,7 +23,9 @@ public:
     PoolFilter(const PoolFilter&) = delete;
     PoolFilter& operator=(const PoolFilter&) = delete;
 
-    // False: that hash was not added. Always true while there are few: then looking costs no more than asking.
+    // Off while there are few hashes: then looking costs no more than asking.
+    bool IsOn() const noexcept { return m_words != nullptr; }
+    // False: that hash was not added. Always true while the filter is off.
     bool MayHold(unsigned long long hash) const noexcept {
         return !m_words || (~m_words[WordOf(hash)] & BitsOf(hash)) == 0;
     }
@@ -31,9 +33,9 @@ public:
         ++m_count;
         if (m_words) m_words[WordOf(hash)] |= BitsOf(hash);
     }
-    // Starts to fetch from memory what MayHold looks at.
+    // Starts to fetch from memory what MayHold looks at. The filter must be on.
     void Fetch(unsigned long long hash) const noexcept {
-        if (m_words) Simd::Prefetch(reinterpret_cast<const char*>(m_words + WordOf(hash)));
+        Simd::Prefetch(reinterpret_cast<const char*>(m_words + WordOf(hash)));
     }
 
     // Whether it has to be made anew, because too many were added or there is too much room for those that are left.

@@ -150,6 +150,7 @@ long32 CCaseInsensitiveHash::CompareItems(const CPObjectMemory& first, const CPO
 CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : m_groups(groups) {}
 
 void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
+    if (!m_filter.IsOn()) return; // so small a table lies in the caches
     m_filter.Fetch(key.hash);
     FetchForSearch(key.hash); // the filter may have to be waited for, so it is not asked
     FetchForAdding(key.hash);

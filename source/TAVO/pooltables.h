@@ -36,8 +36,7 @@ public:
 
     // The same, but nothing is remembered.
     template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) {
-        const auto order = OrderOf<false>(text);
-        return BlockAt(LocateLatest(text.key.hash, order, place) || Locate(text.key.hash, order, place), place);
+        return BlockAt(LocateSoon(text.key.hash, OrderOf<false>(text), place), place);
     }
 
     // Starts to fetch what a search for that text and adding it will look at, in both tables.

@@ -28,7 +28,7 @@ public:
 
     bool Find(Hash hash, int value, Place& place) {
         const auto order = [&](const CPObjectMemory& item) { return value - Item::Of(item); };
-        return LocateLatest(hash, order, place) || Locate(hash, order, place);
+        return LocateSoon(hash, order, place);
     }
     bool AddNew(Hash hash, int value) { return Insert(PlaceOfNew(hash), hash, Item(value)); }
     bool AddAt(const Place& place, Hash hash, int value) { return Insert(place, hash, Item(value)); }

@@ -2,6 +2,7 @@
 
 #include "platform.h"
 
+#include <atomic>
 #include <cstdint>
 #include <cstring>
 #include <stdlib.h>
@@ -25,47 +26,68 @@ namespace {
 // Small blocks take 16 bytes: mimalloc aligns smaller ones to 8 only, and realloc to 0 would free the block.
 std::size_t AtLeast16(std::size_t size) { return size < 16 ? 16 : size; }
 
-#if defined(TAVO_MIMALLOC) && defined(MADV_HUGEPAGE)
-// mimalloc gets blocks of whole documents from the system and gives them back. Page by page the system takes longer to
-// provide such a block than we take to fill it, so large pages are wished for.
-constexpr std::size_t kManyPages = std::size_t{4} << 20;
+#if defined(TAVO_MIMALLOC) && defined(MADV_HUGEPAGE) && MI_MALLOC_VERSION >= 200 && MI_MALLOC_VERSION < 300
 
-void* WithLargePages(void* block, std::size_t size) {
-    constexpr std::uintptr_t kLargePage = std::uintptr_t{2} << 20;
+// Page by page the system takes longer to provide fresh memory than we take to fill it, so large pages are wished for
+// wherever the heap grows: for the segments that mimalloc cuts blocks from, without their beginning, which is all that
+// a small process needs, and for large blocks, which may be segments of their own. mimalloc's own switch for large
+// pages would never give memory back.
+constexpr std::size_t kLargePage = std::size_t{2} << 20, kLargeBlock = std::size_t{4} << 20;
+constexpr std::size_t kSegment = std::size_t{32} << 20, kSegments = (std::size_t{1} << 47) / kSegment;
+
+// A bit for each segment of the address space: the wish was made. Half a megabyte, of which hardly a page is touched.
+constinit std::atomic<std::uint64_t> g_wished[kSegments / 64];
+
+void Wish(std::uintptr_t first, std::uintptr_t end) {
+    if (first < end) madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);
+}
+
+TAVO_NOINLINE void WishForSegmentOf(void* block) {
+    const std::uintptr_t segment = reinterpret_cast<std::uintptr_t>(block) / kSegment;
+    if (!block || segment >= kSegments) return;
+    g_wished[segment / 64].fetch_or(std::uint64_t{1} << segment % 64, std::memory_order_relaxed);
+    Wish(segment * kSegment + kLargePage, (segment + 1) * kSegment);
+}
+
+void* AllocateLarge(std::size_t size) {
+    void* const block = mi_malloc(size);
     const auto address = reinterpret_cast<std::uintptr_t>(block);
-    const std::uintptr_t first = (address + kLargePage - 1) / kLargePage * kLargePage;
-    const std::uintptr_t end = (address + size) / kLargePage * kLargePage;
-    if (block && first < end) madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);
+    if (block) Wish((address + kLargePage - 1) / kLargePage * kLargePage, (address + size) / kLargePage * kLargePage);
     return block;
 }
 
-// Moved here, not by mi_realloc: the wish must come before anything is written.
-void* MoveToLargePages(void* block, std::size_t size) {
-    void* const larger = WithLargePages(mi_malloc(size), size);
+void* Allocate(std::size_t size) {
+    if (TAVO_UNLIKELY(size >= kLargeBlock)) return AllocateLarge(size);
+    void* const block = mi_malloc(size);
+    const std::uintptr_t segment = reinterpret_cast<std::uintptr_t>(block) / kSegment;
+    const std::uint64_t wished = segment < kSegments ? g_wished[segment / 64].load(std::memory_order_relaxed) : 0;
+    if (TAVO_UNLIKELY((wished >> segment % 64 & 1) == 0)) WishForSegmentOf(block);
+    return block;
+}
+
+void* Resize(void* block, std::size_t size) {
+    if (size < kLargeBlock || size <= mi_usable_size(block)) return mi_realloc(block, size);
+    // Moved here, not by mi_realloc: the wish must come before anything is written.
+    void* const larger = AllocateLarge(size);
     if (!larger) return nullptr;
     std::memcpy(larger, block, mi_usable_size(block));
     mi_free(block);
     return larger;
 }
+
 #else
-#define mi_usable_size(block) SIZE_MAX
-constexpr std::size_t kManyPages = SIZE_MAX;
-void* WithLargePages(void* block, std::size_t) { return block; }
-void* MoveToLargePages(void* block, std::size_t) { return block; }
+
+void* Allocate(std::size_t size) { return mi_malloc(size); }
+void* Resize(void* block, std::size_t size) { return mi_realloc(block, size); }
+
 #endif
 
 } // namespace
 
-void* HeapAllocate(std::size_t size) noexcept {
-    if (size > kLargest) return nullptr;
-    void* const block = mi_malloc(AtLeast16(size));
-    return size < kManyPages ? block : WithLargePages(block, size);
-}
+void* HeapAllocate(std::size_t size) noexcept { return size > kLargest ? nullptr : Allocate(AtLeast16(size)); }
 
 void* HeapResize(void* block, std::size_t size) noexcept {
-    if (!block || size > kLargest) return nullptr;
-    if (size >= kManyPages && size > mi_usable_size(block)) return MoveToLargePages(block, size);
-    return mi_realloc(block, AtLeast16(size));
+    return !block || size > kLargest ? nullptr : Resize(block, AtLeast16(size));
 }
 
 void HeapRelease(void* block) noexcept { mi_free(block); }
