@@ -107,7 +107,7 @@ private:
     class Bucket;
 
     Bucket* Buckets() const noexcept;
-    bool DisposeEntry(std::size_t bucket, std::size_t index);
+    bool DisposeEntry(std::size_t bucket, std::size_t index); // whether it went
 
     unsigned long long m_mask;
     unsigned long long m_buckets;

@@ -62,6 +62,7 @@ public:
         for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLines / 2 * kLine);
     }
 
+    // The hashes of all entries, bucket by bucket.
     template <class Visit> static void ForEachHash(const CBaseHashTable& table, Visit visit) {
         constexpr std::size_t kLine = 64;
         const Bucket* buckets = Buckets(table);
@@ -136,8 +137,8 @@ public:
             }
             return true;
         } catch (...) {
-            return false; // the cursor has moved on: one item that always throws must not keep the sweep from all
-                          // others
+            // The cursor has moved on: one item that always throws must not keep the sweep from all others.
+            return false;
         }
     }
 
