@@ -11,11 +11,16 @@ enum class Kind { Small, Deep, LongText, Repeated, Distinct };
 
 inline const char* Name(Kind kind) {
     switch (kind) {
-    case Kind::Small: return "small elements";
-    case Kind::Deep: return "deep";
-    case Kind::LongText: return "long text";
-    case Kind::Repeated: return "repeated values";
-    default: return "distinct values";
+    case Kind::Small:
+        return "small elements";
+    case Kind::Deep:
+        return "deep";
+    case Kind::LongText:
+        return "long text";
+    case Kind::Repeated:
+        return "repeated values";
+    default:
+        return "distinct values";
     }
 }
 

@@ -38,16 +38,13 @@ void Sweep() {
 }
 
 // Times `parse(text)`; what it returns is dropped untimed.
-template <class Parse>
-void Run(benchmark::State& state, Parse parse) {
+template <class Parse> void Run(benchmark::State& state, Parse parse) {
     const std::string& text = Document(state);
     for (auto _ : state) {
         auto tree = parse(text);
         benchmark::DoNotOptimize(tree);
         state.PauseTiming();
-        {
-            const auto gone = std::move(tree);
-        }
+        { const auto gone = std::move(tree); }
         Sweep();
         state.ResumeTiming();
     }
