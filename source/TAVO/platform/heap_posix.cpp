@@ -28,10 +28,10 @@ std::size_t AtLeast16(std::size_t size) { return size < 16 ? 16 : size; }
 
 #if defined(TAVO_MIMALLOC) && defined(MADV_HUGEPAGE) && MI_MALLOC_VERSION >= 200 && MI_MALLOC_VERSION < 300
 
-// Page by page the system takes long to provide fresh memory, a third of the time that we take to fill it with a
-// document. So large pages are wished for wherever the heap grows: for the segments that mimalloc cuts blocks from,
-// without their beginning, which is all that a small process needs, and for large blocks, which may be segments of
-// their own. mimalloc's own switch for large pages would never give memory back.
+// Page by page the system takes long to provide fresh memory: more than a third of the time of opening a document for
+// the first time. So large pages are wished for wherever the heap grows: for the segments that mimalloc cuts blocks
+// from, without their beginning, which is all that a small process needs, and for large blocks, which may be segments
+// of their own. mimalloc's own switch for large pages would never give memory back.
 constexpr std::size_t kLargePage = std::size_t{2} << 20, kLargeBlock = std::size_t{4} << 20;
 constexpr std::size_t kSegment = std::size_t{32} << 20, kSegments = (std::size_t{1} << 47) / kSegment;
 
