@@ -36,7 +36,13 @@ inline PoolEntry& EntryOf(Buffers::tagCPOMEMHEADER* block) { return *reinterpret
 inline std::size_t UnitsOf(const Buffers::tagCPOMEMHEADER* block) {
     return (block->sUsed - sizeof(PoolEntry)) / sizeof(wchar_t) - 1;
 }
-inline std::size_t UnitsOf(const CPPoolString& text) { return UnitsOf(PoolAccess::Block(text)); }
+// The same from the text's own place: who goes on to read the text need not have the header in the cache. Texts hold no
+// zero, so one at the key's length is the terminator.
+inline std::size_t UnitsOf(const CPPoolString& text) {
+    const wchar_t* units = text;
+    const std::size_t length = text.len();
+    return TAVO_LIKELY(units[length] == 0) ? length : UnitsOf(PoolAccess::Block(text));
+}
 
 // A new block for a text of `units` units, which go to `text`; the terminator is there. Count 1; null without memory.
 Buffers::tagCPOMEMHEADER* NewEntry(std::size_t units, const pool::Key& key, wchar_t*& text) noexcept;
