@@ -5,6 +5,7 @@
 #include "platform/heap.h"
 #include "poolentry.h"
 #include "simd.h"
+#include "stack.h"
 #include "xmlnames.h"
 #include "xmlnode.h"
 
@@ -369,46 +370,13 @@ struct TextRange {
     const wchar_t* end;
 };
 
-// An element whose children are being written.
+// An element whose children are being written. It has what its end takes: by then a node of a deep tree is out of the
+// caches.
 struct Frame {
-    const Node* node;
+    tagCPOMEMHEADER* name;
+    const CPXMLObject* first;
     const CPXMLObject* next;
     const CPXMLObject* end;
-};
-
-// The way down to the current element; on the heap, since trees are deeper than stacks.
-class Path {
-public:
-    Path() = default;
-    Path(const Path&) = delete;
-    Path& operator=(const Path&) = delete;
-    ~Path() { Platform::Release(m_frames); }
-
-    bool IsEmpty() const { return m_count == 0; }
-    const Frame* begin() const { return m_frames; }
-    const Frame* end() const { return m_frames + m_count; }
-    Frame& Last() { return m_frames[m_count - 1]; }
-    void Pop() { --m_count; }
-    bool Push(const Frame& frame) {
-        if (m_count == m_capacity && !Grow()) return false;
-        m_frames[m_count++] = frame;
-        return true;
-    }
-
-private:
-    bool Grow() {
-        const std::size_t capacity = m_capacity ? m_capacity * 2 : 64;
-        void* grown = m_frames ? Platform::Reallocate(m_frames, capacity * sizeof(Frame))
-                               : Platform::Allocate(capacity * sizeof(Frame));
-        if (!grown) return false;
-        m_frames = static_cast<Frame*>(grown);
-        m_capacity = capacity;
-        return true;
-    }
-
-    Frame* m_frames = nullptr;
-    std::size_t m_count = 0;
-    std::size_t m_capacity = 0;
 };
 
 class ElementWriter final : _IProgress {
@@ -421,7 +389,7 @@ public:
     bool Run(const CPXMLObject& element) {
         if (!Open(element)) return false;
         // Every element above the current one is on the path, its tag open.
-        while (!m_path.IsEmpty()) {
+        while (!m_path.Empty()) {
             Frame& last = m_path.Last();
             if (last.next != last.end) {
                 const CPXMLObject& child = *last.next++;
@@ -429,9 +397,9 @@ public:
                 if (!Open(child)) return false;
                 continue;
             }
-            const Node& node = *last.node;
+            tagCPOMEMHEADER* name = last.name;
             m_path.Pop();
-            if (!Close(node)) return false;
+            if (!Close(name)) return false;
         }
         return true;
     }
@@ -440,25 +408,25 @@ private:
     // The children of an element take equal shares of it.
     double GetDone() const override {
         double done = 0, share = 1;
-        for (const Frame& frame : m_path) {
-            const auto children = static_cast<double>(Elements::Count(frame.node->elements));
+        m_path.ForEach([&](const Frame& frame) {
+            const auto children = static_cast<double>(frame.end - frame.first);
             const auto left = static_cast<double>(frame.end - frame.next);
-            if (children == 0) break;
+            if (children == 0) return false;
             share /= children;
             done += share * (children - left - 1); // the next one after that which is being written
-            if (share < 1e-3) break;
-        }
+            return share >= 1e-3;
+        });
         return std::max(done, 1e-3);
     }
 
-    static bool IsContainer(const Node& node) { return *static_cast<const wchar_t*>(node.name) == L'<'; }
+    static bool IsContainer(const wchar_t* name) { return *name == L'<'; }
 
     // Writes an element up to its first child, or all of it when it has none.
     bool Open(const CPXMLObject& element) {
         if (!IsLive(element) || !NodeOf(element).name.isdef()) return false;
         const Node& node = NodeOf(element);
         if (node.contentKind == kInstruction) return PutInstruction(node);
-        if (IsContainer(node)) return Descend(node);
+        if (IsContainer(node.name)) return Descend(node);
         if (!Put("<", node.name, "") || !PutAttributes(node)) return false;
         switch (node.contentKind) {
         case kNothing:
@@ -468,22 +436,23 @@ private:
             m_out.Indent();
             return Descend(node);
         case kData:
-            return m_out.Put(">") && PutData(node) && PutEndTag(node);
+            return m_out.Put(">") && PutData(node) && PutEndTag(String::PoolAccess::Block(node.name));
         default:
             // Intended (xml-mixed-content): children and data together, which a textbook writes, would not read back.
             return false;
         }
     }
 
-    bool Close(const Node& node) {
-        if (IsContainer(node)) return true;
+    bool Close(tagCPOMEMHEADER* name) {
+        if (IsContainer(String::EntryOf(name).text)) return true;
         m_out.Outdent();
-        return PutEndTag(node);
+        return PutEndTag(name);
     }
 
     bool Descend(const Node& node) {
         const CPXMLObject* first = Elements::First(node.elements);
-        return m_path.Push({&node, first, first + Elements::Count(node.elements)});
+        const CPXMLObject* end = first + Elements::Count(node.elements);
+        return m_path.Push({String::PoolAccess::Block(node.name), first, first, end});
     }
 
     template <std::size_t before, std::size_t behind>
@@ -491,7 +460,9 @@ private:
         return m_out.Put(prefix, text, String::UnitsOf(text), suffix);
     }
 
-    bool PutEndTag(const Node& node) { return Put("</", node.name, ">") && m_out.EndLine(); }
+    bool PutEndTag(tagCPOMEMHEADER* name) {
+        return m_out.Put("</", String::EntryOf(name).text, String::UnitsOf(name), ">") && m_out.EndLine();
+    }
 
     bool PutInstruction(const Node& node) {
         return node.data.isdef() && Put("<?", node.name, " ") && Put("", node.data, "?>");
@@ -553,7 +524,7 @@ private:
     }
 
     _CXMLOut& m_out;
-    Path m_path;
+    Stack<Frame> m_path; // down to the current element
 };
 
 } // namespace

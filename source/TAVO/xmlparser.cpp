@@ -3,6 +3,7 @@
 #include "xmlparser.h"
 
 #include "scratch.h"
+#include "stack.h"
 #include "transcoding.h"
 #include "xmlnames.h"
 #include "xmlstrings.h"
@@ -39,7 +40,7 @@ public:
     Parser& operator=(const Parser&) = delete;
     ~Parser() {
         for (std::size_t i = 0; i < m_children.Count(); ++i) Buffers::Block::Free(m_children[i]);
-        for (std::size_t i = 0; i < m_open.Count(); ++i) Buffers::Block::Free(m_open[i].node);
+        for (; !m_open.Empty(); m_open.Pop()) Buffers::Block::Free(m_open.Last().node);
         DropAttributes();
     }
 
@@ -466,7 +467,7 @@ private:
             m_root = NodeAccess::Adopt(element.node);
         else if (!m_children.Push(element.node))
             return OutOfMemory();
-        m_open.Cut(m_open.Count() - 1);
+        m_open.Pop();
         return true;
     }
 
@@ -778,7 +779,7 @@ private:
     const Unit* m_errorAt = nullptr;
 
     CPXMLObject m_root;
-    Scratch<OpenElement> m_open;
+    Stack<OpenElement> m_open;
     Scratch<tagCPOMEMHEADER*> m_children; // finished elements whose parents are open, the outermost parent's first
     Scratch<RawAttribute> m_attributes;   // of the tag that is being read
     Scratch<std::uint32_t> m_seen;        // hash table over m_attributes, used above kFewAttributes
