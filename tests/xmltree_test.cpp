@@ -230,11 +230,16 @@ TEST(XmlWrite, SurrogatesAreNotCombinedIntended) {
     for (const wchar_t* pair : {L"\xD83D\xDE00", L"\xD87D\xDE00", L"\xD83D\xFFFF", L"\xD83D\xDBFF"})
         EXPECT_EQ(Written(WithData(pair)), kDeclaration + "<e>\x01</e>");
     EXPECT_EQ(Written(WithData(L"a\xD800\xDC00")), kDeclaration + std::string("<e>a\0</e>", 9)) << "low ten bits zero";
-    CPXMLObject beyond = WithData(L""); // U+100000 came as UTF-8
-    ASSERT_TRUE(beyond.Add(TAVO::String::CPPoolString(reinterpret_cast<const unsigned char*>("\xF4\x80\x80\x80"))));
-    EXPECT_EQ(Written(beyond), "failed");
-    CPPlainMemory out;
-    EXPECT_TRUE(!beyond.Write(out, XMLEncodingUTF16, false) && beyond.Write(out, XMLEncodingUTF16Raw, false));
+    for (int around : {0, 40}) { // letters
+        std::string letters;
+        for (int i = 0; i < around; ++i) letters += "\xD0\xAF";
+        const std::string bytes = letters + "\xF4\x80\x80\x80" + letters; // U+100000 comes as UTF-8
+        CPXMLObject beyond = WithData(L"");
+        ASSERT_TRUE(beyond.Add(CPPoolString(reinterpret_cast<const unsigned char*>(bytes.c_str()))));
+        EXPECT_EQ(Written(beyond), "failed");
+        CPPlainMemory out;
+        EXPECT_TRUE(!beyond.Write(out, XMLEncodingUTF16, false) && beyond.Write(out, XMLEncodingUTF16Raw, false));
+    }
 }
 
 TEST(XmlWrite, FilesAreReplacedOrDeleted) {

@@ -35,30 +35,50 @@ bool HasEscape(Simd::Block units) {
     return Mask(Or(Or(references, brackets), Equal16(units, All16('"')))) != 0;
 }
 
-template <bool escapes> bool IsPlain(Simd::Block units) { return IsAscii(units) && !(escapes && HasEscape(units)); }
-
 template <bool escapes> bool IsPlain(wchar_t unit) {
     return unit < 0x80 && !(escapes && (detail::kAsciiClasses[unit] & detail::kEscapeBit));
 }
 
-// Stores all units as bytes if they are ASCII and, with `escapes`, none of & < > " '; else false. Most names and values
-// are shorter than two blocks, so there is no loop over single units: the last block overlaps the one before it.
+// The same of what Narrow made of units other than 0: 0, or a byte with the highest bit, where they are not ASCII.
+template <bool escapes> TAVO_INLINE bool ArePlain(Simd::Block bytes) {
+    using namespace Simd;
+    Simd::Block others = Or(bytes, Equal8(bytes, All8(0)));
+    if constexpr (escapes) {
+        // & and ' differ in bit 0, < and > in bit 1.
+        const Simd::Block references = Equal8(Or(bytes, All8(1)), All8('\''));
+        const Simd::Block brackets = Equal8(Or(bytes, All8(2)), All8('>'));
+        others = Or(Or(others, Equal8(bytes, All8('"'))), Or(references, brackets));
+    }
+    return Mask(others) == 0;
+}
+
+// Stores all units as bytes if they are ASCII, none of them 0, and with `escapes` none of & < > " '; else false. Most
+// names and values are shorter than two blocks, so there is no loop over single units: the last block overlaps the one
+// before it.
 template <bool escapes> TAVO_INLINE bool NarrowWhole(unsigned char* out, const wchar_t* text, std::size_t count) {
     constexpr std::size_t kHalf = kUnitsPerBlock / 2;
-    if (count >= kUnitsPerBlock) {
-        for (std::size_t i = 0;; i = i + 2 * kUnitsPerBlock <= count ? i + kUnitsPerBlock : count - kUnitsPerBlock) {
-            const Simd::Block units = Simd::Load(text + i);
-            if (!IsPlain<escapes>(units)) return false;
-            Simd::StoreHalf(out + i, Simd::Narrow(units, units));
-            if (i + kUnitsPerBlock == count) return true;
+    if (count >= Simd::kBlock) {
+        for (std::size_t i = 0;; i = std::min(i + Simd::kBlock, count - Simd::kBlock)) {
+            const Simd::Block bytes = Simd::Narrow(Simd::Load(text + i), Simd::Load(text + i + kUnitsPerBlock));
+            if (!ArePlain<escapes>(bytes)) return false;
+            Simd::Store(out + i, bytes);
+            if (i + Simd::kBlock == count) return true;
         }
+    }
+    if (count >= kUnitsPerBlock) {
+        const std::size_t last = count - kUnitsPerBlock;
+        const Simd::Block bytes = Simd::Narrow(Simd::Load(text), Simd::Load(text + last));
+        if (!ArePlain<escapes>(bytes)) return false;
+        Simd::StoreHalf(out, bytes);
+        Simd::StoreHalf(out + last, Simd::HighHalf(bytes));
+        return true;
     }
     if (count >= kHalf) {
         const Simd::Block units = Simd::LoadHalves(text, text + count - kHalf);
-        if (!IsPlain<escapes>(units)) return false;
-        const std::uint64_t bytes = Simd::LowWord(Simd::Narrow(units, units));
+        const Simd::Block narrow = Simd::Narrow(units, units);
+        if (!ArePlain<escapes>(narrow)) return false;
+        const std::uint64_t bytes = Simd::LowWord(narrow), last = bytes >> 32;
         std::memcpy(out, &bytes, kHalf);
-        const std::uint64_t last = bytes >> 32;
         std::memcpy(out + count - kHalf, &last, kHalf);
         return true;
     }
@@ -207,13 +227,24 @@ bool _CXMLOut::PutCharacter(ulong32 character) {
     return true;
 }
 
+// Encodes at once what surely fits so that four bytes are left before each character; PutCharacter takes those others.
 bool _CXMLOut::EncodeUtf8(const wchar_t* text, const wchar_t* end) {
-    ulong32 character;
+    constexpr std::size_t kFew = 8; // characters, which are encoded sooner one by one
     while (text != end) {
         const std::size_t ascii = NarrowAscii(Target(), text, std::min(static_cast<std::size_t>(end - text), m_free));
         text += ascii;
         m_free -= ascii;
+        const std::size_t whole = std::min(static_cast<std::size_t>(end - text), (m_free - (m_free != 0)) / 3);
         unsigned char* target = Target();
+        ulong32 character;
+        if (whole > kFew) {
+            const String::detail::Extent good = String::detail::MeasureUtf16(text, whole);
+            String::detail::ConvertUtf16(text, good, target);
+            text += good.source;
+            m_free -= good.target;
+            if (good.ending == String::detail::Ending::Invalid) return false;
+            continue;
+        }
         while (text != end && *text >= 0x80 && target <= m_buffer + kBufferSize - kLongest) {
             if (!TakeCharacter(character, text, end)) return false;
             String::detail::EncodeUtf8(target, character);

@@ -404,6 +404,19 @@ TEST(XmlWriter, CharactersAcrossTheEndOfTheBufferIntended) {
         }
 }
 
+TEST(XmlWriter, TextsOfManyScriptsCrossBuffersAtAnyPlace) {
+    const Text characters[] = {u"a", u"\xE9", u"\x43B", u"\x4E00", u"\xFFFF", u"\xD83D\xDE00", u"\xD800\xDC00", u"]]>"};
+    std::mt19937 random(1);
+    for (int round = 0; round < 60; ++round) {
+        const std::size_t longest = std::size_t{1} << random() % 8; // of the runs
+        Text data;
+        while (data.size() < 18000)
+            for (std::size_t left = 1 + random() % longest, which = random() % std::size(characters); left; --left)
+                data += characters[which];
+        ASSERT_TRUE(WritesAlike({u"e", 2, {{u"a", data}}, {}, data})) << "round " << round;
+    }
+}
+
 TEST(XmlWriter, InstructionsContainersAndLevels) {
     const auto make = std::make_shared<Element, const Element&>;
     const auto instruction = make({u"pi", 4, {}, {}, u"a < b"}), leaf = make({u"leaf", 0, {}, {}, {}});
