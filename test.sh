@@ -20,6 +20,7 @@ Without a choice: --linux --asan --tsan --windows --clang. Choices run in the or
   --coverage       Linux tests with gcov; prints the lines covered per source file
   --fuzz           every fuzz target for a minute (FUZZ_SECONDS=n changes that)
   --bench          benchmarks beside the peers; BENCH_FILTER=regex picks some
+  --growth         how each job's time grows when its input doubles
   --soak SECONDS   a host that works on every processor for that long, then 10,000 times loading and unloading
   --tidy           clang-tidy over the library's sources
   --no-setup       do not look for missing packages first
@@ -152,6 +153,12 @@ bench() {
   cat "$logs/linux-release.bench.log"
 }
 
+growth() {
+  build linux-release tavo_growth
+  step linux-release growth build/linux-release/bin/tavo_growth
+  cat "$logs/linux-release.growth.log"
+}
+
 soak() { # <seconds>
   build linux-release
   step linux-release soak build/linux-release/bin/tavo_soak "$1"
@@ -181,7 +188,7 @@ for argument; do
     --help | -h) usage; exit 0 ;;
     --no-setup) setup=0 ;;
     --windows | --windows-debug) windows=1 choices="$choices $argument" ;;
-    --linux | --asan | --tsan | --clang | --coverage | --fuzz | --bench | --tidy) choices="$choices $argument" ;;
+    --linux | --asan | --tsan | --clang | --coverage | --fuzz | --bench | --growth | --tidy) choices="$choices $argument" ;;
     *) echo "test.sh: unknown choice $argument"; usage; exit 2 ;;
   esac
 done
@@ -212,6 +219,7 @@ for choice in $choices; do
     --coverage) coverage ;;
     --fuzz) fuzz ;;
     --bench) bench ;;
+    --growth) growth ;;
     --soak) soak "$seconds" ;;
     --tidy) tidy ;;
   esac
