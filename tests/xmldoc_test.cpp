@@ -194,6 +194,28 @@ TEST(XmlReader, AnyByteAtAnyPlace) {
         }
 }
 
+// Places each of the characters among letters, in data, in a value and in a section.
+template <class Text> void CompareWithin(const Text& letters, std::initializer_list<Text> characters) {
+    const auto text = [](const std::string& ascii) { return Text(ascii.begin(), ascii.end()); };
+    const std::pair<const char*, const char*> frames[] = {
+        {"<a>", "</a>"}, {"<a b='", "'/>"}, {"<a><![CDATA[", "]]></a>"}};
+    for (const auto& [open, close] : frames)
+        for (const Text& character : characters)
+            for (std::size_t before = 0; before < 17; ++before)
+                for (const Text& behind : {Text(), text("x"), letters})
+                    Compare(text(open + std::string(before, 'x')) + letters + character + behind + text(close));
+}
+
+// What does not simply become a unit: what has no wide form, pairs, blanks, references, and what ends the text.
+TEST(XmlReader, CharactersWithinLongTexts) {
+    const std::string letters = "\xD0\xA1\xD1\x8A \xE4\xB8\xAD\xE6\x96\x87 na\xC3\xAFve \xD1\x87\xD0\xB0\xD1\x8E";
+    CompareWithin<std::string>(letters, {"\xC0\x80", "\xC0\xBC", "\xC0\xA0", "\xED\xA0\x80", "\xED\xBF\xBF",
+                                         "\xF0\x9F\x98\x80", "\xF4\x80\x80\x80", "\xF4\x90\x80\x80", "\x02", "\x7F",
+                                         " ", "  ", "\r\n", "&#65;", "]", "] ]]>", "'", "<"});
+    CompareWithin<std::u16string>(
+        ToUtf16(letters), {u"\xD83D", u"\xDE00", u"\xD87D\xDE00", u"\xFFFF", u"\x02", u"  ", u"&#65;", u"]]>", u"'"});
+}
+
 // Tokens anywhere in a document, or nothing but tokens.
 TEST(XmlReader, RandomTokens) {
     std::vector<std::string> tokens(1);

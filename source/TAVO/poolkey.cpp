@@ -253,7 +253,7 @@ TAVO_MULTIPLIES bool FoldUnits(const wchar_t* text, std::size_t count, Key& key)
         // A unit has three bytes, or fewer by these two tests.
         const std::uint32_t below800 = Mask(Equal16(high, All16(0))) & present;
         const std::uint32_t below80 = Mask(Equal16(And(units, All16(0xFF80)), All16(0))) & present;
-        key.utf8Size += 3 * taken - static_cast<std::size_t>(std::popcount(below800) + std::popcount(below80)) / 2;
+        key.utf8Size += 3 * taken - CountBits(below800 | below80 << 16) / 2;
         const Block letters = And(Above16(units, All16('A' - 1)), Above16(All16('Z' + 1), units));
         folder.Add((Mask(letters) & present) != 0, Reverse(units, 2 * taken));
         folder.AddLower(Reverse(Or(units, And(letters, All16(0x20))), 2 * taken));

@@ -96,8 +96,7 @@ private:
     }
     bool OutOfMemory() { return Fail(kDomError, m_at); }
 
-    // --- looking ahead
-    // --------------------------------------------------------------------------------------------------
+    // --- looking ahead ----------------------------------------------------------------------------------------------
 
     bool AtEnd() const { return m_at == m_end; }
 
@@ -120,8 +119,7 @@ private:
         while (m_at != m_end && IsBlank(*m_at)) ++m_at;
     }
 
-    // --- the document
-    // ---------------------------------------------------------------------------------------------------
+    // --- the document -----------------------------------------------------------------------------------------------
 
     bool Document() {
         if (Stands(m_at, "\xEF\xBB\xBF") && kUtf8) m_at += 3;
@@ -191,8 +189,7 @@ private:
         return nullptr;
     }
 
-    // --- rules that differ from the XML recommendation, each in one place
-    // -----------------------------------------------
+    // --- rules that differ from the XML recommendation, each in one place -------------------------------------------
 
     // Intended (xml-declaration-end): "<!" runs to the next '>' outside quotes, comments at top level included, so an
     // apostrophe in a comment opens a string and a DOCTYPE's internal subset ends at its first '>'. A textbook would
@@ -263,8 +260,7 @@ private:
     // tree and the writer know it; after a child nothing but markup may come.
     bool MixedContent(const Unit* at) { return Fail(kMixedContent, at); }
 
-    // --- names
-    // ----------------------------------------------------------------------------------------------------------
+    // --- names ------------------------------------------------------------------------------------------------------
 
     // Moves behind the name at m_at.
     bool Name(Spelling& name) {
@@ -315,8 +311,7 @@ private:
         return String::pool::InternWide(m_text.First(), m_text.Count());
     }
 
-    // --- tags
-    // -----------------------------------------------------------------------------------------------------------
+    // --- tags -------------------------------------------------------------------------------------------------------
 
     // Reads attributes of the node up to the end of a start tag or, with TagEnd::Instruction and no node, of an
     // instruction, and moves behind it.
@@ -418,8 +413,7 @@ private:
         m_seen[slot & (m_seen.Count() - 1)] = static_cast<std::uint32_t>(index + 1);
     }
 
-    // --- elements
-    // -------------------------------------------------------------------------------------------------------
+    // --- elements ---------------------------------------------------------------------------------------------------
 
     // The element at m_at with everything below it.
     bool Element() {
@@ -528,24 +522,30 @@ private:
         return !interned.isnull();
     }
 
-    // --- text
-    // -----------------------------------------------------------------------------------------------------------
+    // --- text -------------------------------------------------------------------------------------------------------
+
+    // What a run may hold besides ASCII: nothing, or every character that is stored as it is decoded, which those from
+    // 10000 on are not.
+    enum class Script { Ascii, Any };
 
     // The first unit from `start` on that a text cannot simply run over: a blank that does not stand alone among other
-    // units, a control, a character above 7F, '&', or one of the two stops; the end when there is none.
-    // Requires: `start` is not at a blank.
-    const Unit* RunEnd(const Unit* start, Unit stop1, Unit stop2) const {
+    // units, a control, a character that is not of the script, '&', or one of the two stops; the end when there is
+    // none. Requires: `start` is not at a blank.
+    template <Script script> const Unit* RunEnd(const Unit* start, Unit stop1, Unit stop2) const {
         const Unit* at = start;
         if constexpr (kUtf8) {
             using namespace Simd;
-            const Block printable = All8(0x21), space = All8(' '), reference = All8('&');
+            const Block space = All8(' '), reference = All8('&');
             const Block first = All8(stop1), second = All8(stop2);
             std::uint32_t spaceBefore = 0; // whether the block before ended with a space that may stand alone
             for (; m_end - at >= static_cast<std::ptrdiff_t>(kBlock); at += kBlock) {
                 const Block block = Load(at);
                 // Signed: bytes from 80 on are below too.
-                const std::uint32_t special = Mask(Or(Or(Below8(block, printable), Equal8(block, reference)),
-                                                      Or(Equal8(block, first), Equal8(block, second))));
+                const Block others = script == Script::Ascii
+                                         ? Below8(block, All8(0x21))
+                                         : Or(AtLeast8(space, block), AtLeast8(block, All8(kFirstLead4)));
+                const std::uint32_t special =
+                    Mask(Or(Or(others, Equal8(block, reference)), Or(Equal8(block, first), Equal8(block, second))));
                 if (!(special | spaceBefore)) continue;
                 // A space is no obstacle unless something special follows.
                 const std::uint32_t spaces = Mask(Equal8(block, space));
@@ -556,14 +556,17 @@ private:
             }
             at -= spaceBefore;
         }
-        while (at != m_end &&
-               (IsPlain(*at, stop1, stop2) || (*at == ' ' && at + 1 != m_end && IsPlain(at[1], stop1, stop2))))
-            ++at;
+        const auto isPlain = [=](Unit c) { return IsPlain<script>(c) && c != '&' && c != stop1 && c != stop2; };
+        while (at != m_end && (isPlain(*at) || (*at == ' ' && at + 1 != m_end && isPlain(at[1])))) ++at;
         return at;
     }
 
-    static bool IsPlain(Unit c, Unit stop1, Unit stop2) {
-        return static_cast<unsigned>(c) - 0x21u < 0x5Fu && c != '&' && c != stop1 && c != stop2;
+    static constexpr int kFirstLead4 = 0xF0;
+
+    template <Script script> static bool IsPlain(Unit c) {
+        const auto unit = static_cast<unsigned>(c);
+        if (unit < 0x80 || script == Script::Ascii) return unit - 0x21u < 0x5Fu;
+        return kUtf8 ? unit < kFirstLead4 : !IsSurrogate(c);
     }
 
     // The value at m_at, quotes included, which goes to `place`. The null string when it will be there later.
@@ -571,7 +574,7 @@ private:
         const Unit* opened = m_at;
         const Unit quote = *opened;
         const Unit* start = opened + 1;
-        const Unit* at = start != m_end && *start == ' ' ? start : RunEnd(start, quote, quote);
+        const Unit* at = start != m_end && *start == ' ' ? start : RunEnd<Script::Ascii>(start, quote, quote);
         if (at == m_end) return Fail(kOpenString, opened);
         if (*at != quote) return ValueInPieces(value);
         m_at = at + 1;
@@ -626,7 +629,7 @@ private:
         const Unit* opened = m_at++;
         BeginText();
         while (!AtEnd() && *m_at != *opened)
-            if (!Character()) return false;
+            if (!Characters(*opened, *opened)) return false;
         if (AtEnd()) return Fail(kOpenString, opened);
         ++m_at;
         return EndText(value);
@@ -636,8 +639,9 @@ private:
     bool Data() {
         OpenElement& element = m_open.Last();
         const Unit* start = m_at;
-        const Unit* at = RunEnd(start, '<', ']');
-        while (at != m_end && *at == ']' && !Stands(at, "]]>") && !IsBlankAt(at + 1)) at = RunEnd(at + 1, '<', ']');
+        const Unit* at = RunEnd<Script::Ascii>(start, '<', ']');
+        while (at != m_end && *at == ']' && !Stands(at, "]]>") && !IsBlankAt(at + 1))
+            at = RunEnd<Script::Ascii>(at + 1, '<', ']');
         // Nearly always the whole data stands here as it is.
         if (at == m_end || *at != '<' || at == start || !Stands(at, "</")) return DataInPieces(element);
         m_at = at;
@@ -663,7 +667,7 @@ private:
                 }
             } else if (*m_at == ']' && Stands(m_at, "]]>")) {
                 return Fail(kBadDataTerminator, m_at);
-            } else if (!Character()) {
+            } else if (!Characters('<', ']')) {
                 return false;
             }
         }
@@ -686,8 +690,8 @@ private:
         const Unit* start = m_at;
         const Unit* end = Find(start + 9, "]]>");
         if (!end) return Fail(kOpenCData, start);
-        for (m_at = start + 9; m_at != end;)
-            if (!OneCharacter()) return false;
+        m_at = start + 9;
+        if (!Run(end)) return false;
         m_at = end + 3;
         return true;
     }
@@ -704,18 +708,66 @@ private:
         return !text.isnull() || OutOfMemory();
     }
 
-    // The next character of text or value: source blanks collapse, and are dropped where nothing stands before or
-    // behind.
-    bool Character() {
+    // The next characters of text or value, one at least and none behind a stop: source blanks collapse, and are
+    // dropped where nothing stands before or behind.
+    bool Characters(Unit stop1, Unit stop2) {
         if (IsBlank(*m_at)) {
             m_blankPending = true;
             ++m_at;
             return true;
         }
-        if (*m_at != '&') return OneCharacter();
+        if (*m_at != '&') {
+            const Unit* end = RunEnd<Script::Any>(m_at, stop1, stop2);
+            return end == m_at ? OneCharacter() : Run(end);
+        }
         ulong32 value;
         const bool numeric = m_end - m_at > 1 && m_at[1] == '#';
         return (numeric ? NumericReference(value) : PredefinedReference(value)) && Put(value);
+    }
+
+    // What stands before `end`, as it stands.
+    bool Run(const Unit* end) {
+        constexpr std::ptrdiff_t kShort = 8;
+        if (end - m_at > kShort) {
+            if (!PutBlank()) return false;
+            const auto units = static_cast<std::size_t>(end - m_at);
+            if (!m_text.Reserve(units)) return OutOfMemory(); // there are no more units than bytes
+            wchar_t* const first = m_text.First() + m_text.Count();
+            wchar_t* last = first;
+            if (Decode(units, last) && AreWhole(first, last)) {
+                m_text.Cut(m_text.Count() + static_cast<std::size_t>(last - first));
+                m_at = end;
+                return true;
+            }
+        }
+        while (m_at != end)
+            if (!OneCharacter()) return false;
+        return true;
+    }
+
+    // Decodes so many units at m_at to `out` and moves it. False when they do not end where a character does.
+    bool Decode(std::size_t units, wchar_t*& out) const {
+        if constexpr (kUtf8) {
+            const Extent extent = MeasureUtf8(m_at, units);
+            return extent.source == units && ConvertUtf8(m_at, extent, out);
+        } else {
+            std::memcpy(out, m_at, units * sizeof(Unit));
+            out += units;
+            return true;
+        }
+    }
+
+    // Whether none of the units is a zero or half of a pair.
+    static bool AreWhole(const wchar_t* at, const wchar_t* end) {
+        using namespace Simd;
+        constexpr std::ptrdiff_t kUnits = kBlock / sizeof(*at);
+        for (; end - at >= kUnits; at += kUnits) {
+            const Block block = Load(at);
+            const Block halves = Equal16(And(block, All16(0xF800)), All16(0xD800));
+            if (Mask(Or(halves, Equal16(block, All16(0)))) != 0) return false;
+        }
+        while (at != end && *at != 0 && !IsSurrogate(*at)) ++at;
+        return at == end;
     }
 
     // Units of the good character at `at`; 0 for a bad one, which only UTF-16 can have after validation.
@@ -764,8 +816,7 @@ private:
         return true;
     }
 
-    // --- state
-    // ----------------------------------------------------------------------------------------------------------
+    // --- state ------------------------------------------------------------------------------------------------------
 
     // Room for an Attribute that is moved bitwise.
     struct RawAttribute {

@@ -179,8 +179,7 @@ inline bool ScanDoubleBits(Text text, double& value) {
     return true;
 }
 
-// --- decimal fractions: two ways, the second one for what the first one leaves
-// ----------------------------------------------
+// --- decimal fractions: two ways, the second one for what the first one leaves --------------------------------------
 
 inline unsigned DecimalDigit(wchar_t unit) { return static_cast<unsigned>(unit) - '0'; }
 
