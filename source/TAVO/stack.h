@@ -11,7 +11,7 @@
 namespace TAVO {
 
 template <class T> class Stack {
-    static_assert(std::is_trivially_copyable_v<T>);
+    static_assert(std::is_trivially_copyable_v<T> && alignof(T) <= alignof(void*));
 
 public:
     Stack() = default;
@@ -54,7 +54,7 @@ public:
 private:
     static constexpr std::size_t kFirst = 64, kMost = 8192; // elements of a piece
 
-    struct alignas(T) Piece {
+    struct Piece {
         Piece* below;
         Piece* above; // null, or one that was in use before and may be again
         T* end;

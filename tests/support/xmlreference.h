@@ -239,7 +239,7 @@ private:
 
     // As the calls that set names are told; their tests check them.
     static bool Names(char32_t c, bool first) {
-        if (c > 0xFFFF || (c >= 0xD800 && c <= 0xDFFF)) return false;
+        if (c == 0 || c > 0xFFFF || (c >= 0xD800 && c <= 0xDFFF)) return false;
         const wchar_t text[] = {first ? static_cast<wchar_t>(c) : L'a', first ? L'\0' : static_cast<wchar_t>(c), 0};
         return TAVO::XML::CPXMLObject().SetName(TAVO::String::CStringPool::GetStringRef(text));
     }
