@@ -7,7 +7,7 @@
 
 namespace documents {
 
-enum class Kind { Small, Deep, LongText, Repeated, Distinct };
+enum class Kind { Small, Deep, LongText, Repeated, Distinct, Scripts };
 
 inline const char* Name(Kind kind) {
     switch (kind) {
@@ -19,8 +19,10 @@ inline const char* Name(Kind kind) {
         return "long text";
     case Kind::Repeated:
         return "repeated values";
-    default:
+    case Kind::Distinct:
         return "distinct values";
+    default:
+        return "many scripts";
     }
 }
 
@@ -61,6 +63,16 @@ inline std::string Make(Kind kind, std::size_t bytes) {
                           "</event>\n",
                           i % 2 ? "cut" : "dissolve", next() % 8, i % 5 ? "linked" : "free");
             break;
+        case Kind::Scripts: {
+            static constexpr const char* kWords[] = {"Größe", "façade", "съешь", "ещё", "этих",
+                                                     "булок", "日本語", "字幕",  "the", "end"};
+            std::snprintf(line, sizeof line, "  <clip id=\"клип-%u\"><name>Сцена %u, дубль %u</name><note>", i, i / 7,
+                          i % 7);
+            text += line;
+            for (unsigned words = i % 10 ? next() % 6 : 200; words; --words) (text += kWords[next() % 10]) += ' ';
+            text += "—</note></clip>\n";
+            continue;
+        }
         default:
             std::snprintf(line, sizeof line, "  <asset id=\"%08x-%04x\"><uri>media/%08x/%u.mxf</uri></asset>\n", next(),
                           i & 0xFFFF, next() * 31, i);

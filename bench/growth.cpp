@@ -22,8 +22,8 @@ using TAVO::String::CStringPool;
 using TAVO::XML::CPXMLObject;
 using TAVO::XML::CXMLDoc;
 
-// Times, for twice the input. More than the first is marked: the job leaves a cache. More than the second is a fault: work
-// that grows with the square shows as 4.
+// Times, for twice the input. More than the first is marked: the job leaves a cache. More than the second is a fault:
+// work that grows with the square shows as 4.
 constexpr double kLinear = 2.2, kMost = 3.3;
 
 // --- Measuring -----------------------------------------------------------------------------------------------------
@@ -79,7 +79,10 @@ bool Measure(const Job& job, int rounds) {
         }
         const double growth = Median(ratios);
         std::printf("%-44s %7zu to %7zu %-4s %5.2f  %10.3f ms%s\n", job.name, size, size * 2, job.unit, growth,
-                    Median(times) * 1e3, growth > kMost ? "  too much" : growth > kLinear ? "  *" : "");
+                    Median(times) * 1e3,
+                    growth > kMost     ? "  too much"
+                    : growth > kLinear ? "  *"
+                                       : "");
         std::fflush(stdout);
         withinBounds = withinBounds && growth <= kMost;
     }
@@ -280,12 +283,14 @@ const std::vector<Job>& Jobs() {
         {"parse long texts", 1000, 16000, "kB", Parsing(Kind::LongText)},
         {"parse repeated values", 1000, 16000, "kB", Parsing(Kind::Repeated)},
         {"parse distinct values", 1000, 16000, "kB", Parsing(Kind::Distinct)},
+        {"parse many scripts", 1000, 16000, "kB", Parsing(Kind::Scripts)},
         {"write small elements", 1000, 64000, "kB", Writing(Kind::Small, XMLEncodingUTF8, false)},
         {"write small elements, UTF-16, indented", 1000, 16000, "kB", Writing(Kind::Small, XMLEncodingUTF16, true)},
         {"write deep elements", 1000, 16000, "kB", Writing(Kind::Deep, XMLEncodingUTF8, false)},
         {"write long texts", 1000, 16000, "kB", Writing(Kind::LongText, XMLEncodingUTF8, false)},
         {"write repeated values", 1000, 16000, "kB", Writing(Kind::Repeated, XMLEncodingUTF8, false)},
         {"write distinct values", 1000, 16000, "kB", Writing(Kind::Distinct, XMLEncodingUTF8, false)},
+        {"write many scripts", 1000, 16000, "kB", Writing(Kind::Scripts, XMLEncodingUTF8, false)},
         {"close a document", 1000, 16000, "kB", Closing},
         {"sweep what it held", 1000, 16000, "kB", Sweeping},
         {"append children and let them go", 62500, 1000000, "", Appending},

@@ -169,7 +169,7 @@ void WritePugixml(benchmark::State& state) {
 
 void Sizes(benchmark::internal::Benchmark* benchmark) {
     for (int tenths : {10, 20, 50, 100, 500}) benchmark->Args({static_cast<int>(Kind::Small), tenths});
-    for (Kind kind : {Kind::LongText, Kind::Repeated, Kind::Distinct})
+    for (Kind kind : {Kind::LongText, Kind::Repeated, Kind::Distinct, Kind::Scripts})
         for (int tenths : {50, 100}) benchmark->Args({static_cast<int>(kind), tenths});
     benchmark->Unit(benchmark::kMillisecond);
 }
@@ -182,6 +182,11 @@ void Depths(benchmark::internal::Benchmark* benchmark) {
 
 void Small(benchmark::internal::Benchmark* benchmark) {
     for (int tenths : {10, 50, 100}) benchmark->Args({static_cast<int>(Kind::Small), tenths});
+    benchmark->Unit(benchmark::kMillisecond);
+}
+
+void LongTexts(benchmark::internal::Benchmark* benchmark) {
+    for (Kind kind : {Kind::LongText, Kind::Scripts}) benchmark->Args({static_cast<int>(kind), 50});
     benchmark->Unit(benchmark::kMillisecond);
 }
 
@@ -206,9 +211,9 @@ BENCHMARK(ParseLibxml2)->Apply(Sizes);
 #if defined(TAVO_PEER_EXPAT)
 BENCHMARK(ParseExpatSax)->Apply(Sizes)->Apply(Depths);
 #endif
-BENCHMARK(WriteTavo)->Apply(Small)->Apply(Doublings);
+BENCHMARK(WriteTavo)->Apply(Small)->Apply(LongTexts)->Apply(Doublings);
 #if defined(TAVO_PEER_PUGIXML)
-BENCHMARK(WritePugixml)->Apply(Small)->Apply(Doublings);
+BENCHMARK(WritePugixml)->Apply(Small)->Apply(LongTexts)->Apply(Doublings);
 #endif
 
 } // namespace
