@@ -227,14 +227,15 @@ bool _CXMLOut::PutCharacter(ulong32 character) {
     return true;
 }
 
-// Encodes at once what surely fits so that four bytes are left before each character; PutCharacter takes those others.
 bool _CXMLOut::EncodeUtf8(const wchar_t* text, const wchar_t* end) {
     constexpr std::size_t kFew = 8; // characters, which are encoded sooner one by one
     while (text != end) {
         const std::size_t ascii = NarrowAscii(Target(), text, std::min(static_cast<std::size_t>(end - text), m_free));
         text += ascii;
         m_free -= ascii;
-        const std::size_t whole = std::min(static_cast<std::size_t>(end - text), (m_free - (m_free != 0)) / 3);
+        // What can be encoded at once, none of it where fewer than four bytes are left: that is for PutCharacter.
+        const std::size_t fitting = m_free > 0 ? (m_free - 1) / 3 : 0;
+        const std::size_t whole = std::min(static_cast<std::size_t>(end - text), fitting);
         unsigned char* target = Target();
         ulong32 character;
         if (whole > kFew) {
