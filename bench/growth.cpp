@@ -1,5 +1,6 @@
 // How each job's time grows when its input doubles. A machine that others use changes its speed by the second, so sizes
 // are compared in pairs: a job of n, one of 2n and one of n again, in a row, and the median of many such ratios counts.
+// Before each, other memory is walked through: what is done over and over on the same data tells where caches end.
 
 #include "documents.h"
 
@@ -22,8 +23,8 @@ using TAVO::String::CStringPool;
 using TAVO::XML::CPXMLObject;
 using TAVO::XML::CXMLDoc;
 
-// Times, for twice the input. More than the first is marked: the job leaves a cache. More than the second is a fault:
-// work that grows with the square shows as 4.
+// Times, for twice the input. More than the first is marked; more than the second is a fault: work that grows with the
+// square shows as 4.
 constexpr double kLinear = 2.2, kMost = 3.3;
 
 // --- Measuring -----------------------------------------------------------------------------------------------------
@@ -170,7 +171,7 @@ Repetition Appending(std::size_t count) {
         const CPPoolString name(L"child");
         Require(root.SetName(name));
         return Seconds([&] {
-            for (std::size_t i = 0; i < count; ++i) root.AddTag(name);
+            for (std::size_t i = 0; i < count; ++i) Require(bool(root.AddTag(name)));
             root.free();
         });
     };

@@ -185,7 +185,7 @@ void Small(benchmark::internal::Benchmark* benchmark) {
     benchmark->Unit(benchmark::kMillisecond);
 }
 
-void LongTexts(benchmark::internal::Benchmark* benchmark) {
+void Texts(benchmark::internal::Benchmark* benchmark) {
     for (Kind kind : {Kind::LongText, Kind::Scripts}) benchmark->Args({static_cast<int>(kind), 50});
     benchmark->Unit(benchmark::kMillisecond);
 }
@@ -211,9 +211,9 @@ BENCHMARK(ParseLibxml2)->Apply(Sizes);
 #if defined(TAVO_PEER_EXPAT)
 BENCHMARK(ParseExpatSax)->Apply(Sizes)->Apply(Depths);
 #endif
-BENCHMARK(WriteTavo)->Apply(Small)->Apply(LongTexts)->Apply(Doublings);
+BENCHMARK(WriteTavo)->Apply(Small)->Apply(Texts)->Apply(Doublings);
 #if defined(TAVO_PEER_PUGIXML)
-BENCHMARK(WritePugixml)->Apply(Small)->Apply(LongTexts)->Apply(Doublings);
+BENCHMARK(WritePugixml)->Apply(Small)->Apply(Texts)->Apply(Doublings);
 #endif
 
 } // namespace
