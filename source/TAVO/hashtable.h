@@ -45,6 +45,11 @@ public:
         return index ? reinterpret_cast<Bucket*>(index + 1) : nullptr;
     }
 
+    // Hashes are spread over their whole range, so the value tells the place.
+    static std::size_t Guess(unsigned long long hash, std::size_t count) {
+        return static_cast<std::size_t>(((hash >> 32) * count) >> 32);
+    }
+
     // Starts to fetch from memory what adding an entry behind the `count` ones of its bucket will look at, so that the
     // cache misses of a large table run side by side instead of one after the other.
     static void FetchEnd(const CBaseHashTable& table, unsigned long long hash, std::size_t count) {
@@ -86,9 +91,10 @@ public:
 
     // Sets `place` to where the item stands for which `order(item)` is 0 among the entries of `hash`, or where it would
     // be inserted, and tells whether it is there. `order` tells how what is sought compares with an item: below 0, 0,
-    // above 0.
+    // above 0. The last `unordered` entries of the bucket are left out.
     template <class Order>
-    static bool Locate(const CBaseHashTable& table, unsigned long long hash, Order order, Place& place) {
+    static bool Locate(const CBaseHashTable& table, unsigned long long hash, Order order, Place& place,
+                       std::size_t unordered = 0) {
         place.bucket = static_cast<std::size_t>(hash & table.m_mask);
         place.index = 0;
         place.found = false;
@@ -97,7 +103,7 @@ public:
         const Buffers::tagCPOMEMHEADER* bucket = Buffers::Block::Of(buckets[place.bucket]);
         if (!bucket) return false;
         const auto* entries = reinterpret_cast<const Entry*>(bucket + 1);
-        const std::size_t count = bucket->sUsed / sizeof(Entry);
+        const std::size_t count = bucket->sUsed / sizeof(Entry) - unordered;
         std::size_t index = LowerBound(entries, count, hash), end = index;
         if (index < count && entries[index].hash == hash) {
             const auto* block = reinterpret_cast<const char*>(Buffers::Block::Of(entries[index].item));
@@ -151,11 +157,6 @@ private:
     static const char* Memory(const CBaseHashTable& table, unsigned long long hash) {
         const Bucket* buckets = Buckets(table);
         return buckets ? reinterpret_cast<const char*>(Buffers::Block::Of(buckets[hash & table.m_mask])) : nullptr;
-    }
-
-    // Hashes are spread over their whole range, so the value tells the place.
-    static std::size_t Guess(unsigned long long hash, std::size_t count) {
-        return static_cast<std::size_t>(((hash >> 32) * count) >> 32);
     }
 
     // How many of the `count` entries, 1 at least, have a hash below `hash`. Without a branch on what it reads: where

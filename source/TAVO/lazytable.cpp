@@ -46,10 +46,22 @@ void LazyTable::PutInOrder(std::size_t bucket) noexcept {
     TableAccess::Bucket& entries = TableAccess::Buckets(*this)[bucket];
     const std::size_t unordered = std::exchange(m_states[bucket].unordered, std::uint16_t{0});
     std::size_t to = entries.Count(), from = to - unordered;
+
+    // Hashes are spread over their whole range: the value tells about where an entry goes, and one that stands about
+    // right has few to pass. With hashes that are not spread all of them may be passed, but they are 256 at most.
+    std::uint16_t starts[kMostUnordered + 1] = {};
+    const auto guess = [&](std::size_t i) { return TableAccess::Guess(entries[from + i].hash, unordered); };
+    for (std::size_t i = 0; i < unordered; ++i) ++starts[guess(i) + 1];
+    for (std::size_t i = 1; i < unordered; ++i) starts[i] = static_cast<std::uint16_t>(starts[i] + starts[i - 1]);
     Gathered gathered[kMostUnordered];
     for (std::size_t i = 0; i < unordered; ++i)
-        gathered[i] = {entries[from + i].hash, Block::Of(entries[from + i].item)};
-    std::sort(gathered, gathered + unordered, isBelow);
+        gathered[starts[guess(i)]++] = {entries[from + i].hash, Block::Of(entries[from + i].item)};
+    for (std::size_t i = 1; i < unordered; ++i) {
+        const Gathered moved = gathered[i];
+        std::size_t place = i;
+        for (; place > 0 && isBelow(moved, gathered[place - 1]); --place) gathered[place] = gathered[place - 1];
+        gathered[place] = moved;
+    }
 
     const auto write = [&entries](std::size_t index, const Gathered& what) {
         entries[index].hash = what.hash;

@@ -2,13 +2,11 @@
 // A hash table whose buckets are put in order when somebody looks there.
 //
 // To give each of many thousands of new entries its place in a long bucket would be to move half the bucket, from
-// memory, for each of them. So entries that are known to be new gather unordered behind the others, and the next search
-// or walk puts them in order together. Nobody ever sees a bucket that is not in order; a sweep shows entries one by one
-// and takes them as they stand.
+// memory, for each of them. So entries that are known to be new gather unordered behind the others, until there are
+// many or somebody looks there who may do so again: then they are put in order together. A walk shows every bucket in
+// order; a sweep shows entries one by one and takes them as they stand.
 
 #include "hashtable.h"
-
-#include <algorithm>
 
 namespace TAVO::Lookup {
 
@@ -23,16 +21,20 @@ public:
 protected:
     LazyTable() : CBaseHashTable(kIndexLength) {}
 
-    // As TableAccess::Locate.
+    // As TableAccess::Locate. The bucket is put in order first: for who may look there often.
     template <class Order> bool Locate(unsigned long long hash, Order order, Place& place) {
         Settle(BucketOf(hash));
         return TableAccess::Locate(*this, hash, order, place);
     }
-    // The same for what is often asked for soon after it was added: it is sought among the latest entries first, and
-    // then the bucket stays as it is. RemoveAt needs a place that Locate told.
-    template <class Order> bool LocateSoon(unsigned long long hash, Order order, Place& place) {
-        if (TAVO_UNLIKELY(m_states[BucketOf(hash)].unordered != 0) && LocateLatest(hash, order, place)) return true;
-        return Locate(hash, order, place);
+    // The same, but the bucket stays as it is, and what is not found goes behind the others: for who looks once.
+    // RemoveAt needs a place that Locate told.
+    template <class Order> bool LocateAsIs(unsigned long long hash, Order order, Place& place) {
+        const std::size_t unordered = m_states[BucketOf(hash)].unordered;
+        if (unordered == 0) return TableAccess::Locate(*this, hash, order, place);
+        if (LocateLatest(hash, order, place, unordered)) return true;
+        if (TableAccess::Locate(*this, hash, order, place, unordered)) return true;
+        place = PlaceOfNew(hash);
+        return false;
     }
     // Where an entry goes that is known to be new.
     static Place PlaceOfNew(unsigned long long hash) { return {BucketOf(hash), Buffers::NotFound, false}; }
@@ -63,12 +65,13 @@ private:
     };
 
     static std::size_t BucketOf(unsigned long long hash) { return static_cast<std::size_t>(hash % kBuckets); }
-    template <class Order> bool LocateLatest(unsigned long long hash, Order order, Place& place) const {
-        constexpr std::size_t kLatest = 4;
+    // Among the unordered ones, the latest first.
+    template <class Order>
+    bool LocateLatest(unsigned long long hash, Order order, Place& place, std::size_t unordered) const {
         const std::size_t bucket = BucketOf(hash);
         const TableAccess::Bucket& entries = TableAccess::Buckets(*this)[bucket];
         std::size_t index = entries.Count();
-        for (std::size_t left = std::min<std::size_t>(m_states[bucket].unordered, kLatest); left > 0; --left)
+        for (const std::size_t first = index - unordered; index > first;)
             if (entries[--index].hash == hash && order(entries[index].item) == 0) {
                 place = {bucket, index, true};
                 return true;

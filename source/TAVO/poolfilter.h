@@ -1,9 +1,9 @@
 #pragma once
 // Tells of most texts that are met for the first time that no bucket holds them, so that nobody has to look there: a
 // word that lies in the caches in the place of lines of a bucket that lie in memory. What it says to be absent is
-// absent; of what is absent it calls one in thirty present at worst.
+// absent; of what is absent it calls one in twenty-five present at worst.
 //
-// Two bytes for each hash, four at most. Hashes that go are not taken out; from time to time the filter is made anew
+// One byte for each hash, two at most. Hashes that go are not taken out; from time to time the filter is made anew
 // from what the tables hold.
 //
 // Threads: the pool's lock is held around every call.
@@ -57,7 +57,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t kFew = 1 << 14, kBuckets = 1 << 12, kHashesPerWord = 5;
+    static constexpr std::size_t kFew = 1 << 14, kBuckets = 1 << 12, kHashesPerWord = 8;
 
     // The words for the hashes of one bucket lie together, so that filling the filter bucket by bucket stays in the
     // caches.

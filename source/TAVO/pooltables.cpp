@@ -97,14 +97,14 @@ bool CCaseInsensitiveHash::Add(tagCPOMEMHEADER* entry, const StoredText& text, b
         if (caseless) return true;
         return AddGroup(PlaceOfNew(text.key.hashi), text.key.hashi, Block::Adopt(entry));
     }
-    const Place place = LocateGroup(text);
+    const Place place = LocateGroup(text, true);
     if (place.found) {
         CPObjectMemory& item = TableAccess::Item(*this, place);
         return IsRecord(item) ? AddVariant(GroupOf(item), entry) : MakeRecord(item, Block::Of(item), entry);
     }
     if (caseless) return true; // alone, and found by its own hash
     CPObjectMemory item;
-    if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text)) {
+    if (tagCPOMEMHEADER* lower = entries.FindLowerCase(text, true)) {
         if (!MakeRecord(item, lower, entry)) return false;
     } else {
         item = Block::Adopt(entry);
@@ -152,7 +152,6 @@ CCaseSensitiveHash::CCaseSensitiveHash(CCaseInsensitiveHash& groups) : m_groups(
 void CCaseSensitiveHash::Fetch(const pool::Key& key) const noexcept {
     if (!m_filter.IsOn()) return; // so small a table lies in the caches
     m_filter.Fetch(key.hash);
-    FetchForSearch(key.hash); // the filter may have to be waited for, so it is not asked
     FetchForAdding(key.hash);
     if (key.hash == key.hashi) return; // a text without capitals that is new stands in this table only
     m_filter.Fetch(key.hashi);

@@ -29,6 +29,7 @@ public:
             place = PlaceOfNew(text.key.hash);
             return nullptr;
         }
+        FetchForSearch(text.key.hash);
         Buffers::tagCPOMEMHEADER* found = FindInBuckets(text, place);
         if (found) m_front.Remember(found);
         return found;
@@ -36,16 +37,19 @@ public:
 
     // The same, but nothing is remembered.
     template <class Text> Buffers::tagCPOMEMHEADER* FindInBuckets(const Text& text, Place& place) {
-        return BlockAt(LocateSoon(text.key.hash, OrderOf<false>(text), place), place);
+        return BlockAt(LocateAsIs(text.key.hash, OrderOf<false>(text), place), place);
     }
 
-    // Starts to fetch what a search for that text and adding it will look at, in both tables.
+    // Starts to fetch what tells that a text is new and adding it will look at, in both tables.
     void Fetch(const pool::Key& key) const noexcept;
 
-    // The entry that is the lower case of the text.
-    template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text) {
+    // The entry that is the lower case of the text. For who adds a text, and may not look again, the bucket stays as it
+    // is.
+    template <class Text> Buffers::tagCPOMEMHEADER* FindLowerCase(const Text& text, bool forAdding) {
         Place place;
-        return BlockAt(Locate(text.key.hashi, OrderOf<true>(text), place), place);
+        const auto order = OrderOf<true>(text);
+        return BlockAt(forAdding ? LocateAsIs(text.key.hashi, order, place) : Locate(text.key.hashi, order, place),
+                       place);
     }
 
     // False: no entry has that hash, and no group.
@@ -99,7 +103,7 @@ public:
     template <class Text> Buffers::tagCPOMEMHEADER* Find(const Text& text, CCaseSensitiveHash& entries) noexcept {
         if (!entries.MayHold(text.key.hashi)) return nullptr;
         const Place place = LocateGroup(text);
-        if (!place.found) return entries.FindLowerCase(text);
+        if (!place.found) return entries.FindLowerCase(text, false);
         Buffers::tagCPOMEMHEADER* found = RepresentativeOf(Lookup::TableAccess::Item(*this, place));
         if (!found) complaint = "Case-insensitive match of case-sensitive cache MUST exist";
         return found;
@@ -119,18 +123,16 @@ public:
     const char* complaint = nullptr;
 
 private:
-    template <class Text> Place LocateGroup(const Text& text) {
+    template <class Text> Place LocateGroup(const Text& text, bool forAdding = false) {
+        const auto order = [&text](const Buffers::CPObjectMemory& item) {
+            const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
+            if (!block) return 0;
+            const PoolEntry& entry = EntryOf(const_cast<Buffers::tagCPOMEMHEADER*>(block));
+            if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
+            return text.CompareFolded(entry.text);
+        };
         Place place;
-        Locate(
-            text.key.hashi,
-            [&](const Buffers::CPObjectMemory& item) {
-                const Buffers::tagCPOMEMHEADER* block = RepresentativeOf(item);
-                if (!block) return 0;
-                const PoolEntry& entry = EntryOf(const_cast<Buffers::tagCPOMEMHEADER*>(block));
-                if (text.key.length != entry.length) return text.key.length < entry.length ? -1 : 1;
-                return text.CompareFolded(entry.text);
-            },
-            place);
+        forAdding ? LocateAsIs(text.key.hashi, order, place) : Locate(text.key.hashi, order, place);
         return place;
     }
     // Takes over what stands for a group; false without memory.
