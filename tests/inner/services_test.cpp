@@ -15,6 +15,7 @@
 #include <cstdio>
 #include <fstream>
 #include <gtest/gtest.h>
+#include <iterator>
 #include <limits>
 #include <mutex>
 #include <stdexcept>
@@ -79,6 +80,41 @@ TEST(ThreadPriority, HasFiveLevelsOfMany_Intended) {
         }
     })
         .join();
+}
+
+TEST(Heap, GivesLargeBlocksToOneAtATime) {
+    const auto work = [](std::uint64_t tag) {
+        constexpr std::size_t kMegabytes[] = {18, 3, 40, 17, 33, 64, 16, 20, 90, 36};
+        constexpr std::size_t kStep = 4096 / sizeof(tag), kUnitsPerMegabyte = (1 << 20) / sizeof(tag);
+        const auto fill = [tag](std::uint64_t* block, std::size_t megabytes) {
+            for (std::size_t i = 0; i < megabytes * kUnitsPerMegabyte; i += kStep) block[i] = tag + i;
+        };
+        const auto isFilled = [tag](const std::uint64_t* block, std::size_t megabytes) {
+            for (std::size_t i = 0; i < megabytes * kUnitsPerMegabyte; i += kStep)
+                if (block[i] != tag + i) return false;
+            return true;
+        };
+        std::uint64_t* held[3] = {};
+        std::size_t sizes[3] = {};
+        for (std::size_t round = 0; round < 60; ++round) {
+            const std::size_t each = round % 3, megabytes = kMegabytes[(round * 7 + tag) % std::size(kMegabytes)];
+            ASSERT_TRUE(isFilled(held[each], sizes[each]));
+            if (round % 4 && held[each]) {
+                held[each] = static_cast<std::uint64_t*>(Platform::HeapResize(held[each], megabytes << 20));
+                ASSERT_TRUE(held[each] && isFilled(held[each], std::min(sizes[each], megabytes)));
+            } else {
+                Platform::HeapRelease(held[each]);
+                held[each] = static_cast<std::uint64_t*>(Platform::HeapAllocate(megabytes << 20));
+                ASSERT_TRUE(held[each]);
+            }
+            fill(held[each], sizes[each] = megabytes);
+            if (round % 16 == 0) Platform::HeapTrim();
+        }
+        for (std::uint64_t* block : held) Platform::HeapRelease(block);
+    };
+    std::thread first([&] { work(1); }), second([&] { work(std::uint64_t{1} << 40); });
+    first.join();
+    second.join();
 }
 
 TEST(Modules, TellATruncatedPath) {

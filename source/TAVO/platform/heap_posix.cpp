@@ -49,7 +49,76 @@ TAVO_NOINLINE void WishForSegmentOf(void* block) {
     Wish(segment * kSegment + kLargePage, (segment + 1) * kSegment);
 }
 
+// mimalloc gives each block above 16 MB back to the system at once, and having its pages provided anew takes longer
+// than most of what is done with them. So the latest few stay, for the next ones of about their size. What they hold
+// has been given up: the system takes their pages when it is short of memory, and HeapTrim lets go of those that nobody
+// has taken for as long as mimalloc keeps smaller ones.
+class SpareBlocks {
+public:
+    constexpr SpareBlocks() noexcept = default;
+    ~SpareBlocks() {
+        m_closed = true;
+        LetGo(0);
+    }
+
+    // For a size of kLeast and more; null when none will do.
+    TAVO_NOINLINE void* Take(std::size_t size) noexcept {
+        for (Place& place : m_places) {
+            void* const block = place.block.exchange(nullptr, std::memory_order_acquire);
+            if (!block) continue;
+            const std::size_t usable = mi_usable_size(block);
+            if (size <= usable && usable / 2 <= size) return block;
+            void* none = nullptr;
+            if (!place.block.compare_exchange_strong(none, block, std::memory_order_release)) mi_free(block);
+        }
+        return nullptr;
+    }
+
+    // False: the block is not one to keep.
+    bool Keep(void* block) noexcept {
+        // Such a block begins where a segment does, behind what mimalloc writes there, as few others do.
+        return reinterpret_cast<std::uintptr_t>(block) % kSegment < kSegmentHead && block && KeepLarge(block);
+    }
+
+    // Of those that have lain for that long.
+    void LetGo(std::uint64_t milliseconds) noexcept {
+        const std::uint64_t now = GetProcessMilliseconds();
+        for (Place& place : m_places)
+            if (now - place.since.load(std::memory_order_relaxed) >= milliseconds)
+                mi_free(place.block.exchange(nullptr, std::memory_order_acquire));
+    }
+
+    static constexpr std::size_t kLeast = std::size_t{16} << 20, kMost = std::size_t{256} << 20;
+
+private:
+    static constexpr std::size_t kPlaces = 4, kSegmentHead = std::size_t{128} << 10;
+
+    struct Place {
+        std::atomic<void*> block{nullptr};
+        std::atomic<std::uint64_t> since{0};
+    };
+
+    TAVO_NOINLINE bool KeepLarge(void* block) noexcept {
+        const std::size_t usable = mi_usable_size(block);
+        if (usable < kLeast || usable > kMost || m_closed) return false;
+        const auto address = reinterpret_cast<std::uintptr_t>(block);
+        const std::uintptr_t first = (address + PageSize - 1) / PageSize * PageSize;
+        madvise(reinterpret_cast<void*>(first), (address + usable) / PageSize * PageSize - first, MADV_FREE);
+        Place& place = m_places[m_next.fetch_add(1, std::memory_order_relaxed) % kPlaces];
+        place.since.store(GetProcessMilliseconds(), std::memory_order_relaxed);
+        mi_free(place.block.exchange(block, std::memory_order_acq_rel));
+        return true;
+    }
+
+    Place m_places[kPlaces];
+    std::atomic<std::size_t> m_next{0};
+    std::atomic<bool> m_closed{false}; // the library is going, so nobody would let go of them any more
+};
+constinit SpareBlocks g_spares;
+
 void* AllocateLarge(std::size_t size) {
+    if (size >= SpareBlocks::kLeast)
+        if (void* const spare = g_spares.Take(size)) return spare;
     void* const block = mi_malloc(size);
     const auto address = reinterpret_cast<std::uintptr_t>(block);
     if (block) Wish((address + kLargePage - 1) / kLargePage * kLargePage, (address + size) / kLargePage * kLargePage);
@@ -65,20 +134,35 @@ void* Allocate(std::size_t size) {
     return block;
 }
 
+void Free(void* block) {
+    if (!g_spares.Keep(block)) mi_free(block);
+}
+
 void* Resize(void* block, std::size_t size) {
     if (size < kLargeBlock || size <= mi_usable_size(block)) return mi_realloc(block, size);
     // Moved here, not by mi_realloc: the wish must come before anything is written.
     void* const larger = AllocateLarge(size);
     if (!larger) return nullptr;
     std::memcpy(larger, block, mi_usable_size(block));
-    mi_free(block);
+    Free(block);
     return larger;
+}
+
+void Trim() {
+    mi_collect(false);
+    g_spares.LetGo(500);
 }
 
 #else
 
 void* Allocate(std::size_t size) { return mi_malloc(size); }
 void* Resize(void* block, std::size_t size) { return mi_realloc(block, size); }
+void Free(void* block) { mi_free(block); }
+void Trim() {
+#if defined(TAVO_MIMALLOC)
+    mi_collect(false);
+#endif
+}
 
 #endif
 
@@ -90,12 +174,7 @@ void* HeapResize(void* block, std::size_t size) noexcept {
     return !block || size > kLargest ? nullptr : Resize(block, AtLeast16(size));
 }
 
-void HeapRelease(void* block) noexcept { mi_free(block); }
-
-void HeapTrim() noexcept {
-#if defined(TAVO_MIMALLOC)
-    mi_collect(false);
-#endif
-}
+void HeapRelease(void* block) noexcept { Free(block); }
+void HeapTrim() noexcept { Trim(); }
 
 } // namespace TAVO::Platform
