@@ -298,8 +298,8 @@ const std::vector<Job>& Jobs() {
         {"intern new strings", 62500, 1000000, "", InterningNew},
         {"intern present strings", 62500, 1000000, "", InterningPresent},
         {"split a text and join it", 62500, 1000000, "", SplittingAndJoining},
-        {"UTF-8 to wide", 60, 960, "kB", Widening},
-        {"wide to UTF-8", 60, 960, "kB", Narrowing},
+        {"UTF-8 to wide", 60, 15360, "kB", Widening},
+        {"wide to UTF-8", 60, 15360, "kB", Narrowing},
         {"escape a URL and back", 1000, 16000, "kB", Escaping},
         {"bytes to 3FFF text and back", 1000, 16000, "kB", CarryingBytes},
     };

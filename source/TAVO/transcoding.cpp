@@ -533,8 +533,26 @@ using namespace detail;
 Extent MeasureText(const unsigned char* text, std::size_t length) { return MeasureUtf8(text, length); }
 template <class Unit> Extent MeasureText(const Unit* text, std::size_t length) { return MeasureUtf16(text, length); }
 
+// Up to the terminator, `n` units at most. In pieces small enough for the caches to hold: each is looked through for
+// its end, then measured.
 template <class Unit> Extent Measure(const Unit* text, std::size_t n) {
-    return text ? MeasureText(text, Simd::ZeroUnit(text, n)) : Extent();
+    constexpr std::size_t kPiece = std::size_t{1} << 15;
+    Extent all;
+    while (text) {
+        const std::size_t left = n - all.source, most = left < kPiece ? left : kPiece;
+        // Asking for ASCII on the way costs next to nothing for bytes only.
+        bool isAscii = false;
+        const std::size_t length = Simd::ZeroUnit(text + all.source, most, sizeof(Unit) == 1 ? &isAscii : nullptr);
+        const Extent piece = isAscii ? Extent{length, length, length} : MeasureText(text + all.source, length);
+        all.source += piece.source;
+        all.characters += piece.characters;
+        all.target += piece.target;
+        all.beyond = all.beyond || piece.beyond;
+        all.ending = piece.ending;
+        // The next piece begins with the character that this one cuts.
+        if (length < kPiece || most == left || all.ending == Ending::Invalid) break;
+    }
+    return all;
 }
 
 // Scans page by page and asks before each whether it can be read. A unit never straddles pages.
@@ -571,10 +589,7 @@ template <class Source, class Target, class Convert>
 std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target* target, std::size_t capacity,
                          Convert convert) {
     if (!source) return 0;
-    // Asking for ASCII on the way costs next to nothing for bytes only.
-    bool isAscii = false;
-    const std::size_t length = Simd::ZeroUnit(source, sourceLength, sizeof(Source) == 1 ? &isAscii : nullptr);
-    const Extent extent = isAscii ? Extent{length, length, length} : MeasureText(source, length);
+    const Extent extent = Measure(source, sourceLength);
     const std::size_t need = extent.target + 1;
     if (!target) return need;
     if (capacity < need) return 0;

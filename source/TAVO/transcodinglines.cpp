@@ -14,6 +14,14 @@ constexpr std::size_t kLanes = 32;
 
 constexpr std::size_t Least(std::size_t a, std::size_t b) { return a < b ? a : b; }
 
+// Asks for what a pass comes to soon. Of texts that no near cache holds, the processor fetches in time by itself what
+// is loaded and stored whole, but hardly what is so by lanes.
+TAVO_LINE_INLINE void FetchAhead(const void* source, const void* target) {
+    constexpr std::uintptr_t kAhead = 1536;
+    for (const void* each : {source, target})
+        Prefetch(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(each) + kAhead));
+}
+
 // The UTF-8 of units below 800, in each lane the bytes that are not 0.
 TAVO_LINE_INLINE Line Encode2(Line x, std::uint32_t ascii) {
     const Line two = Or(Or(ShiftRight16<6>(x), ShiftLeft16<8>(And(x, Line16(0x3F)))), Line16(0x80C0));
@@ -67,6 +75,7 @@ template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char*& begin, c
     std::uint64_t readable = ~3ull; // nothing stands before the text
     const unsigned char* text = begin;
     while (text < end) {
+        FetchAhead(text, out);
         const auto left = static_cast<std::size_t>(end - text);
         const std::size_t size = Least(left, kLanes);
         const Line x = LoadLine8Before(text, 2, readable & First64(Least(left, kLanes + 1) + 2));
@@ -117,6 +126,7 @@ template <class Unit> TAVO_LINE void MeasureUtf16(const Unit* text, std::size_t 
 template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit*& begin, const Unit* end, unsigned char* out) {
     const Unit* text = begin;
     for (bool plain = true; plain && text < end;) {
+        FetchAhead(text, out);
         std::size_t size = Least(static_cast<std::size_t>(end - text), kLanes);
         Line x = LoadLine16(text, First32(size));
         const std::uint32_t surrogates = IsEqual16(And(x, Line16(0xF800)), 0xD800);
