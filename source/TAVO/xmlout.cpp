@@ -437,16 +437,17 @@ public:
     }
 
 private:
-    // The children of an element take equal shares of it.
+    // The children of an element take equal shares of it. Only children tell nothing, however many follow each other.
     double GetDone() const override {
         double done = 0, share = 1;
+        int levels = 4096;
         m_path.ForEach([&](const Frame& frame) {
             const auto children = static_cast<double>(frame.end - frame.first);
             const auto left = static_cast<double>(frame.end - frame.next);
             if (children == 0) return false;
             share /= children;
             done += share * (children - left - 1); // the next one after that which is being written
-            return share >= 1e-3;
+            return share >= 1e-3 && --levels > 0;
         });
         return std::max(done, 1e-3);
     }

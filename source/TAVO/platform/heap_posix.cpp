@@ -2,6 +2,7 @@
 
 #include "platform.h"
 
+#include <algorithm>
 #include <atomic>
 #include <cstdint>
 #include <cstring>
@@ -40,6 +41,12 @@ constinit std::atomic<std::uint64_t> g_wished[kSegments / 64];
 
 void Wish(std::uintptr_t first, std::uintptr_t end) {
     if (first < end) madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);
+}
+
+// Of what lies between, whole large pages.
+void GiveBack(std::uintptr_t from, std::uintptr_t end) {
+    const std::uintptr_t first = (from + kLargePage - 1) / kLargePage * kLargePage, last = end / PageSize * PageSize;
+    if (first < last) madvise(reinterpret_cast<void*>(first), last - first, MADV_DONTNEED);
 }
 
 TAVO_NOINLINE void WishForSegmentOf(void* block) {
@@ -139,13 +146,25 @@ void Free(void* block) {
 }
 
 void* Resize(void* block, std::size_t size) {
-    if (size < kLargeBlock || size <= mi_usable_size(block)) return mi_realloc(block, size);
-    // Moved here, not by mi_realloc: the wish must come before anything is written.
-    void* const larger = AllocateLarge(size);
-    if (!larger) return nullptr;
-    std::memcpy(larger, block, mi_usable_size(block));
+    const std::size_t usable = mi_usable_size(block);
+    if (size > usable) {
+        if (size < kLargeBlock) return mi_realloc(block, size);
+    } else {
+        if (usable < SpareBlocks::kLeast || size >= usable / 2) return mi_realloc(block, size);
+        if (size >= kLargeBlock) {
+            // What is no longer needed goes without moving the rest.
+            const std::uintptr_t address = reinterpret_cast<std::uintptr_t>(block);
+            GiveBack(address + size, address + usable);
+            return block;
+        }
+    }
+    // Moved here, not by mi_realloc: the wish must come before anything is written, and the old block may be one to
+    // keep.
+    void* const other = Allocate(size);
+    if (!other) return nullptr;
+    std::memcpy(other, block, std::min(size, usable));
     Free(block);
-    return larger;
+    return other;
 }
 
 void Trim() {
