@@ -176,7 +176,8 @@ bool CBaseHashTable::PurgeTable(IBaseHashTableEnum* visitor) noexcept {
 }
 
 bool CBaseHashTable::DisposeTable(std::uint32_t budget) noexcept {
-    return TableAccess::Dispose(*this, budget, [](std::size_t, std::size_t) {});
+    return TableAccess::Dispose(
+        *this, budget, [](const CPObjectMemory&) {}, [](std::size_t, std::size_t) {});
 }
 
 bool CBaseHashTable::DisposeEntry(std::size_t bucket, std::size_t index) {

@@ -63,29 +63,34 @@ public:
         constexpr std::size_t kLine = 64, kLines = 5;
         const char* bucket = Memory(table, hash);
         if (!bucket) return;
+        Simd::Prefetch(bucket);
         const char* guessed = bucket + sizeof(Buffers::tagCPOMEMHEADER) + Guess(hash, count) * sizeof(Entry);
         for (std::size_t line = 0; line < kLines; ++line) Simd::Prefetch(guessed + line * kLine - kLines / 2 * kLine);
     }
 
     // The hashes of all entries, bucket by bucket.
     template <class Visit> static void ForEachHash(const CBaseHashTable& table, Visit visit) {
-        constexpr std::size_t kLine = 64;
         const Bucket* buckets = Buckets(table);
         for (std::size_t i = 0; buckets && i < table.m_buckets; ++i) {
-            // The next bucket comes from memory meanwhile; it is about as long as this one.
-            const auto* next = reinterpret_cast<const char*>(Buffers::Block::Of(buckets[(i + 1) & table.m_mask]));
             const std::size_t count = buckets[i].Count();
-            for (std::size_t at = 0; next && at < count * sizeof(Entry); at += kLine) Simd::Prefetch(next + at);
+            FetchEntries(buckets[(i + 1) & table.m_mask], count);
             for (std::size_t k = 0; k < count; ++k) visit(buckets[i][k].hash);
         }
     }
 
+    // Starts to fetch a bucket that will soon be walked through. How long it is would have to be waited for: about as
+    // long as one before it, which has `count` entries.
+    static void FetchEntries(const Bucket& bucket, std::size_t count) {
+        constexpr std::size_t kLine = 64;
+        const auto* memory = reinterpret_cast<const char*>(Buffers::Block::Of(bucket));
+        const std::size_t size = sizeof(Buffers::tagCPOMEMHEADER) + count * sizeof(Entry);
+        for (std::size_t at = 0; memory && at < size; at += kLine) Simd::Prefetch(memory + at);
+    }
     // Starts to fetch the beginnings of all items of a bucket.
     static void FetchItems(const Bucket& bucket) {
         for (std::size_t i = 0; i < bucket.Count(); ++i) {
             const auto* item = reinterpret_cast<const char*>(Buffers::Block::Of(bucket[i].item));
-            Simd::Prefetch(item);
-            Simd::Prefetch(item + 64);
+            for (const std::size_t byte : {0, 64, 95}) Simd::Prefetch(item + byte);
         }
     }
 
@@ -127,15 +132,21 @@ public:
         return place.found;
     }
 
-    // DisposeTable; `dropped` is told the bucket and the place of each entry that was dropped.
-    template <class Dropped>
-    static bool Dispose(CBaseHashTable& table, std::uint32_t budget, Dropped dropped) noexcept {
+    // DisposeTable; `next` is told the items of a bucket before they are asked, and `dropped` the bucket and the place
+    // of each entry that was dropped.
+    template <class Next, class Dropped>
+    static bool Dispose(CBaseHashTable& table, std::uint32_t budget, Next next, Dropped dropped) noexcept {
         const unsigned long long start = Core::OS::GetTimeNow();
         try {
             for (unsigned long long round = 0; round < table.m_buckets && Buckets(table); ++round) {
                 const auto bucket = static_cast<std::size_t>(table.m_cursor);
                 table.m_cursor = (table.m_cursor + 1) & table.m_mask;
-                FetchItems(Buckets(table)[table.m_cursor]);     // those of the next one, while this one's are asked
+                // What the buckets to come hold is fetched while this one is walked through: the entries of the one
+                // after the next, the items of the next one.
+                const std::size_t count = Buckets(table)[bucket].Count();
+                FetchEntries(Buckets(table)[(table.m_cursor + 1) & table.m_mask], count);
+                FetchItems(Buckets(table)[table.m_cursor]);
+                for (std::size_t i = 0; i < count; ++i) next(Buckets(table)[bucket][i].item);
                 if (Buckets(table)[bucket].isEmpty()) continue; // takes no time
                 for (std::size_t index = Buckets(table)[bucket].GetNItems(); index-- > 0;)
                     if (table.DisposeEntry(bucket, index)) dropped(bucket, index);

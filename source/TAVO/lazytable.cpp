@@ -82,12 +82,4 @@ bool LazyTable::Visit(IBaseHashTableEnum& visitor) noexcept {
     return EnumTableBy(&visitor, 0, false);
 }
 
-bool LazyTable::Dispose(std::uint32_t budget) noexcept {
-    // In any order: a sweep need not pay for putting in order what it throws away.
-    return TableAccess::Dispose(*this, budget, [this](std::size_t bucket, std::size_t index) {
-        const std::size_t left = TableAccess::Buckets(*this)[bucket].Count();
-        if (index + m_states[bucket].unordered > left) --m_states[bucket].unordered;
-    });
-}
-
 } // namespace TAVO::Lookup

@@ -52,8 +52,14 @@ protected:
 
     // As EnumTableBy for all entries.
     bool Visit(IBaseHashTableEnum& visitor) noexcept;
-    // As DisposeTable.
-    bool Dispose(std::uint32_t budget) noexcept;
+    // As DisposeTable; `next` is told the items of a bucket before they are asked. In any order: a sweep need not pay
+    // for putting in order what it throws away.
+    template <class Next> bool Dispose(std::uint32_t budget, Next next) noexcept {
+        return TableAccess::Dispose(*this, budget, next, [this](std::size_t bucket, std::size_t index) {
+            const std::size_t left = TableAccess::Buckets(*this)[bucket].Count();
+            if (index + m_states[bucket].unordered > left) --m_states[bucket].unordered;
+        });
+    }
 
 private:
     static constexpr std::uint32_t kIndexLength = 12;

@@ -121,7 +121,8 @@ bool CCaseInsensitiveHash::AddGroup(const Place& place, unsigned long long hashi
 bool CCaseInsensitiveHash::Remove(tagCPOMEMHEADER* entry) noexcept {
     const StoredText text(EntryOf(entry));
     const Place place = LocateGroup(text);
-    if (!place.found) return text.IsCaseless();
+    // Equal hashes tell it without a look at the text.
+    if (!place.found) return text.key.hash == text.key.hashi || text.IsCaseless();
     CPObjectMemory& item = TableAccess::Item(*this, place);
     if (!IsRecord(item)) {
         if (Block::Of(item) != entry) return false;
@@ -199,7 +200,11 @@ bool CCaseSensitiveHash::IsDisposable(CPObjectMemory item) {
 
 bool CCaseSensitiveHash::Dispose(std::uint32_t budget) noexcept {
     if (!m_front.Close()) return false;
-    const bool finished = LazyTable::Dispose(budget);
+    // An entry that may go now leaves its group, which lies elsewhere.
+    const bool finished = LazyTable::Dispose(budget, [this](const CPObjectMemory& item) {
+        const PoolEntry& entry = *Block::PayloadOf<PoolEntry>(item);
+        if (entry.idleSweeps != 0) m_groups.FetchForSearch(entry.hashi);
+    });
     if (finished && m_filter.IsTooLargeFor(GetNItems() + m_groups.GetNItems())) FillFilter();
     m_front.Open();
     return finished;

@@ -110,6 +110,7 @@ public:
     }
 
     using LazyTable::FetchForAdding;
+    using LazyTable::FetchForSearch;
 
     // Puts an entry, which has that text, into its group. False without memory; nothing has changed then.
     bool Add(Buffers::tagCPOMEMHEADER* entry, const pool::StoredText& text, bool caseless,
