@@ -3,8 +3,8 @@
 // word that lies in the caches in the place of lines of a bucket that lie in memory. What it says to be absent is
 // absent; of what is absent it calls one in twenty-five present at worst.
 //
-// One byte for each hash, two at most. Hashes that go are not taken out; from time to time the filter is made anew
-// from what the tables hold.
+// 32 KB, then one byte for each hash, two to three when it has just grown. Hashes that go are not taken out; from time
+// to time the filter is made anew from what the tables hold.
 //
 // Threads: the pool's lock is held around every call.
 
@@ -57,7 +57,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t kFew = 1 << 14, kBuckets = 1 << 12, kHashesPerWord = 8;
+    static constexpr std::size_t kFew = 1 << 11, kBuckets = 1 << 12, kHashesPerWord = 8;
 
     // The words for the hashes of one bucket lie together, so that filling the filter bucket by bucket stays in the
     // caches.
