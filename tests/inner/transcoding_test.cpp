@@ -234,6 +234,38 @@ TEST_F(Differential, LongTextsSumUp) {
         Expect(Terminated(Units16(40000, static_cast<unsigned short>(unit))), kAll);
 }
 
+// Texts are measured by pieces, and any character may lie across their ends, or the end of the text there.
+TEST_F(Differential, CharactersLieAcrossPieces_Intended) {
+    constexpr std::size_t kPiece = 1 << 15;
+    const std::vector<Bytes> bytes = {
+        {'a'},        {0xC3, 0xA9},       {0xE4, 0xB8, 0xAD},      {0xF0, 0x9F, 0x98, 0x80},
+        {0xC3, 'a'},  {0xE4, 0xB8, 'a'},  {0xF0, 0x9F, 0x98, 'a'}, {0x80},
+        {0xE4, 0xB8}, {0xF0, 0x9F, 0x98}, {0xF4, 0x90, 0x80, 0x80}};
+    const std::vector<Units16> units = {{'a'}, {0xE9}, {0xD83D, 0xDE00}, {0xD83D, 'a'}, {0xDE00}, {0xD83D}};
+    const auto expectAround = [this](const auto& head, const auto& tails) {
+        for (std::size_t before = kPiece - 4; before <= kPiece; ++before)
+            for (const auto& tail : tails) {
+                auto text = head;
+                text.resize(before, 'x');
+                text.insert(text.end(), tail.begin(), tail.end());
+                const std::size_t size = text.size();
+                text.insert(text.end(), {'y', 0});
+                for (const std::size_t n : {kAll, size, size - 1})
+                    if (!HasFatalFailure()) Expect(text, n);
+            }
+    };
+    expectAround(Bytes{0xC3, 0xA9}, bytes);
+    expectAround(Bytes{}, bytes);
+    expectAround(Units16{0xE9}, units);
+    // What is invalid ends the text, however much follows.
+    Bytes brokenBytes(2 * kPiece, 'x');
+    Units16 brokenUnits(2 * kPiece, 'x');
+    brokenBytes[100] = 0x80;
+    brokenUnits[100] = 0xDE00;
+    Expect(Terminated(brokenBytes), kAll);
+    Expect(Terminated(brokenUnits), kAll);
+}
+
 // Intended: utf32-bound
 TEST(TranscodingCounts, Utf32IncludesIndexN_Intended) {
     using Row = std::tuple<Numbers, std::size_t, std::size_t, std::size_t>; // bound, units, bytes
