@@ -86,7 +86,7 @@ public:
         const std::size_t size = sizeof(Buffers::tagCPOMEMHEADER) + count * sizeof(Entry);
         for (std::size_t at = 0; memory && at < size; at += kLine) Simd::Prefetch(memory + at);
     }
-    // Starts to fetch the beginnings of all items of a bucket.
+    // Starts to fetch the first 96 bytes of all items of a bucket.
     static void FetchItems(const Bucket& bucket) {
         for (std::size_t i = 0; i < bucket.Count(); ++i) {
             const auto* item = reinterpret_cast<const char*>(Buffers::Block::Of(bucket[i].item));

@@ -533,26 +533,32 @@ using namespace detail;
 Extent MeasureText(const unsigned char* text, std::size_t length) { return MeasureUtf8(text, length); }
 template <class Unit> Extent MeasureText(const Unit* text, std::size_t length) { return MeasureUtf16(text, length); }
 
-// Up to the terminator, `n` units at most. In pieces small enough for the caches to hold: each is looked through for
-// its end, then measured.
-template <class Unit> Extent Measure(const Unit* text, std::size_t n) {
-    constexpr std::size_t kPiece = std::size_t{1} << 15;
+// Long texts are looked through for their end and measured in pieces small enough for the caches to hold.
+constexpr std::size_t kPiece = std::size_t{1} << 15;
+
+template <class Unit> TAVO_NOINLINE Extent MeasureByPieces(const Unit* text, std::size_t n) {
     Extent all;
-    while (text) {
-        const std::size_t left = n - all.source, most = left < kPiece ? left : kPiece;
-        // Asking for ASCII on the way costs next to nothing for bytes only.
+    for (std::size_t length = kPiece; length == kPiece && all.ending != Ending::Invalid;) {
+        // A piece begins with the character that the one before it cuts.
+        const std::size_t left = n - all.source;
         bool isAscii = false;
-        const std::size_t length = Simd::ZeroUnit(text + all.source, most, sizeof(Unit) == 1 ? &isAscii : nullptr);
+        length =
+            Simd::ZeroUnit(text + all.source, left < kPiece ? left : kPiece, sizeof(Unit) == 1 ? &isAscii : nullptr);
         const Extent piece = isAscii ? Extent{length, length, length} : MeasureText(text + all.source, length);
         all.source += piece.source;
         all.characters += piece.characters;
         all.target += piece.target;
         all.beyond = all.beyond || piece.beyond;
         all.ending = piece.ending;
-        // The next piece begins with the character that this one cuts.
-        if (length < kPiece || most == left || all.ending == Ending::Invalid) break;
+        if (left == length) break;
     }
     return all;
+}
+
+template <class Unit> Extent Measure(const Unit* text, std::size_t n) {
+    if (!text) return {};
+    const std::size_t length = Simd::ZeroUnit(text, n < kPiece ? n : kPiece);
+    return length < kPiece ? MeasureText(text, length) : MeasureByPieces(text, n);
 }
 
 // Scans page by page and asks before each whether it can be read. A unit never straddles pages.
@@ -586,10 +592,8 @@ template <class Size> std::size_t CountUtf32(const ulong32* text, std::size_t n,
 
 // The common shape of the whole-string converters: measure, check the room, convert, terminate.
 template <class Source, class Target, class Convert>
-std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target* target, std::size_t capacity,
-                         Convert convert) {
-    if (!source) return 0;
-    const Extent extent = Measure(source, sourceLength);
+TAVO_INLINE std::size_t ConvertMeasured(const Source* source, const Extent& extent, Target* target,
+                                        std::size_t capacity, Convert convert) {
     const std::size_t need = extent.target + 1;
     if (!target) return need;
     if (capacity < need) return 0;
@@ -600,6 +604,20 @@ std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target*
     if (extent.ending == Ending::Invalid && extent.target > extent.characters) return 0;
     *target = 0;
     return need;
+}
+
+template <class Source, class Target, class Convert>
+std::size_t ConvertWhole(const Source* source, std::size_t sourceLength, Target* target, std::size_t capacity,
+                         Convert convert) {
+    if (!source) return 0;
+    // Asking for ASCII on the way costs next to nothing for bytes only.
+    bool isAscii = false;
+    const std::size_t length =
+        Simd::ZeroUnit(source, sourceLength < kPiece ? sourceLength : kPiece, sizeof(Source) == 1 ? &isAscii : nullptr);
+    if (TAVO_UNLIKELY(length == kPiece))
+        return ConvertMeasured(source, MeasureByPieces(source, sourceLength), target, capacity, convert);
+    const Extent extent = isAscii ? Extent{length, length, length} : MeasureText(source, length);
+    return ConvertMeasured(source, extent, target, capacity, convert);
 }
 
 } // namespace

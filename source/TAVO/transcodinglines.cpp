@@ -14,12 +14,13 @@ constexpr std::size_t kLanes = 32;
 
 constexpr std::size_t Least(std::size_t a, std::size_t b) { return a < b ? a : b; }
 
-// Asks for what a pass comes to soon. Of texts that no near cache holds, the processor fetches in time by itself what
-// is loaded and stored whole, but hardly what is so by lanes.
-TAVO_LINE_INLINE void FetchAhead(const void* source, const void* target) {
+// Asks for what a pass comes to soon, if `left` bytes reach that far. Of texts that no near cache holds, the processor
+// fetches in time by itself what is loaded and stored whole, but hardly what is so by lanes.
+TAVO_LINE_INLINE void FetchAhead(const void* source, const void* target, std::size_t left) {
     constexpr std::uintptr_t kAhead = 1536;
-    for (const void* each : {source, target})
-        Prefetch(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(each) + kAhead));
+    if (left <= kAhead) return;
+    Prefetch(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(source) + kAhead));
+    Prefetch(reinterpret_cast<const void*>(reinterpret_cast<std::uintptr_t>(target) + kAhead));
 }
 
 // The UTF-8 of units below 800, in each lane the bytes that are not 0.
@@ -75,8 +76,8 @@ template <class Unit> TAVO_LINE Unit* ConvertUtf8(const unsigned char*& begin, c
     std::uint64_t readable = ~3ull; // nothing stands before the text
     const unsigned char* text = begin;
     while (text < end) {
-        FetchAhead(text, out);
         const auto left = static_cast<std::size_t>(end - text);
+        FetchAhead(text, out, left);
         const std::size_t size = Least(left, kLanes);
         const Line x = LoadLine8Before(text, 2, readable & First64(Least(left, kLanes + 1) + 2));
         readable = ~0ull;
@@ -126,8 +127,9 @@ template <class Unit> TAVO_LINE void MeasureUtf16(const Unit* text, std::size_t 
 template <class Unit> TAVO_LINE unsigned char* ConvertUtf16(const Unit*& begin, const Unit* end, unsigned char* out) {
     const Unit* text = begin;
     for (bool plain = true; plain && text < end;) {
-        FetchAhead(text, out);
-        std::size_t size = Least(static_cast<std::size_t>(end - text), kLanes);
+        const auto left = static_cast<std::size_t>(end - text);
+        FetchAhead(text, out, left * sizeof(Unit));
+        std::size_t size = Least(left, kLanes);
         Line x = LoadLine16(text, First32(size));
         const std::uint32_t surrogates = IsEqual16(And(x, Line16(0xF800)), 0xD800);
         if (TAVO_UNLIKELY(surrogates != 0)) {

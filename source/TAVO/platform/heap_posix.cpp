@@ -59,7 +59,7 @@ TAVO_NOINLINE void WishForSegmentOf(void* block) {
 // mimalloc gives each block above 16 MB back to the system at once, and having its pages provided anew takes longer
 // than most of what is done with them. So the latest few stay, for the next ones of about their size. What they hold
 // has been given up: the system takes their pages when it is short of memory, and HeapTrim lets go of those that nobody
-// has taken for as long as mimalloc keeps smaller ones.
+// has taken for half a second, which is how long mimalloc keeps smaller ones here.
 class SpareBlocks {
 public:
     constexpr SpareBlocks() noexcept = default;
